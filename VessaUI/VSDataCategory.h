@@ -1,0 +1,39 @@
+#pragma once
+
+#include <QColor>
+#include <QImage>
+#include <QSizeF>
+#include <QString>
+#include <vector>
+
+/// A group of display types with colours and an icon. Lives in the catalogue until the process ends.
+class VSDataCategory {
+   public:
+    int categoryID() const { return id_; }
+    QString displayName() const;
+    bool isMe() const;  // the category of characteristics
+    QColor color() const { return bottom_; }
+    QColor gradientTopColor() const { return top_; }
+    QColor gradientBottomColor() const { return bottom_; }
+    QString listIcon() const { return QString::fromLatin1(icon_); }
+    /// A rectangle with rounded corners (radius 8 points) filled with the gradient, top to bottom.
+    QImage roundedGradient(QSizeF size, double scale) const;
+
+   private:
+    friend class VSDataCategoryController;
+    int id_ = 0;
+    const char* nameKey_ = "";
+    const char* icon_ = "";
+    QColor top_, bottom_;
+};
+
+class VSDataCategoryController {
+   public:
+    static const VSDataCategoryController& shared();
+    const std::vector<VSDataCategory>& allDataCategories() const { return categories_; }
+    const VSDataCategory* categoryWithID(int id) const;  // null: unknown
+
+   private:
+    VSDataCategoryController();
+    std::vector<VSDataCategory> categories_;
+};

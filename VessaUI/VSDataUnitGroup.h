@@ -1,0 +1,81 @@
+#pragma once
+
+#include <QString>
+#include <QStringList>
+#include <QColor>
+#include <memory>
+#include <optional>
+#include <span>
+#include <vector>
+
+#include "VessaUI/VSDataUnit.h"
+#include "VessaUI/VSDataUnitGroupChartingRules.h"
+
+/// Display-type IDs that the program speaks of. Kept on disk in the dashboard's selection; never reused.
+namespace VSGroupID {
+inline constexpr int Height = 3, HeartRate = 6, WalkingRunningDistance = 7, ActiveEnergy = 8, FlightsClimbed = 10, BloodPressure = 13,
+                     SleepAnalysis = 58, Steps = 59, CyclingDistance = 71, Workouts = 72, Water = 73, StandHours = 75,
+                     BasalBodyTemperature = 76, CervicalMucusQuality = 77, OvulationTestResult = 78, SexualActivity = 79,
+                     MenstrualFlow = 80, UVExposure = 81, Spotting = 82;
+}
+
+/// A display type: what a card, a list and an entry screen show. Lives in the catalogue until the process
+/// ends; compared by address. Immutable; texts follow the user's language.
+class VSDataUnitGroup {
+   public:
+    int dataUnitGroupID() const { return id_; }
+    int categoryID() const { return categoryID_; }
+    QString displayName() const;
+    /// One paragraph for its page; may be empty.
+    QString summary() const;
+    /// Words to find it by.
+    QStringList keywords() const;
+    /// Its units in their natural order.
+    const std::vector<const VSDataUnit*>& dataUnits() const { return units_; }
+    const std::vector<const VSDataUnit*>& dataUnitsOrderedForDataEntry() const { return units_; }
+    const VSDataUnit* anyDataUnit() const { return units_.front(); }
+    /// Between the values of a reading with several units: "/" for blood pressure.
+    QString joinString() const;
+    const VSDataUnitGroupChartingRules& chartingRules() const { return *rules_; }
+    bool isCharacteristic() const;
+    bool isNikeFuel() const;
+    bool allowsManualEntry() const { return manualEntry_; }
+    bool showAllDataHierarchically() const { return hierarchical_; }
+    bool shouldDisplayUnitStringOnYAxis() const { return unitOnYAxis_; }
+    bool unitPreferencesRequireChangeConfirmation() const { return confirmUnitChange_; }
+    QString unitChangeCautionaryText() const;
+    /// Names of icons (platform::icon); empty: none.
+    QString unitIcon() const { return QString::fromLatin1(unitIcon_); }
+    QString groupIcon() const { return QString::fromLatin1(groupIcon_); }
+    /// The icon of its category.
+    QString listIcon() const;
+
+    VSDataUnitGroup(const VSDataUnitGroup&) = delete;
+    VSDataUnitGroup& operator=(const VSDataUnitGroup&) = delete;
+
+   private:
+    friend struct VSDataUnitGroupCatalogue;
+    VSDataUnitGroup() = default;
+    int id_ = 0;
+    int categoryID_ = 0;
+    const char* nameKey_ = "";  // "<nameKey>", "<nameKey>_SUMMARY", "<nameKey>_KEYWORDS" (comma separated) in the tables
+    std::vector<const VSDataUnit*> units_;
+    std::unique_ptr<const VSDataUnitGroupChartingRules> rules_;
+    const char* joinKey_ = "";
+    bool manualEntry_ = true, hierarchical_ = false, unitOnYAxis_ = false, confirmUnitChange_ = false;
+    const char* unitIcon_ = "";
+    const char* groupIcon_ = "";
+};
+
+/// The catalogue of display types.
+class VSDataUnitGroupController {
+   public:
+    static const VSDataUnitGroupController& shared();
+    const std::vector<const VSDataUnitGroup*>& allDataUnitGroups() const;
+    const VSDataUnitGroup* dataUnitGroupWithID(int id) const;  // null: unknown
+    /// The display type that shows a data type, or null.
+    const VSDataUnitGroup* dataUnitGroupForType(const VSObjectType* type) const;
+    std::vector<const VSDataUnitGroup*> dataUnitGroupsInCategory(int categoryID) const;
+    /// The colour of what can be touched.
+    QColor keyColor() const;
+};
