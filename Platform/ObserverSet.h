@@ -10,7 +10,7 @@ namespace platform {
 /// themselves while they are told; the order of telling is that of adding.
 template <typename T>
 class ObserverSet {
-   public:
+ public:
     void add(const std::shared_ptr<T>& observer) {
         prune();
         if (!contains(observer.get())) observers_.push_back(observer);
@@ -34,9 +34,10 @@ class ObserverSet {
         return observers_.empty();
     }
 
-   private:
+ private:
     bool contains(const T* observer) const {
-        return std::any_of(observers_.begin(), observers_.end(), [observer](const auto& weak) { return weak.lock().get() == observer; });
+        return std::any_of(observers_.begin(), observers_.end(),
+                           [observer](const auto& weak) { return weak.lock().get() == observer; });
     }
     void prune() {
         std::erase_if(observers_, [](const auto& weak) { return weak.expired(); });

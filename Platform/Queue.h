@@ -8,7 +8,7 @@ namespace platform {
 
 /// Where blocks run. async may be called on any thread and returns at once.
 class Queue {
-   public:
+ public:
     virtual ~Queue() = default;
     virtual void async(std::function<void()> block) = 0;
 };

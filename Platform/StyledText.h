@@ -29,9 +29,10 @@ struct StyledRun {
 /// Text in runs: one immutable-by-habit value, drawn by one function. Runs follow each other in reading
 /// order of the user's language (right to left where that is written so).
 class StyledText {
-   public:
+ public:
     StyledText() = default;
-    explicit StyledText(const QString& text, std::optional<QFont> font = {}, std::optional<QColor> color = {});
+    explicit StyledText(const QString& text, std::optional<QFont> font = {},
+                        std::optional<QColor> color = {});
     static StyledText spacer(double width);  // width 0: empty
     static StyledText withImage(const QImage& image, double baselineOffset);
 
@@ -43,23 +44,26 @@ class StyledText {
     friend StyledText operator+(StyledText a, const StyledText& b) { return a += b; }
     friend bool operator==(const StyledText&, const StyledText&) = default;
 
-    /// Width and height in points when drawn with these defaults on one line; `scale` multiplies all font sizes.
+    /// Width and height in points when drawn with these defaults on one line; `scale` multiplies all font
+    /// sizes.
     QSizeF size(const QFont& defaultFont, double scale = 1.0) const;
     double ascent(const QFont& defaultFont, double scale = 1.0) const;
     /// Draws one line with its left end (right end of a right-to-left text is then left + width) at x and its
     /// baseline at y; cut with an ellipsis when wider than maxWidth.
-    void draw(QPainter& painter, QPointF baselineLeft, const QFont& defaultFont, const QColor& defaultColor, double maxWidth, double scale = 1.0) const;
+    void draw(QPainter& painter, QPointF baselineLeft, const QFont& defaultFont, const QColor& defaultColor,
+              double maxWidth, double scale = 1.0) const;
 
-   private:
+ private:
     std::vector<StyledRun> runs_;
 };
 
 /// Puts the pieces together in the reading order of the user's language.
 StyledText joinForLocale(const std::vector<StyledText>& pieces);
-/// Fills each placeholder (%1, %2 ...) of the localised text of `key` with the piece of that number; the rest of the
-/// text is unstyled. An empty piece leaves nothing at its place.
+/// Fills each placeholder (%1, %2 ...) of the localised text of `key` with the piece of that number; the rest
+/// of the text is unstyled. An empty piece leaves nothing at its place.
 StyledText joinWithFormat(const char* key, const std::vector<StyledText>& pieces);
 /// The image, then `spacing` points, then the text.
-StyledText prefixedWithImage(const StyledText& text, const QImage& image, double baselineAdjustment, double spacing);
+StyledText prefixedWithImage(const StyledText& text, const QImage& image, double baselineAdjustment,
+                             double spacing);
 
 }  // namespace platform

@@ -9,7 +9,7 @@ namespace platform {
 /// for the process, made at start-up.
 class SystemEvents : public QObject {
     Q_OBJECT
-   public:
+ public:
     static SystemEvents& shared();
     /// Starts listening: a timer to the next midnight of the user's zone, the kernel's notice of a set clock
     /// (timerfd), the zone file (/etc/localtime) and the system's time-date service, the system's resume.
@@ -18,13 +18,13 @@ class SystemEvents : public QObject {
     void postSignificantTimeChange();
     void postLocaleChange();
 
-   signals:
+ signals:
     /// A new day began, or the time zone or the clock changed.
     void significantTimeChange();
     /// The user's locale changed; translations have been loaded anew.
     void localeDidChange();
 
-   private:
+ private:
     SystemEvents();
     ~SystemEvents() override;
     struct Private;

@@ -38,6 +38,8 @@ class VSHealthStore {
         bool readOnly = false;
         bool createIfMissing = true;
         std::string applicationIdentifier = "org.qelvar.Qelvar";  // whose default values are meant
+        /// False: a lost power supply may take the last saves with it, never more; a killed process loses nothing either way.
+        bool survivesPowerLoss = true;
     };
     /// Waits. Opens or makes the database in the folder (made with mode 0700). Refused: a newer schema, not our
     /// file. Corrupt: a damaged file (it is never changed). NotAccessible: cannot be locked or reached.

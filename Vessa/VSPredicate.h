@@ -7,7 +7,8 @@
 #include "Vessa/VSObject.h"
 
 /// Options of a date predicate, a bit set. With none (0) a sample matches when its span meets [start, end): it
-/// starts before `end` and ends after `start`, or has no length and lies at `start` or later.
+/// starts before `end` and ends after `start`, or has no length and lies at `start` or later. StrictStartDate asks
+/// besides that it starts at `start` or later, StrictEndDate that it ends at `end` or earlier.
 enum VSQueryOptions : int { VSQueryOptionNone = 0, VSQueryOptionStrictStartDate = 1, VSQueryOptionStrictEndDate = 2 };
 
 /// A condition on samples: the conjunction of everything set here. Plain value; `a & b` joins two.
@@ -30,5 +31,7 @@ struct VSPredicate {
     /// Nothing but (perhaps) a date range with options 0: what statistics answer from rollups.
     bool isDateRangeOnly() const;
     bool matches(const VSSample& sample) const;  // all but noCorrelation, which only the store knows
+    /// What matches both. Conditions that contradict each other (two category values) become a date range in the distant future.
+    /// REQUIRES: the date options are equal when both have a date range.
     friend VSPredicate operator&(VSPredicate a, const VSPredicate& b);
 };

@@ -47,8 +47,8 @@ class VSQuery {
 class VSSampleQuery final : public VSQuery {
    public:
     using Handler = std::function<void(const VSResult<std::vector<VSSamplePtr>>&)>;
-    VSSampleQuery(const VSObjectType* type, VSPredicate predicate, int limit, std::vector<VSSortDescriptor> sort, Handler handler)
-        : VSQuery(type, std::move(predicate)), limit(limit), sort(std::move(sort)), handler(std::move(handler)) {}
+    VSSampleQuery(const VSObjectType* type, VSPredicate predicate, int resultLimit, std::vector<VSSortDescriptor> order, Handler resultsHandler)
+        : VSQuery(type, std::move(predicate)), limit(resultLimit), sort(std::move(order)), handler(std::move(resultsHandler)) {}
     const int limit;
     const std::vector<VSSortDescriptor> sort;  // none: in the order of insertion
     const Handler handler;
@@ -59,8 +59,8 @@ class VSSampleQuery final : public VSQuery {
 class VSObserverQuery final : public VSQuery {
    public:
     using Handler = std::function<void(const std::optional<VSError>&)>;
-    VSObserverQuery(const VSObjectType* type, VSPredicate predicate, Handler updateHandler)
-        : VSQuery(type, std::move(predicate)), updateHandler(std::move(updateHandler)) {}
+    VSObserverQuery(const VSObjectType* type, VSPredicate predicate, Handler handler)
+        : VSQuery(type, std::move(predicate)), updateHandler(std::move(handler)) {}
     const Handler updateHandler;
 };
 
@@ -73,8 +73,8 @@ class VSAnchoredObjectQuery final : public VSQuery {
    public:
     struct Answer { std::vector<VSSamplePtr> added; std::vector<VSDeletedObject> deleted; VSQueryAnchor anchor; };
     using Handler = std::function<void(const VSResult<Answer>&)>;
-    VSAnchoredObjectQuery(const VSObjectType* type, VSPredicate predicate, VSQueryAnchor anchor, int limit, Handler initialResultsHandler)
-        : VSQuery(type, std::move(predicate)), anchor(anchor), limit(limit), initialResultsHandler(std::move(initialResultsHandler)) {}
+    VSAnchoredObjectQuery(const VSObjectType* type, VSPredicate predicate, VSQueryAnchor since, int resultLimit, Handler handler)
+        : VSQuery(type, std::move(predicate)), anchor(since), limit(resultLimit), initialResultsHandler(std::move(handler)) {}
     const VSQueryAnchor anchor;
     const int limit;
     const Handler initialResultsHandler;
@@ -84,8 +84,8 @@ class VSAnchoredObjectQuery final : public VSQuery {
 class VSStatisticsQuery final : public VSQuery {
    public:
     using Handler = std::function<void(const VSResult<VSStatistics>&)>;
-    VSStatisticsQuery(const VSObjectType* type, VSPredicate predicate, int options, Handler completionHandler)
-        : VSQuery(type, std::move(predicate)), options(options), completionHandler(std::move(completionHandler)) {}
+    VSStatisticsQuery(const VSObjectType* type, VSPredicate predicate, int statisticsOptions, Handler handler)
+        : VSQuery(type, std::move(predicate)), options(statisticsOptions), completionHandler(std::move(handler)) {}
     const int options;
     const Handler completionHandler;
 };
@@ -94,8 +94,8 @@ class VSStatisticsQuery final : public VSQuery {
 class VSStatisticsCollectionQuery final : public VSQuery {
    public:
     using Handler = std::function<void(const VSResult<std::shared_ptr<const VSStatisticsCollection>>&)>;
-    VSStatisticsCollectionQuery(const VSObjectType* type, VSPredicate predicate, int options, VSDate anchorDate, VSDateComponents interval)
-        : VSQuery(type, std::move(predicate)), options(options), anchorDate(anchorDate), interval(interval) {}
+    VSStatisticsCollectionQuery(const VSObjectType* type, VSPredicate predicate, int statisticsOptions, VSDate anchor, VSDateComponents bucket)
+        : VSQuery(type, std::move(predicate)), options(statisticsOptions), anchorDate(anchor), interval(bucket) {}
     const int options;
     const VSDate anchorDate;
     const VSDateComponents interval;

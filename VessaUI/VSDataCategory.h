@@ -6,12 +6,17 @@
 #include <QString>
 #include <vector>
 
+/// Category IDs. Kept on disk in user activities; never reused.
+namespace VSCategoryID {
+inline constexpr int BodyMeasurements = 1, Fitness = 2, Vitals = 3, Nutrition = 4, Results = 5, Sleep = 6, ReproductiveHealth = 7, Me = 8;
+}
+
 /// A group of display types with colours and an icon. Lives in the catalogue until the process ends.
 class VSDataCategory {
    public:
     int categoryID() const { return id_; }
     QString displayName() const;
-    bool isMe() const;  // the category of characteristics
+    bool isMe() const { return id_ == VSCategoryID::Me; }  // the category of characteristics
     QColor color() const { return bottom_; }
     QColor gradientTopColor() const { return top_; }
     QColor gradientBottomColor() const { return bottom_; }

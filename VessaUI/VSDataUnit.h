@@ -9,6 +9,7 @@
 #include "VessaUI/VSTimeScopeIndex.h"
 
 class VSDataUnitGroup;
+struct VSDataUnitRow;
 
 /// A range of numbers in a unit; a bound may be absent.
 struct VSValueRange {
@@ -32,6 +33,9 @@ class VSDataUnit {
     /// An extra filter on the samples charted in a time scope (asleep and not in bed, for sleep), or none.
     std::optional<VSPredicate> chartingPredicateForTimeScope(VSTimeScopeIndex timeScope) const;
 
+    /// Its row in the tables of the catalogue (VessaUI/VSDataUnitGroupCatalogue.h): units to choose from and ranges.
+    const VSDataUnitRow& row() const { return *row_; }
+
     VSDataUnit(const VSDataUnit&) = delete;
     VSDataUnit& operator=(const VSDataUnit&) = delete;
 
@@ -40,6 +44,6 @@ class VSDataUnit {
     VSDataUnit() = default;
     const VSObjectType* dataType_ = nullptr;
     const VSDataUnitGroup* group_ = nullptr;
-    const char* labelKey_ = "";
+    const VSDataUnitRow* row_ = nullptr;
     double factor_ = 1;
 };

@@ -1,11 +1,9 @@
 #pragma once
 
+#include <QColor>
 #include <QString>
 #include <QStringList>
-#include <QColor>
 #include <memory>
-#include <optional>
-#include <span>
 #include <vector>
 
 #include "VessaUI/VSDataUnit.h"
@@ -19,12 +17,14 @@ inline constexpr int Height = 3, HeartRate = 6, WalkingRunningDistance = 7, Acti
                      MenstrualFlow = 80, UVExposure = 81, Spotting = 82;
 }
 
+struct VSDataUnitGroupRow;
+
 /// A display type: what a card, a list and an entry screen show. Lives in the catalogue until the process
 /// ends; compared by address. Immutable; texts follow the user's language.
 class VSDataUnitGroup {
    public:
-    int dataUnitGroupID() const { return id_; }
-    int categoryID() const { return categoryID_; }
+    int dataUnitGroupID() const;
+    int categoryID() const;
     QString displayName() const;
     /// One paragraph for its page; may be empty.
     QString summary() const;
@@ -39,14 +39,14 @@ class VSDataUnitGroup {
     const VSDataUnitGroupChartingRules& chartingRules() const { return *rules_; }
     bool isCharacteristic() const;
     bool isNikeFuel() const;
-    bool allowsManualEntry() const { return manualEntry_; }
-    bool showAllDataHierarchically() const { return hierarchical_; }
-    bool shouldDisplayUnitStringOnYAxis() const { return unitOnYAxis_; }
-    bool unitPreferencesRequireChangeConfirmation() const { return confirmUnitChange_; }
+    bool allowsManualEntry() const;
+    bool showAllDataHierarchically() const;
+    bool shouldDisplayUnitStringOnYAxis() const;
+    bool unitPreferencesRequireChangeConfirmation() const;
     QString unitChangeCautionaryText() const;
     /// Names of icons (platform::icon); empty: none.
-    QString unitIcon() const { return QString::fromLatin1(unitIcon_); }
-    QString groupIcon() const { return QString::fromLatin1(groupIcon_); }
+    QString unitIcon() const;
+    QString groupIcon() const;
     /// The icon of its category.
     QString listIcon() const;
 
@@ -56,15 +56,9 @@ class VSDataUnitGroup {
    private:
     friend struct VSDataUnitGroupCatalogue;
     VSDataUnitGroup() = default;
-    int id_ = 0;
-    int categoryID_ = 0;
-    const char* nameKey_ = "";  // "<nameKey>", "<nameKey>_SUMMARY", "<nameKey>_KEYWORDS" (comma separated) in the tables
+    const VSDataUnitGroupRow* row_ = nullptr;
     std::vector<const VSDataUnit*> units_;
     std::unique_ptr<const VSDataUnitGroupChartingRules> rules_;
-    const char* joinKey_ = "";
-    bool manualEntry_ = true, hierarchical_ = false, unitOnYAxis_ = false, confirmUnitChange_ = false;
-    const char* unitIcon_ = "";
-    const char* groupIcon_ = "";
 };
 
 /// The catalogue of display types.

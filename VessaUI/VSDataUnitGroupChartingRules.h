@@ -2,6 +2,8 @@
 
 #include <array>
 #include <optional>
+#include <utility>
+#include <vector>
 
 #include "Vessa/Base/VSCalendar.h"
 #include "Vessa/VSUnit.h"
@@ -17,6 +19,7 @@ class VSDataUnitGroupChartingRules {
     VSDateComponents intervalComponentsForTimeScope(VSTimeScopeIndex timeScope) const;
     VSChartStyle chartStyleForTimeScope(VSTimeScopeIndex timeScope) const;
     VSChartStyle defaultChartStyle() const;
+    /// In points of the layout.
     double chartPointRadiusForTimeScope(VSTimeScopeIndex timeScope) const;
     double chartPointLineWidthForTimeScope(VSTimeScopeIndex timeScope) const;
     bool shouldStartDayAtNoon() const { return startDayAtNoon_; }
@@ -26,16 +29,22 @@ class VSDataUnitGroupChartingRules {
 
     struct Bounds { std::optional<double> minimum, maximum; int decimalPrecision = 0; };
     /// Widens a range of data, in `unit` as shown, to the bounds of a chart: round numbers with room for the data.
-    /// The number of fraction digits is what the round numbers need. Bars always stand on 0.
+    /// The number of fraction digits is what the round numbers need. Bars always stand on 0. No bounds when the
+    /// data is not finite or minimum > maximum.
     Bounds calculateAdjustedBounds(double minimum, double maximum, const VSUnit& unit) const;
 
    private:
     friend struct VSDataUnitGroupCatalogue;
+    Bounds boundsFromZero(double maximum, int precision) const;
+    Bounds boundsAround(double minimum, double maximum, int precision) const;
+
     std::array<VSDateComponents, 5> intervals_{};
     std::array<VSChartStyle, 5> styles_{};
     std::array<double, 5> pointRadius_{};
     std::array<double, 5> pointLineWidth_{};
+    VSChartStyle defaultStyle_ = VSChartStyle::None;
     bool startDayAtNoon_ = false;
     bool hideAverageLine_ = false;
+    std::optional<double> ceiling_;  // what a value can never exceed: 100 for percentages
     std::vector<std::pair<VSUnit, int>> precisions_;  // per unit that the user may choose
 };

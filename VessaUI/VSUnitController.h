@@ -12,7 +12,8 @@
 
 /// The user's preferred units, kept in the health service's default values (key "VSPreferredUnits": a
 /// dictionary from type identifier to unit string). A preference not set follows the user's region (US
-/// customary in US, LR, MM; glucose in mmol/L where that is customary ...). Main thread only.
+/// customary in US, LR, MM; glucose in mmol/L where that is customary ...) and its changes. Until the stored
+/// preferences have been read the region's units answer; the signal tells when that changed anything. Main thread only.
 class VSUnitController : public QObject {
     Q_OBJECT
    public:
@@ -21,7 +22,7 @@ class VSUnitController : public QObject {
     VSUnit unitForDataUnit(const VSDataUnit* dataUnit) const;
     /// The units that the user may choose for a display type; empty when there is no choice to offer at all.
     std::vector<VSUnit> availableUnits(const VSDataUnitGroup* group) const;
-    /// Stores the choice and tells everyone.
+    /// Stores the choice and tells everyone. REQUIRES: one of the units offered for the data unit.
     void updatePreferredUnit(const VSUnit& unit, const VSDataUnit* dataUnit);
 
     /// The unit's name in the user's unit for the data unit: "kg", "steps"; for a number in its plural form.
@@ -40,8 +41,19 @@ class VSUnitController : public QObject {
     void unitPreferencesDidChange(const QSet<const VSObjectType*>& changedTypes);
 
    private:
+    enum class LoadState { Loading, Loaded, Failed };
+    void load();
     void preferencesLoaded(const VSValue::Dictionary& stored);
+    void save();
+    void localeDidChange();
+    QString nameOfUnit(const VSDataUnit* dataUnit, const VSUnit& unit, std::optional<double> value) const;
+    std::optional<VSValueRange> rangeInPreferredUnit(const VSDataUnit* dataUnit, const VSValueRange& range) const;
+
     std::shared_ptr<VSHealthStore> healthStore_;
+    LoadState loadState_ = LoadState::Loading;
+    bool saveWhenLoaded_ = false;
+    VSValue::Dictionary stored_;  // as read and changed, with the entries that this version does not understand
     std::map<const VSObjectType*, VSUnit> preferred_;
+    std::map<const VSObjectType*, VSUnit> defaultsTold_;  // the region's, as observers know them
     std::shared_ptr<bool> alive_ = std::make_shared<bool>(true);
 };

@@ -36,7 +36,7 @@ class VSDate {
     double secondsSinceReferenceDate() const;
     constexpr TimePoint timePoint() const { return time_; }
 
-    friend constexpr auto operator<=>(const VSDate&, const VSDate&) = default;
+    friend constexpr auto operator<=>(const VSDate&, const VSDate&) = default;  // NOLINT(modernize-use-nullptr)
     friend constexpr VSDate operator+(VSDate date, VSDuration duration) { return VSDate(date.time_ + duration); }
     friend constexpr VSDate operator-(VSDate date, VSDuration duration) { return VSDate(date.time_ - duration); }
     friend constexpr VSDuration operator-(VSDate a, VSDate b) { return a.time_ - b.time_; }

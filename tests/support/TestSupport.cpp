@@ -4,10 +4,16 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <ostream>
+
+void PrintTo(const VSDate& date, std::ostream* stream) {
+    *stream << VSISO8601FromDate(date, VSCalendar("Etc/UTC", "en_US"));
+}
 
 namespace test {
 
-FixedEnvironment::FixedEnvironment(const std::string& now, const std::string& zone, const std::string& locale) {
+FixedEnvironment::FixedEnvironment(const std::string& now, const std::string& zone,
+                                   const std::string& locale) {
     const auto start = VSDateFromISO8601(now, VSCalendar(zone, locale));
     if (!start) {
         std::fprintf(stderr, "not a date: %s\n", now.c_str());
@@ -17,7 +23,9 @@ FixedEnvironment::FixedEnvironment(const std::string& now, const std::string& zo
     previous_ = VSEnvironment::install(environment_);
 }
 
-FixedEnvironment::~FixedEnvironment() { VSEnvironment::install(previous_); }
+FixedEnvironment::~FixedEnvironment() {
+    VSEnvironment::install(previous_);
+}
 
 VSDate date(const std::string& iso) {
     const auto result = VSDateFromISO8601(iso, VSCalendar::current());

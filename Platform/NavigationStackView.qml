@@ -1,0 +1,124 @@
+import QtQuick
+import QtQuick.Templates as T
+
+// A navigation bar, and the screens of a stack sliding over each other beneath it.
+FocusScope {
+    id: root
+    property var stack: null
+    readonly property bool busy: screens.busy
+    readonly property int slide: mirrored ? -width : width
+    property bool mirrored: false
+
+    Rectangle {
+        id: bar
+        width: parent.width
+        height: SystemStyle.navigationBarHeight
+        color: SystemStyle.bar
+        z: 2
+
+        T.Button {
+            id: back
+            visible: root.stack ? root.stack.canGoBack : false
+            anchors.left: parent.left
+            anchors.leftMargin: 4
+            height: parent.height
+            width: Math.min(implicitWidth, (parent.width - title.implicitWidth) / 2 - 8, parent.width / 3)
+            implicitWidth: backRow.implicitWidth + 8
+            text: root.stack ? root.stack.backTitle : ""
+            onClicked: root.stack.pop()
+            Keys.onReturnPressed: click()
+            Keys.onEnterPressed: click()
+            contentItem: Item {
+                Row {
+                    id: backRow
+                    anchors.verticalCenter: parent.verticalCenter
+                    anchors.left: parent.left
+                    anchors.leftMargin: 4
+                    spacing: 6
+                    opacity: back.down ? 0.3 : 1
+                    Item { // a chevron
+                        width: 12
+                        height: 20
+                        anchors.verticalCenter: parent.verticalCenter
+                        scale: root.mirrored ? -1 : 1
+                        Rectangle { x: 0; y: 5.5; width: 13; height: 2; radius: 1; rotation: -45; color: SystemStyle.tint }
+                        Rectangle { x: 0; y: 13; width: 13; height: 2; radius: 1; rotation: 45; color: SystemStyle.tint }
+                    }
+                    Text {
+                        text: back.text
+                        color: SystemStyle.tint
+                        font.pixelSize: SystemStyle.bodySize
+                        width: Math.min(implicitWidth, Math.max(0, back.width - 34))
+                        elide: Text.ElideRight
+                    }
+                }
+            }
+            FocusRing { shown: back.visualFocus }
+        }
+
+        Text {
+            id: title
+            anchors.centerIn: parent
+            width: Math.min(implicitWidth, parent.width - 2 * (back.visible ? Math.max(back.width, 44) + 8 : 12))
+            text: root.stack ? root.stack.topScreen.title : ""
+            color: SystemStyle.text
+            font.pixelSize: SystemStyle.bodySize
+            font.bold: true
+            elide: Text.ElideRight
+            Accessible.role: Accessible.Heading
+            Accessible.name: text
+        }
+
+        Rectangle {
+            // A screen with a palette draws the line beneath that.
+            visible: !(screens.currentItem && screens.currentItem.hasPalette === true)
+            anchors.bottom: parent.bottom
+            width: parent.width
+            height: SystemStyle.pixel
+            color: SystemStyle.hairline
+        }
+    }
+
+    T.StackView {
+        id: screens
+        anchors.fill: parent
+        anchors.topMargin: bar.height
+        clip: busy
+        focus: true
+        readonly property int duration: 250
+        pushEnter: Transition { NumberAnimation { property: "x"; from: root.slide; to: 0; duration: screens.duration; easing.type: Easing.OutCubic } }
+        pushExit: Transition { NumberAnimation { property: "x"; from: 0; to: -root.slide / 3; duration: screens.duration; easing.type: Easing.OutCubic } }
+        popEnter: Transition { NumberAnimation { property: "x"; from: -root.slide / 3; to: 0; duration: screens.duration; easing.type: Easing.OutCubic } }
+        popExit: Transition { NumberAnimation { property: "x"; from: 0; to: root.slide; duration: screens.duration; easing.type: Easing.OutCubic } }
+        onBusyChanged: if (!busy && root.stack) root.stack.transitionFinished()
+
+        function show(screen, animated) {
+            push(screen.view, { screen: screen }, animated ? T.StackView.PushTransition : T.StackView.Immediate)
+        }
+    }
+
+    Connections {
+        target: root.stack
+        function onPushed(screen, animated) {
+            screens.show(screen, animated && root.visible)
+            screens.currentItem.forceActiveFocus()
+        }
+        function onPopped(count, animated) {
+            screens.pop(screens.get(screens.depth - 1 - count), animated && root.visible ? T.StackView.PopTransition : T.StackView.Immediate)
+            screens.currentItem.forceActiveFocus()
+        }
+    }
+
+    Component.onCompleted: screens.show(stack.rootScreen, false)
+
+    Keys.onPressed: event => {
+        const backKey = root.mirrored ? Qt.Key_Right : Qt.Key_Left
+        if (event.key === Qt.Key_Back || event.key === Qt.Key_Escape ||
+                (event.key === backKey && (event.modifiers & Qt.AltModifier))) {
+            if (root.stack.canGoBack) {
+                root.stack.pop()
+                event.accepted = true
+            }
+        }
+    }
+}

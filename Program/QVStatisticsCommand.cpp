@@ -1,0 +1,303 @@
+#include <algorithm>
+#include <sstream>
+
+#include "Program/QVCommand.h"
+#include "Program/QVTabOutput.h"
+
+namespace {
+
+/// What was asked for.
+struct Request {
+    std::vector<const VSObjectType*> types;
+    bool manyTypes = false;
+    std::optional<VSDate> from, to;
+    std::optional<std::string> every;  // none: the range as a whole
+    std::vector<std::string> columns;  // of sum, average, minimum, maximum, as asked for
+    int options = 0;
+    bool bySource = false, emptyBuckets = false;
+    std::vector<std::string> units;
+};
+
+struct StatisticName {
+    std::string_view name;
+    int option;
+    std::optional<double> VSStatistics::*merged;
+    std::optional<double> VSStatistics::OfSource::*ofSource;
+};
+constexpr StatisticName kStatistics[] = {
+    {"sum", VSStatisticsOptionCumulativeSum, &VSStatistics::sum, &VSStatistics::OfSource::sum},
+    {"average", VSStatisticsOptionDiscreteAverage, &VSStatistics::average, &VSStatistics::OfSource::average},
+    {"minimum", VSStatisticsOptionDiscreteMin, &VSStatistics::minimum, &VSStatistics::OfSource::minimum},
+    {"maximum", VSStatisticsOptionDiscreteMax, &VSStatistics::maximum, &VSStatistics::OfSource::maximum},
+};
+const StatisticName* statisticNamed(std::string_view name) {
+    const auto found = std::find_if(std::begin(kStatistics), std::end(kStatistics),
+                                    [&](const auto& one) { return one.name == name; });
+    return found == std::end(kStatistics) ? nullptr : found;
+}
+
+struct Interval {
+    std::string_view name;
+    VSDateComponents length;
+};
+constexpr Interval kIntervals[] = {{"hour", {.hours = 1}},
+                                   {"day", {.days = 1}},
+                                   {"week", {.days = 7}},
+                                   {"month", {.months = 1}},
+                                   {"year", {.years = 1}}};
+const Interval* intervalNamed(std::string_view name) {
+    const auto found = std::find_if(std::begin(kIntervals), std::end(kIntervals),
+                                    [&](const auto& one) { return one.name == name; });
+    return found == std::end(kIntervals) ? nullptr : found;
+}
+
+/// The beginning of the hour, day, week, month or year that a moment lies in.
+VSDate beginning(std::string_view interval, VSDate date, const VSCalendar& calendar) {
+    if (interval == "hour") return calendar.startOfHour(date);
+    if (interval == "month") return calendar.startOfMonth(date);
+    if (interval == "year")
+        return calendar.date(calendar.component(VSCalendarUnit::Year, date), 1, 1)
+            .value_or(calendar.startOfMonth(date));
+    const VSDate day = calendar.startOfDay(date);
+    if (interval != "week") return day;
+    return calendar.addDays(
+        day, -((calendar.component(VSCalendarUnit::Weekday, day) - calendar.firstWeekday() + 7) % 7));
+}
+
+VSError usage(std::string message) {
+    return VSError{VSErrorCode::Invalid, std::move(message)};
+}
+
+VSStatus readColumns(const QVCommandArguments& arguments, Request& request) {
+    std::istringstream list(arguments.value("options").value_or("sum,average,minimum,maximum"));
+    for (std::string name; std::getline(list, name, ',');) {
+        const StatisticName* statistic = statisticNamed(name);
+        if (!statistic) return usage("--options: " + name + " is not one of sum, average, minimum, maximum");
+        if (request.options & statistic->option) continue;
+        request.options |= statistic->option;
+        request.columns.push_back(name);
+    }
+    if (request.columns.empty()) return usage("--options names nothing");
+    return {};
+}
+
+VSResult<Request> readRequest(const QVCommandArguments& arguments) {
+    Request request;
+    if (const VSStatus status = readColumns(arguments, request); !status) return status.error();
+    for (const auto& [option, date] : {std::pair("from", &request.from), std::pair("to", &request.to)}) {
+        const auto given = QVDateOption(arguments, option);
+        if (!given) return given.error();
+        *date = *given;
+    }
+    if (request.from && request.to && *request.from >= *request.to) return usage("--to is not after --from");
+    request.every = arguments.value("every");
+    if (request.every && !intervalNamed(*request.every))
+        return usage("--every: " + *request.every + " is not one of hour, day, week, month, year");
+    request.bySource = arguments.has("by-source");
+    request.emptyBuckets = arguments.has("empty");
+    request.units = arguments.values("unit");
+    if (request.bySource) request.options |= VSStatisticsOptionSeparateBySource;
+    return request;
+}
+
+/// The statistics of one type as rows.
+class TypeStatistics {
+ public:
+    TypeStatistics(VSHealthStore& store, const Request& request, const VSHealthStore::TypeSummary& summary,
+                   QVTabOutput& output)
+        : store_(store),
+          request_(request),
+          type_(summary.type),
+          output_(output),
+          from_(request.from.value_or(summary.firstStart)),
+          to_(request.to.value_or(summary.lastEnd + VSDuration(1))) {
+        if (request.every) beginning_ = beginning(*request.every, from_, calendar_);
+        // Without a date given, the range is that of the records, in whole intervals.
+        if (request.every && !request.from) from_ = beginning_;
+    }
+
+    VSStatus write() {
+        if (const VSStatus status = findUnit(); !status) return status;
+        if (from_ >= to_) return {};
+        if (!type_->isQuantityType()) return writeCounts();
+        const auto predicate = VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionNone);
+        if (!request_.every) {
+            auto statistics = store_.statistics(type_, predicate, request_.options);
+            if (!statistics) return statistics.error();
+            statistics->startDate = from_;
+            statistics->endDate = to_;
+            writeRows(*statistics);
+            return {};
+        }
+        const auto collection = store_.statisticsCollection(type_, predicate, request_.options, beginning_,
+                                                            intervalNamed(*request_.every)->length);
+        if (!collection) return collection.error();
+        if (request_.emptyBuckets)
+            (*collection)->enumerateStatistics(from_, to_, [this](const VSStatistics& one) {
+                writeRows(one);
+            });
+        else
+            for (const VSStatistics& one : (*collection)->statistics()) writeRows(one);
+        return {};
+    }
+
+ private:
+    /// The first of the units asked for that fits the type, else the type's own.
+    VSStatus findUnit() {
+        if (!type_->isQuantityType()) return {};
+        unit_ = type_->canonicalUnit();
+        std::string problem;
+        for (const std::string& text : request_.units) {
+            const auto unit = type_->unitFromString(text);
+            if (unit) {
+                unit_ = *unit;
+                return {};
+            }
+            problem = unit.error().message;
+        }
+        if (!problem.empty() && !request_.manyTypes) return usage("--unit: " + problem);
+        return {};
+    }
+
+    std::string value(const std::optional<double>& canonical) const {
+        return canonical ? QVTabOutput::number(type_->canonicalUnit().convert(*canonical, *unit_))
+                         : std::string();
+    }
+
+    void writeRow(VSDate start, VSDate end, std::string_view source, int64_t count,
+                  const std::vector<std::string>& values) {
+        std::vector<std::string> fields;
+        if (request_.manyTypes) fields.emplace_back(type_->name());
+        fields.insert(fields.end(), {output_.date(start), output_.date(end)});
+        if (request_.bySource) fields.emplace_back(source);
+        fields.push_back(std::to_string(count));
+        fields.insert(fields.end(), values.begin(), values.end());
+        fields.push_back(unit_ ? unit_->unitString() : "");
+        output_.row(fields);
+    }
+
+    void writeRows(const VSStatistics& statistics) {
+        std::vector<std::string> values;
+        for (const std::string& column : request_.columns)
+            values.push_back(value(statistics.*statisticNamed(column)->merged));
+        writeRow(statistics.startDate, statistics.endDate, "", statistics.count, values);
+        if (!request_.bySource) return;
+        for (const auto& [source, ofSource] : statistics.bySource) {
+            values.clear();
+            for (const std::string& column : request_.columns)
+                values.push_back(value(ofSource.*statisticNamed(column)->ofSource));
+            writeRow(statistics.startDate, statistics.endDate, source.name, ofSource.count, values);
+        }
+    }
+
+    /// Records without a quantity can only be counted, by the interval that they start in.
+    VSStatus writeCounts() {
+        std::vector<VSDate> boundaries{from_, to_};
+        if (request_.every)
+            boundaries =
+                calendar_.bucketBoundaries(beginning_, intervalNamed(*request_.every)->length, from_, to_);
+        const auto samples =
+            store_.samples(type_, VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionStrictStartDate),
+                           VSObjectQueryNoLimit, {{VSSampleSortIdentifierStartDate, true}});
+        if (!samples) return samples.error();
+        auto next = samples->begin();
+        for (size_t i = 0; i + 1 < boundaries.size(); ++i) {
+            std::map<std::string, int64_t> bySource;
+            int64_t count = 0;
+            for (; next != samples->end() && (*next)->startDate() < boundaries[i + 1]; ++next, ++count) {
+                ++bySource[(*next)->sourceRevision().source.name];
+            }
+            if (count == 0 && !request_.emptyBuckets) continue;
+            const std::vector<std::string> none(request_.columns.size());
+            writeRow(boundaries[i], boundaries[i + 1], "", count, none);
+            if (!request_.bySource) continue;
+            for (const auto& [source, ofSource] : bySource)
+                writeRow(boundaries[i], boundaries[i + 1], source, ofSource, none);
+        }
+        return {};
+    }
+
+    VSHealthStore& store_;
+    const Request& request_;
+    const VSObjectType* const type_;
+    QVTabOutput& output_;
+    const VSCalendar calendar_ = VSCalendar::current();
+    VSDate from_, to_, beginning_;
+    std::optional<VSUnit> unit_;
+};
+
+void writeHeader(const Request& request, QVTabOutput& output) {
+    std::vector<std::string> header;
+    if (request.manyTypes) header.emplace_back("type");
+    header.insert(header.end(), {"start", "end"});
+    if (request.bySource) header.emplace_back("source");
+    header.emplace_back("count");
+    header.insert(header.end(), request.columns.begin(), request.columns.end());
+    header.emplace_back("unit");
+    output.row(header);
+}
+
+/// The summaries of the types asked for that have records, in the order of their names.
+VSResult<std::vector<VSHealthStore::TypeSummary>> summariesOf(VSHealthStore& store,
+                                                              const VSObjectType* only) {
+    auto summaries = store.typeSummaries();
+    if (!summaries) return summaries;
+    if (only) std::erase_if(*summaries, [only](const auto& summary) { return summary.type != only; });
+    std::sort(summaries->begin(), summaries->end(),
+              [](const auto& a, const auto& b) { return a.type->name() < b.type->name(); });
+    return summaries;
+}
+
+QVExitStatus run(const QVCommandContext& context) {
+    const auto& words = context.arguments.words();
+    if (words.size() != 1) return QVFailUsage("statistics", "statistics needs one type, or the word all");
+    auto request = readRequest(context.arguments);
+    if (!request) return QVFailUsage("statistics", request.error().message);
+    const VSObjectType* only = nullptr;
+    request->manyTypes = words[0] == "all";
+    if (!request->manyTypes) {
+        const auto type = QVTypeForArgument(words[0]);
+        if (!type) return QVFail(type.error());
+        only = *type;
+    }
+    auto store = QVOpenStoreForReading(context.storeFolder);
+    if (!store) return QVFail(store.error());
+    const auto summaries = summariesOf(**store, only);
+    if (!summaries) return QVFail(summaries.error());
+    QVTabOutput output;
+    writeHeader(*request, output);
+    for (const auto& summary : *summaries) {
+        if (const VSStatus status = TypeStatistics(**store, *request, summary, output).write(); !status)
+            return QVFail(status.error());
+    }
+    if (const VSStatus status = output.finish(); !status) return QVFail(status.error());
+    return QVExitStatus::Success;
+}
+
+constexpr QVCommandOption kOptions[] = {{"from", true},    {"to", true},         {"every", true},
+                                        {"options", true}, {"by-source", false}, {"unit", true},
+                                        {"empty", false}};
+
+}  // namespace
+
+const QVCommand QVStatisticsCommand{
+    "statistics", "sums, averages, minima and maxima per hour, day, week, month or year",
+    R"(Usage: qelvar statistics TYPE|all [--from D] [--to D] [--every hour|day|week|month|year]
+                         [--options sum,average,minimum,maximum] [--by-source] [--unit U]... [--empty]
+
+Average, minimum and maximum are over the records that start in the interval; a sum takes of each record the part
+that lies in the interval, in proportion to time. Records without a quantity (sleep, workouts ...) are counted only.
+Intervals follow the calendar of the time zone (TZ); weeks begin as in the locale (LANG).
+
+Standard output: type (with `all`), start, end, source (with --by-source), count, the statistics asked for, unit; a row
+for each interval that has a value. A statistic of nothing is an empty field.
+
+  --from D, --to D   the range, from D up to but not including D (2020-03-01, 2020-03-01T12:00, 2020-03-01T12:00+01:00);
+                     by default that of the records. Nothing outside of it counts, in the first interval neither
+  --every INTERVAL   by default one row for the range as a whole
+  --options LIST     by default all four
+  --by-source        after each row, which counts no moment from two sources, a row for each source alone
+  --unit U           by default the unit of the store; may be given several times, the first that fits the type is used
+  --empty            rows for intervals without a value too
+)",
+    kOptions, run};

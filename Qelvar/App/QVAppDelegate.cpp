@@ -1,0 +1,155 @@
+#include "Qelvar/App/QVAppDelegate.h"
+
+#include "Platform/Localization.h"
+#include "Platform/SystemEvents.h"
+#include "Qelvar/App/QVPlaceholderViewController.h"
+#include "Qelvar/Controllers/QVUserActivityManager.h"
+#include "Vessa/Base/VSLog.h"
+
+namespace {
+
+constexpr const char* kDemoDataSex = "DemoDataSex";
+
+std::string demoDataSexDefault() {
+    const auto value = platform::UserDefaults::standard().value(kDemoDataSex);
+    return value && value->string() ? *value->string() : std::string();
+}
+
+std::optional<int> indexOfTab(const QString& tab) {
+    const char* const tabs[] = {QVUserActivityTab::Dashboard, QVUserActivityTab::HealthData,
+                                QVUserActivityTab::Sources, QVUserActivityTab::MedicalID};
+    for (int index = 0; index < 4; ++index)
+        if (tab == QLatin1String(tabs[index])) return index;
+    return std::nullopt;
+}
+
+/// The screen of a tab whose rooms are not built yet.
+std::unique_ptr<platform::NavigationStack> placeholderStack(
+    const char* stackIdentifier, const char* titleKey, const char* icon, const char* messageKey,
+    const char* tab, std::vector<QVPlaceholderViewController::Action> actions = {}) {
+    auto screen = std::make_unique<QVPlaceholderViewController>(
+        [titleKey] { return platform::localized(titleKey); }, QString::fromLatin1(icon), messageKey,
+        std::move(actions));
+    screen->setUserActivity(QVUserActivityManager::activity(screen->title(), {}, tab));
+    return std::make_unique<platform::NavigationStack>(QString::fromLatin1(stackIdentifier),
+                                                       std::move(screen));
+}
+
+}  // namespace
+
+QVAppDelegate::QVAppDelegate(std::shared_ptr<VSHealthStore> healthStore, bool medicalIDIsSupported)
+    : healthStore_(std::move(healthStore)), medicalIDIsSupported_(medicalIDIsSupported) {}
+
+QVAppDelegate::~QVAppDelegate() = default;
+
+void QVAppDelegate::willFinishLaunching() {
+    controllerManager_ = std::make_shared<QVControllerManager>(healthStore_, &QVDemoDataHead);
+    importController_ = std::make_unique<QVImportController>(healthStore_);
+
+    std::vector<QVTabBarController::Tab> tabs;
+    tabs.push_back(
+        {"DASHBOARD", QStringLiteral("dashboard"), QStringLiteral("dashboard_selected"), dashboardStack()});
+    tabs.push_back({"HEALTH_DATA", QStringLiteral("healthdata"), QStringLiteral("healthdata_selected"),
+                    healthDataStack()});
+    tabs.push_back(
+        {"SOURCES", QStringLiteral("sources"), QStringLiteral("sources_selected"), sourcesStack()});
+    if (medicalIDIsSupported_) {
+        tabs.push_back({"MEDICAL_ID", QStringLiteral("medical_ID"), QStringLiteral("medical_ID_selected"),
+                        medicalIDStack()});
+        medicalIDNavigationStack_ = tabs.back().stack.get();
+    }
+    tabBarController_ = std::make_unique<QVTabBarController>(std::move(tabs));
+    tabBarController_->setShouldSelect([this](int index) { return shouldSelectTab(index); });
+    connect(&platform::SystemEvents::shared(), &platform::SystemEvents::localeDidChange, this, [this] {
+        tabBarController_->updateTitles();
+        emit localeChanged();
+    });
+}
+
+void QVAppDelegate::didFinishLaunching() {
+    tabBarController_->show();
+}
+
+std::unique_ptr<platform::NavigationStack> QVAppDelegate::dashboardStack() {
+    auto detailScreen = [](const VSDataUnitGroup* group) -> std::unique_ptr<platform::Screen> {
+        return std::make_unique<QVPlaceholderViewController>([group] { return group->displayName(); },
+                                                             group->listIcon(), "DATA_TYPE_PENDING");
+    };
+    auto screen = std::make_unique<QVDashboardViewController>(controllerManager_, detailScreen);
+    dashboard_ = screen.get();
+    connect(dashboard_, &QVDashboardViewController::importRequested, this, &QVAppDelegate::importRequested);
+    return std::make_unique<platform::NavigationStack>(QStringLiteral("Dashboard Navigation Controller"),
+                                                       std::move(screen));
+}
+
+std::unique_ptr<platform::NavigationStack> QVAppDelegate::healthDataStack() {
+    return placeholderStack("Health Data Navigation Controller", "HEALTH_DATA", "healthdata_selected",
+                            "HEALTH_DATA_PENDING", QVUserActivityTab::HealthData,
+                            {{"IMPORT_ACTION", [this] { emit importRequested(); }}});
+}
+
+std::unique_ptr<platform::NavigationStack> QVAppDelegate::sourcesStack() {
+    return placeholderStack("Sources Navigation Controller", "SOURCES", "sources_selected", "SOURCES_PENDING",
+                            QVUserActivityTab::Sources);
+}
+
+std::unique_ptr<platform::NavigationStack> QVAppDelegate::medicalIDStack() {
+    return placeholderStack("Medical ID Navigation Controller", "MEDICAL_ID", "medical_ID_selected",
+                            "MEDICAL_ID_PENDING", QVUserActivityTab::MedicalID);
+}
+
+bool QVAppDelegate::shouldSelectTab(int index) const {
+    // A second tap on the Medical ID would leave its editor half way.
+    const bool isMedicalID =
+        medicalIDNavigationStack_ && tabBarController_->stack(index) == medicalIDNavigationStack_;
+    return !(isMedicalID && tabBarController_->selectedIndex() == index);
+}
+
+void QVAppDelegate::didBecomeActive() {
+    if (!QVUsesDemoData() || isResettingDemoData()) return;
+    const std::string demoDataSex = demoDataSexDefault();
+    if (!demoData_)
+        demoData_ = std::make_unique<QVDemoData>(healthStore_, controllerManager_->unitController(),
+                                                 [this] { dashboard_->reloadTable(); });
+    // The document is long: it is read only when it is needed, and not by the main thread.
+    if (!demoData_->isDue(demoDataSex)) return;
+    loadingDemoData_ = true;
+    if (!worker_) worker_ = platform::makeSerialQueue("demo data");
+    worker_->async([this, demoDataSex, alive = std::weak_ptr<bool>(alive_)] {
+        auto dictionary = QVDemoDataDictionary();
+        platform::mainQueue().async([this, demoDataSex, alive, dictionary = std::move(dictionary)]() mutable {
+            if (!alive.expired()) resetDemoData(std::move(dictionary), demoDataSex);
+        });
+    });
+}
+
+void QVAppDelegate::resetDemoData(VSResult<VSValue::Dictionary> dictionary, const std::string& demoDataSex) {
+    loadingDemoData_ = false;
+    if (dictionary)
+        demoData_->resetDemoData(std::move(*dictionary), demoDataSex);
+    else
+        VSLog(VSLogLevel::Error, "The demonstration's records cannot be read: " + dictionary.error().message);
+}
+
+bool QVAppDelegate::continueUserActivity(const platform::UserActivity& activity) {
+    if (activity.activityType != QLatin1String(QVUserActivityManager::TabActivityType)) return false;
+    const QString tab = activity.userInfo.value(QString::fromLatin1(QVUserActivityKey::MainTab)).toString();
+    if (const auto index = indexOfTab(tab)) tabBarController_->setSelectedIndex(*index);
+    platform::NavigationStack* stack = tabBarController_->selectedStack();
+    stack->popToRoot(false);
+    stack->rootScreen()->restoreUserActivityState(activity);
+    return true;
+}
+
+bool QVAppDelegate::openLink(const QString& link) {
+    const auto activity = QVUserActivityManager::activityFromLink(link);
+    return activity && continueUserActivity(*activity);
+}
+
+QColor QVAppDelegate::keyColor() const {
+    return VSDataUnitGroupController::shared().keyColor();
+}
+
+bool QVAppDelegate::isRightToLeft() const {
+    return platform::isRightToLeft();
+}

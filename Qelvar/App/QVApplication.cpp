@@ -1,0 +1,146 @@
+#include "Qelvar/App/QVApplication.h"
+
+#include <QGuiApplication>
+#include <QIcon>
+#include <QQmlEngine>
+#include <QQuickItem>
+#include <QQuickView>
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+
+#include "Platform/Icons.h"
+#include "Platform/Localization.h"
+#include "Platform/SystemEvents.h"
+#include "Platform/UserDefaults.h"
+#include "Qelvar/App/QVAppDelegate.h"
+#include "Qelvar/App/QVIconProvider.h"
+#include "Qelvar/App/QVScreenshots.h"
+#include "Qelvar/App/QVStartupTrace.h"
+#include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
+#include "Qelvar/DataProviders/QVUserDefaults.h"
+
+namespace {
+
+constexpr QSize kPhoneSize(375, 667);
+constexpr QSize kSmallestSize(320, 320);
+
+bool hasDisplay() {
+    return qEnvironmentVariableIsSet("WAYLAND_DISPLAY") || qEnvironmentVariableIsSet("DISPLAY") ||
+           qEnvironmentVariableIsSet("QT_QPA_PLATFORM");
+}
+
+/// Settings that must stand before the QGuiApplication is made.
+void chooseGraphics(const QVApplicationOptions& options) {
+    if (options.scale > 0) qputenv("QT_SCALE_FACTOR", QByteArray::number(options.scale));
+    if (!options.screenshots) return;
+    if (!qEnvironmentVariableIsSet("QT_QPA_PLATFORM")) qputenv("QT_QPA_PLATFORM", "offscreen");
+    QQuickWindow::setGraphicsApi(QSGRendererInterface::Software);
+}
+
+void registerTypes() {
+    qmlRegisterType<QVDashboardTableViewCell>("Qelvar.Items", 1, 0, "QVDashboardTableViewCell");
+    qmlRegisterUncreatableType<QVImportController>("Qelvar.Items", 1, 0, "QVImportController",
+                                                   QStringLiteral("made by the application"));
+}
+
+VSResult<std::shared_ptr<VSHealthStore>> openStore(const std::filesystem::path& folder, bool demo) {
+    std::error_code error;
+    std::filesystem::create_directories(folder.parent_path(), error);
+    if (error)
+        return VSError{VSErrorCode::NotAccessible, folder.parent_path().string() + ": " + error.message()};
+    auto store = VSHealthStore::open(folder);
+    if (!store) return store;
+    platform::UserDefaults::setStandard(
+        std::make_unique<platform::UserDefaults>(folder / "user-defaults.json"));
+    auto& defaults = platform::UserDefaults::standard();
+    if (demo && !defaults.boolean("UseDemoData")) defaults.setValue("UseDemoData", true);
+    QVUserDefaults::sharedDefaults().setHealthStore(*store);
+    return store;
+}
+
+void setUpWindow(QQuickView& window, QVAppDelegate& app, QSize size) {
+    window.engine()->addImageProvider(QStringLiteral("icon"), new QVIconProvider);
+    window.setTitle(QStringLiteral("Qelvar"));
+    window.setIcon(QGuiApplication::windowIcon());
+    window.setColor(Qt::white);
+    window.setResizeMode(QQuickView::SizeRootObjectToView);
+    window.setMinimumSize(kSmallestSize);
+    window.resize(size.isValid() ? size : kPhoneSize);
+    window.setInitialProperties({{QStringLiteral("app"), QVariant::fromValue(&app)}});
+    window.setSource(QUrl(QStringLiteral("qrc:/Qelvar/QVTabBarController.qml")));
+}
+
+/// Waits until the demonstration's records are those of today, so that no picture shows half of them.
+void finishDemoData(QVAppDelegate& app) {
+    app.didBecomeActive();
+    while (app.isResettingDemoData())
+        QCoreApplication::processEvents(QEventLoop::AllEvents | QEventLoop::WaitForMoreEvents, 50);
+}
+
+int runWindow(QGuiApplication& application, QVAppDelegate& app, const QVApplicationOptions& options) {
+    app.willFinishLaunching();
+    QVStartupTrace::note("controllers");
+    // The pictures are of the finished demonstration; a person sees it grow.
+    if (options.screenshots) finishDemoData(app);
+    QQuickView window;
+    setUpWindow(window, app, options.size);
+    if (!window.rootObject()) return 1;
+    QVStartupTrace::note("screens laid out");
+    app.didFinishLaunching();
+    if (!options.openLink.isEmpty() && !app.openLink(options.openLink))
+        std::fprintf(stderr, "qelvar: not a link of the application: %s\n", qPrintable(options.openLink));
+    window.show();
+    QVStartupTrace::watch(window);
+    if (options.screenshots) return QVScreenshots(window, app, *options.screenshots).takeAll() ? 0 : 1;
+
+    QObject::connect(&application, &QGuiApplication::applicationStateChanged, &app,
+                     [&app](Qt::ApplicationState state) {
+                         if (state == Qt::ApplicationActive) app.didBecomeActive();
+                     });
+    QMetaObject::invokeMethod(&app, &QVAppDelegate::didBecomeActive, Qt::QueuedConnection);
+    return QGuiApplication::exec();
+}
+
+}  // namespace
+
+std::filesystem::path QVStoreFolder(bool demo) {
+    const char* name = demo ? "qelvar-demo" : "qelvar";
+    // A relative path there is to be ignored.
+    if (const char* data = std::getenv("XDG_DATA_HOME"); data && data[0] == '/')
+        return std::filesystem::path(data) / name;
+    const char* home = std::getenv("HOME");
+    return std::filesystem::path(home ? home : "/") / ".local/share" / name;
+}
+
+int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options) {
+    if (!options.screenshots && !hasDisplay()) {
+        std::fprintf(stderr, "qelvar: there is no display (neither WAYLAND_DISPLAY nor DISPLAY is set)\n");
+        return 1;
+    }
+    chooseGraphics(options);
+    QGuiApplication application(argc, argv);
+    QGuiApplication::setApplicationName(QStringLiteral("qelvar"));
+    QGuiApplication::setApplicationDisplayName(QStringLiteral("Qelvar"));
+    QGuiApplication::setDesktopFileName(QStringLiteral("org.qelvar.Qelvar"));
+    QGuiApplication::setWindowIcon(
+        QIcon(QPixmap::fromImage(platform::icon(QStringLiteral("qelvar"), {128, 128}, 1))));
+    QVStartupTrace::note("application object");
+    platform::loadTranslations();
+    QGuiApplication::setLayoutDirection(platform::isRightToLeft() ? Qt::RightToLeft : Qt::LeftToRight);
+    platform::SystemEvents::shared().start();
+    registerTypes();
+
+    const std::filesystem::path folder = options.store.empty() ? QVStoreFolder(options.demo) : options.store;
+    auto store = openStore(folder, options.demo);
+    if (!store) {
+        std::fprintf(stderr, "qelvar: the store in %s cannot be opened: %s\n", folder.c_str(),
+                     store.error().message.c_str());
+        return 1;
+    }
+    QVStartupTrace::note("store open");
+    QVAppDelegate app(std::move(*store));
+    const int status = runWindow(application, app, options);
+    QVUserDefaults::sharedDefaults().setHealthStore(nullptr);
+    return status;
+}

@@ -1,0 +1,156 @@
+import QtQuick
+import QtQuick.Templates as T
+import Qelvar.Items
+
+// Progress and result of an import.
+T.Popup {
+    id: sheet
+    property var controller: null
+    readonly property bool running: controller.state === QVImportController.Running || controller.state === QVImportController.Cancelling
+    parent: T.Overlay.overlay
+    x: Math.round((parent.width - width) / 2)
+    y: Math.round((parent.height - height) / 2)
+    width: Math.min(parent.width - 32, 420)
+    height: Math.min(implicitHeight, parent.height - 48)
+    implicitHeight: body.implicitHeight + 2
+    modal: true
+    focus: true
+    closePolicy: T.Popup.NoAutoClose
+    visible: controller.state !== QVImportController.Idle
+    T.Overlay.modal: Rectangle { color: "#66000000" }
+    background: Rectangle { color: SystemStyle.background; radius: 12 }
+    onOpened: button.forceActiveFocus()
+
+    contentItem: Item {
+        implicitHeight: body.implicitHeight
+        Accessible.role: Accessible.Dialog
+        Accessible.name: sheet.controller.title
+        Keys.onEscapePressed: sheet.controller.pressButton()
+
+        Column {
+            id: body
+            width: parent.width
+            Text {
+                width: parent.width
+                topPadding: 18
+                leftPadding: 16
+                rightPadding: 16
+                text: sheet.controller.title
+                font.pixelSize: SystemStyle.bodySize
+                font.bold: true
+                color: SystemStyle.text
+                horizontalAlignment: Text.AlignHCenter
+                wrapMode: Text.WordWrap
+                Accessible.role: Accessible.Heading
+                Accessible.name: text
+            }
+            Text {
+                width: parent.width
+                visible: text.length > 0
+                topPadding: 6
+                leftPadding: 16
+                rightPadding: 16
+                text: sheet.controller.message
+                font.pixelSize: SystemStyle.captionSize
+                color: SystemStyle.secondaryText
+                horizontalAlignment: Text.AlignHCenter
+                wrapMode: Text.Wrap
+                maximumLineCount: 8
+                elide: Text.ElideRight
+                Accessible.role: Accessible.StaticText
+                Accessible.name: text
+            }
+            Item { // progress
+                visible: sheet.running
+                width: parent.width
+                height: 28
+                Rectangle {
+                    id: track
+                    anchors.centerIn: parent
+                    width: parent.width - 48
+                    height: 4
+                    radius: 2
+                    color: SystemStyle.emphasis
+                    Accessible.role: Accessible.ProgressBar
+                    Accessible.name: sheet.controller.title
+                    Accessible.description: sheet.controller.message
+                    Rectangle {
+                        anchors.left: parent.left
+                        height: parent.height
+                        radius: 2
+                        color: SystemStyle.tint
+                        width: parent.width * Math.max(0, sheet.controller.fraction)
+                    }
+                }
+            }
+            Column { // result
+                width: parent.width
+                topPadding: 12
+                visible: rows.count > 0
+                Repeater {
+                    id: rows
+                    model: sheet.controller.rowTitles
+                    Item {
+                        required property string modelData
+                        required property int index
+                        readonly property string value: sheet.controller.rowValues[index] ?? ""
+                        width: body.width
+                        height: 28
+                        Accessible.role: Accessible.StaticText
+                        Accessible.name: modelData + ": " + value
+                        Text {
+                            anchors { left: parent.left; leftMargin: 24; verticalCenter: parent.verticalCenter }
+                            text: parent.modelData
+                            font.pixelSize: 15
+                            color: SystemStyle.text
+                        }
+                        Text {
+                            anchors { right: parent.right; rightMargin: 24; verticalCenter: parent.verticalCenter }
+                            text: parent.value
+                            font.pixelSize: 15
+                            color: SystemStyle.secondaryText
+                        }
+                    }
+                }
+            }
+            ListView {
+                id: refusals
+                width: parent.width
+                visible: count > 0
+                height: visible ? Math.min(contentHeight, 160, Math.max(60, sheet.parent.height - 360)) : 0
+                clip: true
+                activeFocusOnTab: true
+                boundsBehavior: Flickable.StopAtBounds
+                model: sheet.controller.refusals
+                Keys.onUpPressed: flick(0, 600)
+                Keys.onDownPressed: flick(0, -600)
+                Accessible.role: Accessible.List
+                delegate: Text {
+                    required property string modelData
+                    width: refusals.width
+                    leftPadding: 24
+                    rightPadding: 24
+                    topPadding: 4
+                    text: modelData
+                    font.pixelSize: 12
+                    color: SystemStyle.secondaryText
+                    wrapMode: Text.Wrap
+                    Accessible.role: Accessible.ListItem
+                    Accessible.name: text
+                }
+                FocusRing { shown: refusals.activeFocus }
+            }
+            Item { width: 1; height: 12 }
+            Rectangle { width: parent.width; height: SystemStyle.pixel; color: SystemStyle.hairline }
+            SystemButton {
+                id: button
+                width: parent.width
+                focus: true
+                emphasized: true
+                enabled: sheet.controller.state !== QVImportController.Cancelling
+                text: sheet.controller.buttonTitle
+                onClicked: sheet.controller.pressButton()
+            }
+        }
+    }
+}

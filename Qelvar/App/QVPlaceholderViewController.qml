@@ -1,0 +1,75 @@
+import QtQuick
+import QtQuick.Templates as T
+
+FocusScope {
+    id: root
+    property var screen: null
+
+    Rectangle { anchors.fill: parent; color: SystemStyle.groupedBackground }
+
+    Flickable {
+        anchors.fill: parent
+        contentHeight: content.height + 48
+        boundsBehavior: Flickable.StopAtBounds
+        Column {
+            id: content
+            y: 24
+            width: parent.width
+            spacing: 20
+
+            Column { // what can be done already
+                width: parent.width
+                visible: root.screen.actionTitles.length > 0
+                Repeater {
+                    model: root.screen.actionTitles
+                    T.Button {
+                        id: action
+                        required property string modelData
+                        required property int index
+                        width: content.width
+                        height: SystemStyle.touchHeight
+                        text: modelData
+                        focus: index === 0
+                        onClicked: root.screen.runAction(index)
+                        Keys.onReturnPressed: click()
+                        Keys.onEnterPressed: click()
+                        background: Rectangle {
+                            color: action.down ? SystemStyle.emphasis : SystemStyle.background
+                            Rectangle { width: parent.width; height: SystemStyle.pixel; color: SystemStyle.hairline }
+                            Rectangle { width: parent.width; height: SystemStyle.pixel; color: SystemStyle.hairline; y: parent.height - height }
+                        }
+                        contentItem: Text {
+                            leftPadding: 16
+                            rightPadding: 16
+                            text: action.text
+                            color: SystemStyle.tint
+                            font.pixelSize: SystemStyle.bodySize
+                            horizontalAlignment: Text.AlignLeft
+                            verticalAlignment: Text.AlignVCenter
+                        }
+                        FocusRing { anchors.margins: 2; shown: action.visualFocus }
+                    }
+                }
+            }
+            Image {
+                anchors.horizontalCenter: parent.horizontalCenter
+                visible: root.screen.icon.length > 0 && status === Image.Ready
+                width: 48
+                height: 48
+                sourceSize: Qt.size(width * Screen.devicePixelRatio, height * Screen.devicePixelRatio)
+                source: root.screen.icon.length > 0 ? "image://icon/" + root.screen.icon : ""
+            }
+            Text {
+                width: Math.min(parent.width - 48, 480)
+                anchors.horizontalCenter: parent.horizontalCenter
+                text: root.screen.message
+                color: SystemStyle.secondaryText
+                font.pixelSize: SystemStyle.bodySize
+                horizontalAlignment: Text.AlignHCenter
+                wrapMode: Text.WordWrap
+                Accessible.role: Accessible.StaticText
+                Accessible.name: text
+            }
+        }
+    }
+}

@@ -1,0 +1,30 @@
+#include "Qelvar/Charts/QVBarSeries.h"
+
+#include <algorithm>
+#include <cmath>
+
+#include "Qelvar/Charts/QVChartDrawing.h"
+#include "Qelvar/Models/Data/QVChartDataSet.h"
+
+void QVBarSeries::prepareForRendering(QSizeF size, std::optional<VSDate> minXValue,
+                                      std::optional<VSDate> maxXValue, std::optional<double> minYValue,
+                                      std::optional<double> maxYValue, const QVEdgeInsets& insets,
+                                      std::shared_ptr<const QVChartDataSet> dataSet) {
+    QVChartSeries::prepareForRendering(size, minXValue, maxXValue, minYValue, maxYValue, insets,
+                                       std::move(dataSet));
+    dataPoints_.clear();
+    for (const auto& chartPoint : this->dataSet()->allDataPoints()) {
+        const QPointF point = pointFromChartPoint(*chartPoint);
+        if (std::isfinite(point.y())) dataPoints_.push_back(point);
+    }
+}
+
+void QVBarSeries::renderFill(QPainter& painter) const {
+    const double base = imageSize().height() - bottomPadding_;
+    QPainterPath path;
+    path.setFillRule(Qt::WindingFill);
+    for (const QPointF& point : dataPoints_)
+        QVAddSegment(path, {point.x(), base}, {point.x(), std::min(point.y(), base)}, barWidth_,
+                     lineCapStyle_);
+    painter.fillPath(path, fillColor_);
+}

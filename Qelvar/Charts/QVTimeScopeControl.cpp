@@ -1,0 +1,32 @@
+#include "Qelvar/Charts/QVTimeScopeControl.h"
+
+#include <algorithm>
+#include <cassert>
+
+QVTimeScopeControl::QVTimeScopeControl(std::vector<QVTimeScope> timeScopes)
+    : timeScopes_(std::move(timeScopes)) {
+    assert(!timeScopes_.empty());
+}
+
+QStringList QVTimeScopeControl::segments() const {
+    QStringList titles;
+    for (const QVTimeScope timeScope : timeScopes_) titles.append(QVTimeScopeDisplayName(timeScope));
+    return titles;
+}
+
+void QVTimeScopeControl::setSelectedTimeScope(QVTimeScope timeScope) {
+    const auto found = std::find(timeScopes_.begin(), timeScopes_.end(), timeScope);
+    select(found == timeScopes_.end() ? 0 : static_cast<int>(found - timeScopes_.begin()));
+}
+
+void QVTimeScopeControl::pick(int index) {
+    if (index < 0 || index >= static_cast<int>(timeScopes_.size())) return;
+    select(index);
+    emit valueChanged();
+}
+
+void QVTimeScopeControl::select(int index) {
+    if (index == selectedIndex_) return;
+    selectedIndex_ = index;
+    emit selectedIndexChanged();
+}

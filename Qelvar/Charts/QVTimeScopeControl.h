@@ -1,0 +1,40 @@
+#pragma once
+
+#include <QObject>
+#include <QStringList>
+#include <vector>
+
+#include "Qelvar/Models/Data/QVTimeScope.h"
+
+/// The control with which the user picks the time scope of charts. Its look is a bar with a segment for each
+/// scope (QVTimeScopeControlBar.qml). Main thread only.
+class QVTimeScopeControl : public QObject {
+    Q_OBJECT
+    Q_PROPERTY(QStringList segments READ segments NOTIFY segmentsChanged)
+    Q_PROPERTY(int selectedIndex READ selectedIndex NOTIFY selectedIndexChanged)
+ public:
+    explicit QVTimeScopeControl(std::vector<QVTimeScope> timeScopes);
+
+    const std::vector<QVTimeScope>& timeScopes() const { return timeScopes_; }
+    /// The titles, in the order of the scopes, in the user's language.
+    QStringList segments() const;
+    QVTimeScope selectedTimeScope() const { return timeScopes_[static_cast<size_t>(selectedIndex_)]; }
+    /// Moves the selection without an action. A scope that is not offered selects the first.
+    void setSelectedTimeScope(QVTimeScope timeScope);
+    int selectedIndex() const { return selectedIndex_; }
+
+    /// The user picked a segment: selects it and sends valueChanged().
+    Q_INVOKABLE void pick(int index);
+    /// The user's language changed.
+    void updateTitles() { emit segmentsChanged(); }
+
+ signals:
+    void valueChanged();
+    void selectedIndexChanged();
+    void segmentsChanged();
+
+ private:
+    void select(int index);
+    const std::vector<QVTimeScope> timeScopes_;
+    int selectedIndex_ = 0;
+};

@@ -1,0 +1,357 @@
+#include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
+
+#include <QFontMetricsF>
+#include <QQuickWindow>
+#include <QSGSimpleTextureNode>
+#include <chrono>
+#include <cmath>
+
+#include "Platform/Icons.h"
+#include "Platform/Localization.h"
+#include "Qelvar/Charts/QVHourAxisDescriptor.h"
+#include "Qelvar/Charts/QVMonthAxisDescriptor.h"
+#include "Qelvar/Charts/QVYearAxisDescriptor.h"
+#include "Qelvar/Dashboard/QVDashboardViewController.h"
+#include "Qelvar/Formatters/QVDataUnitGroupLabels.h"
+#include "Qelvar/Formatters/QVDateFormatters.h"
+
+namespace {
+
+constexpr double kTitleFontSize = 19, kValueFontSize = 19, kUnitFontSize = 15;
+constexpr double kSecondLineFontSize = 11, kChartLabelFontSize = 10, kNoDataFontSize = 27;
+constexpr double kDividerInset = 12;
+constexpr QVAnimationTime kCrossFade = std::chrono::milliseconds(500);
+
+const QColor kWhite = Qt::white;
+const QColor kHalfWhite = QColor::fromRgbF(1, 1, 1, 0.5);
+/// The light of the one is added to that of the other.
+constexpr auto kPlusLighter = QPainter::CompositionMode_Plus;
+
+/// The axis of a time scope; null: it has none.
+std::shared_ptr<QVCachedAxisDescriptor> axisDescriptor(QVTimeScope timeScope) {
+    std::shared_ptr<QVCachedAxisDescriptor> axis;
+    if (timeScope == QVTimeScope::Day) {
+        axis = std::make_shared<QVHourAxisDescriptor>();
+        axis->setAlwaysHighlight(true);
+    } else if (timeScope == QVTimeScope::Week || timeScope == QVTimeScope::Month) {
+        auto days = std::make_shared<QVMonthAxisDescriptor>();
+        days->setDayOffset(timeScope == QVTimeScope::Week ? 1 : 7);
+        days->setMonthMarkerUnit(VSCalendarUnit::Month);
+        axis = days;
+    } else if (timeScope == QVTimeScope::Year) {
+        axis = std::make_shared<QVYearAxisDescriptor>();
+    } else {
+        return nullptr;
+    }
+    axis->setHighlightedLabelColor(kWhite);
+    axis->setHighlightedLabelFont(platform::boldSystemFont(kChartLabelFontSize));
+    axis->setUnhighlightedLabelColor(kHalfWhite);
+    axis->setUnhighlightedLabelFont(platform::systemFont(kChartLabelFontSize));
+    axis->setUnhighlightedLabelFilter(kPlusLighter);
+    return axis;
+}
+
+/// The width of a label that shows the text: whole pixels, so that nothing is cut.
+double labelWidth(double textWidth, double screenScale) {
+    return std::ceil(textWidth * screenScale - 1e-6) / screenScale;
+}
+
+double plainWidth(const QString& text, QFont font, double factor = 1) {
+    return platform::StyledText(text).size(font, factor).width();
+}
+
+/// Draws one line in a frame, at its leading or trailing edge of the reading direction.
+void drawLine(QPainter& painter, const platform::StyledText& text, const QRectF& frame, double baseline,
+              const QFont& font, const QColor& color, bool atRightEdge, double factor = 1) {
+    if (text.isEmpty() || frame.width() <= 0) return;
+    const double width = std::min(frame.width(), text.size(font, factor).width());
+    const double left = atRightEdge ? frame.right() - width : frame.left();
+    text.draw(painter, {left, baseline}, font, color, frame.width(), factor);
+}
+
+}  // namespace
+
+struct QVDashboardTableViewCell::Observer final : QVDashboardChartItemDelegate, QVDateCacheObserver {
+    explicit Observer(QVDashboardTableViewCell& owner) : cell(owner) {}
+
+    bool isCurrent(const QVDashboardChartItem& item) const { return cell.chartItem_.get() == &item; }
+    void chartItemDidUpdateHistoricalData(QVDashboardChartItem& item) override {
+        if (isCurrent(item)) cell.chart_.reloadData(true);
+    }
+    void chartItemDidUpdateCurrentValueData(QVDashboardChartItem& item) override {
+        if (isCurrent(item)) cell.refreshTexts();
+    }
+    void chartItemDidUpdateSecondaryValueData(QVDashboardChartItem& item) override {
+        if (isCurrent(item)) cell.refreshTexts();
+    }
+    void dateCacheDidUpdate(QVDateCache&) override {
+        if (cell.chartItem_ && cell.timeScope_) cell.rebuildTimeBasedContent();
+    }
+
+    QVDashboardTableViewCell& cell;
+};
+
+QVDashboardTableViewCell::QVDashboardTableViewCell(QQuickItem* parent)
+    : QQuickItem(parent),
+      chartBackground_(std::make_shared<QVDottedAverageBackgroundView>()),
+      observer_(std::make_shared<Observer>(*this)) {
+    setFlag(ItemHasContents);
+    setImplicitHeight(preferredCellHeight());
+
+    chart_.setChartFillCompositingFilter(QPainter::CompositionMode_Overlay);
+    chart_.setChartSecondaryFillCompositingFilter(QPainter::CompositionMode_SoftLight);
+    chart_.setAnimationStyle(QVChart::AnimationStyle::CrossFade);
+    chart_.setAnimationDuration(kCrossFade);
+    chart_.setDividerInset(kDividerInset);
+    chartBackground_->setLabelFont(platform::systemFont(kChartLabelFontSize));
+    chartBackground_->setLabelColor(kHalfWhite);
+    chartBackground_->setNoDataLabelColor(kHalfWhite);
+    chartBackground_->setNoDataLabelFont(platform::systemFont(kNoDataFontSize));
+    chartBackground_->setLabelCompositingFilter(kPlusLighter);
+    chartBackground_->setNoDataLabelCompositingFilter(kPlusLighter);
+    chartBackground_->setAverageLineCompositingFilter(QPainter::CompositionMode_Overlay);
+    chartBackground_->setBoundFormatter([this](double value, const VSNumberFormatter& numberFormatter) {
+        if (!chartItem_) return QString();
+        return qv_dashboardChartBoundStringFromValue(chartItem_->dataUnitGroup(), value, numberFormatter,
+                                                     *chartItem_->unitController());
+    });
+    chart_.setChartBackgroundView(chartBackground_);
+    chart_.onNeedsRepaint = [this] { contentLooksDifferent(); };
+}
+
+QVDashboardTableViewCell::~QVDashboardTableViewCell() {
+    chart_.onNeedsRepaint = nullptr;
+    if (dateCache_) dateCache_->removeObserver(observer_.get());
+}
+
+void QVDashboardTableViewCell::setScreen(QVDashboardViewController* screen) {
+    if (screen == screen_) return;
+    if (screen_) screen_->disconnect(this);
+    screen_ = screen;
+    if (screen_) {
+        connect(screen_, &QVDashboardViewController::tableReloaded, this, &QVDashboardTableViewCell::prepare);
+        connect(screen_, &QObject::destroyed, this, [this] { screen_ = nullptr; });
+    }
+    emit screenChanged();
+    prepare();
+}
+
+void QVDashboardTableViewCell::setRow(int row) {
+    if (row == row_) return;
+    row_ = row;
+    emit rowChanged();
+    prepare();
+}
+
+void QVDashboardTableViewCell::componentComplete() {
+    QQuickItem::componentComplete();
+    complete_ = true;
+    prepare();
+}
+
+void QVDashboardTableViewCell::prepare() {
+    if (complete_ && screen_ && row_ >= 0) screen_->prepareCell(*this, row_);
+}
+
+void QVDashboardTableViewCell::setDateCache(QVDateCache* dateCache) {
+    if (dateCache == dateCache_) return;
+    if (dateCache_) dateCache_->removeObserver(observer_.get());
+    dateCache_ = dateCache;
+    if (dateCache_) dateCache_->addObserver(observer_);
+}
+
+void QVDashboardTableViewCell::setChartItem(std::shared_ptr<QVDashboardChartItem> item) {
+    if (item != chartItem_) {
+        chartItem_ = std::move(item);
+        if (!chartItem_) return;
+        chartItem_->setDelegate(observer_);
+        chart_.setChartRenderer(chartItem_->chartRenderer());
+        if (timeScope_) rebuildTimeBasedContent();
+        chart_.reloadData(false);
+    }
+    if (chartItem_ && chartItem_->localeDidChange()) {
+        chartItem_->setLocaleDidChange(false);
+        if (timeScope_) rebuildTimeBasedContent();
+    }
+}
+
+void QVDashboardTableViewCell::setTimeScope(QVTimeScope timeScope) {
+    if (timeScope_ == timeScope) return;
+    timeScope_ = timeScope;
+    if (chartItem_) rebuildTimeBasedContent();
+}
+
+void QVDashboardTableViewCell::rebuildTimeBasedContent() {
+    const auto axis = axisDescriptor(*timeScope_);
+    chart_.setXAxisDescriptor(axis);
+    if (dateCache_) chartItem_->updateDateRange(*dateCache_, *timeScope_);
+    chartBackground_->setHideAverageLine(chartItem_->shouldHideAverageLineForTimeScope(*timeScope_));
+    chartBackground_->setHideMinMaxLabels(chartItem_->shouldHideMinMaxOnBackgroundForTimeScope(*timeScope_));
+    if (axis) {
+        axis->setMinValue(chartItem_->startDate());
+        axis->setMaxValue(chartItem_->endDate());
+    }
+    chart_.refreshView();
+    chart_.reloadData(true);
+    refreshTexts();
+}
+
+void QVDashboardTableViewCell::refreshTexts() {
+    const VSDataUnitGroup& group = *chartItem_->dataUnitGroup();
+    title_ = group.displayName();
+    categoryIconName_ = group.isNikeFuel() ? group.groupIcon() : QString();
+    average_ = chartItem_->secondaryValue();
+    averageIconName_ = group.unitIcon();
+    value_ = chartItem_->mostRecentValue(platform::systemFont(kValueFontSize),
+                                         platform::systemFont(kUnitFontSize));
+    const auto updated = chartItem_->lastUpdated();
+    lastUpdated_ = updated ? QVLastUpdatedString(*updated) : QString();
+    emit contentChanged();
+    contentLooksDifferent();
+}
+
+QString QVDashboardTableViewCell::accessibleValue() const {
+    QStringList parts;
+    for (const QString& part : {valueText(), secondaryText(), lastUpdated_})
+        if (!part.isEmpty()) parts.append(part);
+    return parts.join(QStringLiteral(", "));
+}
+
+double QVDashboardTableViewCell::screenScale() const {
+    return window() ? window()->effectiveDevicePixelRatio() : 1.0;
+}
+
+QVDashboardCellContent QVDashboardTableViewCell::layoutContent() const {
+    const QFont titleFont = platform::systemFont(kTitleFontSize),
+                secondFont = platform::systemFont(kSecondLineFontSize);
+    const QFontMetricsF titleMetrics(titleFont), secondMetrics(secondFont);
+    QVDashboardCellContent content;
+    content.width = width();
+    const double scale = content.screenScale = screenScale();
+    content.rightToLeft = platform::isRightToLeft();
+    content.hasCategoryIcon = !categoryIconName_.isEmpty();
+    content.hasAverageIcon = !averageIconName_.isEmpty();
+    content.titleWidth = [this, titleFont, scale](double factor) {
+        return labelWidth(plainWidth(title_, titleFont, factor), scale);
+    };
+    content.valueWidth = [this, titleFont, scale](double factor) {
+        return labelWidth(value_.size(titleFont, factor).width(), scale);
+    };
+    content.averageWidth = labelWidth(average_.size(secondFont).width(), scale);
+    content.lastUpdatedWidth = labelWidth(plainWidth(lastUpdated_, secondFont), scale);
+    content.firstLineAscent = titleMetrics.ascent();
+    content.firstLineDescent = titleMetrics.descent();
+    content.secondLineAscent = secondMetrics.ascent();
+    content.secondLineDescent = secondMetrics.descent();
+    return content;
+}
+
+QVDashboardCellLayout QVDashboardTableViewCell::cellLayout() const {
+    return QVDashboardCellLayout::make(layoutContent());
+}
+
+void QVDashboardTableViewCell::paintTexts(QPainter& painter, const QVDashboardCellLayout& layout) const {
+    const bool rightToLeft = platform::isRightToLeft();
+    const double scale = painter.device()->devicePixelRatioF();
+    const QFont titleFont = platform::systemFont(kTitleFontSize),
+                secondFont = platform::systemFont(kSecondLineFontSize);
+    if (!layout.categoryIcon.isEmpty())
+        painter.drawImage(layout.categoryIcon,
+                          platform::icon(categoryIconName_, layout.categoryIcon.size(), scale));
+    drawLine(painter, platform::StyledText(title_), layout.title, layout.firstBaseline, titleFont, kWhite,
+             rightToLeft, layout.fontFactor);
+    drawLine(painter, value_, layout.value, layout.firstBaseline, titleFont, kWhite, !rightToLeft,
+             layout.fontFactor);
+
+    painter.setCompositionMode(kPlusLighter);
+    drawLine(painter, average_, layout.average, layout.secondBaseline, secondFont, kHalfWhite, rightToLeft);
+    if (!layout.averageIcon.isEmpty()) {
+        const QImage icon =
+            platform::icon(averageIconName_, layout.averageIcon.size(), scale, kWhite, rightToLeft);
+        painter.setOpacity(0.5);
+        painter.drawImage(layout.averageIcon, icon);
+        painter.setOpacity(1);
+    }
+    drawLine(painter, platform::StyledText(lastUpdated_), layout.lastUpdated, layout.secondBaseline,
+             secondFont, kHalfWhite, !rightToLeft);
+    painter.setCompositionMode(QPainter::CompositionMode_SourceOver);
+}
+
+QImage QVDashboardTableViewCell::render(double scale) {
+    const QSize pixels(qCeil(width() * scale), qCeil(height() * scale));
+    QImage image(pixels, QImage::Format_ARGB32_Premultiplied);
+    image.setDevicePixelRatio(scale);
+    image.fill(Qt::white);
+    if (!chartItem_ || pixels.isEmpty()) return image;
+    const QVDashboardCellLayout layout = cellLayout();
+    QPainter painter(&image);
+    painter.setRenderHints(QPainter::Antialiasing | QPainter::TextAntialiasing |
+                           QPainter::SmoothPixmapTransform);
+    painter.drawImage(layout.background.topLeft(),
+                      chartItem_->dataCategory()->roundedGradient(layout.background.size(), scale));
+    chart_.setSize(layout.chart.size(), scale);
+    painter.save();
+    painter.setClipRect(layout.background);
+    chart_.paint(painter, layout.chart.topLeft());
+    painter.restore();
+    paintTexts(painter, layout);
+    return image;
+}
+
+bool QVDashboardTableViewCell::showsItsData() const {
+    if (!chartItem_ || !timeScope_) return false;
+    const QVGroupDataProvider& provider = *chartItem_->dataProvider();
+    return provider.hasLoadedHistoricalData() && provider.hasLoadedCurrentValueData() &&
+           provider.hasLoadedSecondaryValueData() && chartItem_->chartRenderer()->finishedLoadingData();
+}
+
+void QVDashboardTableViewCell::geometryChange(const QRectF& newGeometry, const QRectF& oldGeometry) {
+    QQuickItem::geometryChange(newGeometry, oldGeometry);
+    if (newGeometry.size() != oldGeometry.size()) contentLooksDifferent();
+}
+
+void QVDashboardTableViewCell::itemChange(ItemChange change, const ItemChangeData& data) {
+    QQuickItem::itemChange(change, data);
+    if (change == ItemSceneChange) {
+        disconnect(frames_);
+        if (data.window)
+            frames_ = connect(data.window, &QQuickWindow::afterAnimating, this,
+                              &QVDashboardTableViewCell::animateFrames);
+    }
+    if (change == ItemDevicePixelRatioHasChanged || change == ItemSceneChange) contentLooksDifferent();
+}
+
+void QVDashboardTableViewCell::contentLooksDifferent() {
+    // What a layout under way changes is painted right after it.
+    if (window() && !painting_) polish();
+}
+
+void QVDashboardTableViewCell::animateFrames() {
+    // Told before each frame of the window; while something moves each frame asks for the next one.
+    if (!chart_.isAnimating()) return;
+    const auto now = std::chrono::steady_clock::now().time_since_epoch();
+    chart_.advance(std::chrono::duration_cast<QVAnimationTime>(now));
+    polish();
+}
+
+void QVDashboardTableViewCell::updatePolish() {
+    painting_ = true;
+    image_ = render(screenScale());
+    painting_ = false;
+    update();
+}
+
+QSGNode* QVDashboardTableViewCell::updatePaintNode(QSGNode* node, UpdatePaintNodeData*) {
+    auto* texture = static_cast<QSGSimpleTextureNode*>(node);
+    if (image_.isNull() && !texture) return nullptr;
+    if (!texture) {
+        texture = new QSGSimpleTextureNode;
+        texture->setOwnsTexture(true);
+    }
+    if (!image_.isNull()) {
+        texture->setTexture(window()->createTextureFromImage(image_, QQuickWindow::TextureIsOpaque));
+        image_ = {};
+    }
+    texture->setRect(QRectF(0, 0, width(), height()));
+    return texture;
+}

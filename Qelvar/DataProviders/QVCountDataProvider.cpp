@@ -1,0 +1,94 @@
+#include "Qelvar/DataProviders/QVCountDataProvider.h"
+
+#include "Platform/Localization.h"
+#include "Qelvar/DataProviders/QVHealthStoreExtensions.h"
+#include "Qelvar/Formatters/QVDateFormatters.h"
+#include "Qelvar/Formatters/QVNumberFormatters.h"
+#include "VessaUI/VSTimePeriods.h"
+
+void QVCountDataProvider::restartQueries() {
+    QVDataProvider::restartQueries();
+    if (!hasLoadedSecondaryValues() || !secondaryValueQuery_.isRunning()) restartSecondaryValueQuery();
+    restartHistoricalDataQuery();
+}
+
+void QVCountDataProvider::stopQueries() {
+    QVDataProvider::stopQueries();
+    secondaryValueQuery_.stop();
+    historicalDataQuery_.stop();
+}
+
+platform::StyledText QVCountDataProvider::secondaryValueText() const {
+    const Value value = secondaryValue();
+    const QString text =
+        value ? QVShortDateFormatter().stringFromDate(VSDate::fromSecondsSinceReferenceDate(*value))
+              : QVNoDataString();
+    return platform::StyledText(platform::localized("LAST_ACTIVITY %@", {text}));
+}
+
+void QVCountDataProvider::restartSecondaryValueQuery() {
+    beginQuery(Answer::Secondary);
+    auto handler = onMainQueue(
+        this, [](QVCountDataProvider& self, const Error& error) { self.updateSecondaryValue(error); });
+    secondaryValueQuery_.start(
+        healthStore(), std::make_shared<VSObserverQuery>(dataUnit()->sampleType(), VSPredicate{}, handler));
+}
+
+void QVCountDataProvider::updateSecondaryValue(const Error& error) {
+    const Ticket ticket = nextTicket();
+    if (error) {
+        intake().logError("Error executing current value query", *error);
+        intake().updateSecondaryValue({}, error, ticket);
+        return;
+    }
+    mostRecentSampleOfType(*healthStore(), dataUnit()->sampleType(), std::nullopt,
+                           [intake = intake(), ticket](const VSResult<VSSamplePtr>& answer) {
+                               if (!answer) {
+                                   intake.logError("Error updating secondary value query", answer.error());
+                                   intake.updateSecondaryValue({}, answer.error(), ticket);
+                                   return;
+                               }
+                               const auto latest =
+                                   *answer ? Value((*answer)->endDate().secondsSinceReferenceDate())
+                                           : std::nullopt;
+                               intake.updateSecondaryValue(latest, std::nullopt, ticket);
+                           });
+}
+
+void QVCountDataProvider::restartHistoricalDataQuery() {
+    historicalDataQuery_.stop();
+    const auto interval = intervalComponentsForTimeScope(timeScope());
+    if (!startDate() || !endDate() || !interval) return;
+    const Range range{*startDate(), *endDate(), *interval, timeScope()};
+    beginQuery(Answer::Historical, timeScope());
+    auto handler = onMainQueue(this, [range](QVCountDataProvider& self, const Error& error) {
+        self.updateHistoricalData(range, error);
+    });
+    const VSPredicate predicate = VSQuery::predicateForSamples(range.start, range.end, VSQueryOptionNone);
+    historicalDataQuery_.start(
+        healthStore(), std::make_shared<VSObserverQuery>(dataUnit()->sampleType(), predicate, handler));
+}
+
+void QVCountDataProvider::updateHistoricalData(const Range& range, const Error& error) {
+    const Ticket ticket = nextTicket();
+    if (error) {
+        intake().logError("Error executing historical data query", *error);
+        intake().updateHistoricalData({}, range.timeScope, error, {}, ticket);
+        return;
+    }
+    execute(VSQueryForFetchingCountStatistics(
+        dataUnit()->sampleType(), range.start, range.end, range.interval,
+        [intake = intake(), scope = range.timeScope,
+         ticket](const VSResult<std::vector<VSCountInBucket>>& answer) {
+            Points points;
+            if (answer) {
+                for (const VSCountInBucket& entry : *answer)
+                    points.push_back(QVChartPointNumeric::chartPoint(
+                        VSMidDate(entry.bucket.start, entry.bucket.end), entry.count));
+            } else {
+                intake.logError("Error executing historical data query", answer.error());
+            }
+            intake.updateHistoricalData(std::move(points), scope,
+                                        answer ? std::nullopt : Error(answer.error()), {}, ticket);
+        }));
+}

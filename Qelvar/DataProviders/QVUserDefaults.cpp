@@ -1,0 +1,26 @@
+#include "Qelvar/DataProviders/QVUserDefaults.h"
+
+QVUserDefaults& QVUserDefaults::sharedDefaults() {
+    static QVUserDefaults instance;
+    return instance;
+}
+
+void QVUserDefaults::setValue(VSValue::Dictionary value, const std::string& key,
+                              std::function<void(bool)> completion) {
+    if (!healthStore_) {
+        if (completion) completion(false);
+        return;
+    }
+    healthStore_->setDefaultValue(VSValue(std::move(value)), key,
+                                  [completion = std::move(completion)](const VSStatus& status) {
+                                      if (completion) completion(status.ok());
+                                  });
+}
+
+void QVUserDefaults::valueForKey(const std::string& key,
+                                 std::function<void(const VSResult<std::optional<VSValue>>&)> callback) {
+    if (!callback) return;
+    if (!healthStore_)
+        return callback(VSError{VSErrorCode::NotAccessible, "no connection to the health store"});
+    healthStore_->getDefaultValue(key, std::move(callback));
+}

@@ -1,0 +1,23 @@
+#pragma once
+
+#include <QString>
+#include <map>
+#include <optional>
+#include <vector>
+
+#include "Qelvar/Formatters/QVNumberFormatters.h"
+#include "VessaUI/VSDataUnitGroup.h"
+
+/// Labels of a display type's enumerated values, in the user's language; empty for types without. Any thread.
+std::map<int, QString> qv_enumeratedValueLabels(const VSDataUnitGroup* group);
+/// The name of one value, or none; for workouts the name of the activity.
+std::optional<QString> qv_displayNameForEnumValue(const VSDataUnitGroup* group, int value);
+/// The values from the bottom of a stacked chart to its top.
+std::vector<int> qv_valueOrderForStackedCharts(const VSDataUnitGroup* group);
+/// How many rows a stacked chart has, at least 1.
+int qv_stackedChartSectionsCount(const VSDataUnitGroup* group);
+/// The text beside a bound of a dashboard chart, in the user's unit, held in the display range. The default
+/// formatter serves where the data type has none of its own.
+QString qv_dashboardChartBoundStringFromValue(const VSDataUnitGroup* group, double value,
+                                              const VSNumberFormatter& defaultNumberFormatter,
+                                              const VSUnitController& unitController);

@@ -1,0 +1,497 @@
+#include "Qelvar/Import/QVRecordsBuilder.h"
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+
+namespace {
+
+constexpr size_t kLongestAttribute = 64 * 1024;
+constexpr size_t kListedUnknownTypes = 200;
+constexpr const char* kOtherUnknownTypes = "(other unknown types)";
+
+std::string attributeText(QVAttributeName attribute, std::string_view value) {
+    return std::string(kQVAttributeNames[static_cast<size_t>(attribute)]) + " " + QVImportQuoted(value);
+}
+
+std::string attributeName(QVAttributeName attribute) {
+    return kQVAttributeNames[static_cast<size_t>(attribute)];
+}
+
+/// Documents give every metadata value as text. Those that the application itself asks for as yes or no
+/// become so again.
+VSValue metadataValue(std::string_view key, std::string_view text) {
+    static constexpr std::array kYesNo{VSMetadataKeyWasUserEntered, VSMetadataKeyMenstrualCycleStart,
+                                       VSMetadataKeySexualActivityProtectionUsed};
+    if (std::find(kYesNo.begin(), kYesNo.end(), key) != kYesNo.end()) {
+        if (text == "1" || text == "true" || text == "YES") return true;
+        if (text == "0" || text == "false" || text == "NO") return false;
+    }
+    return std::string(text);
+}
+
+}  // namespace
+
+void QVRecordsBuilder::Draft::reset() {
+    type = nullptr;
+    provenance = {};
+    quantity.reset();
+    value = 0;
+    metadata.clear();
+    refusal.reset();
+}
+
+QVRecordsBuilder::QVRecordsBuilder(const Limits& limits, QVImportQueue& queue)
+    : limits_(limits), queue_(queue), counts_(128) {
+    batch_.items.reserve(QVImportBatch::kSize);
+}
+
+void QVRecordsBuilder::beginDocument(const std::string& name) {
+    batch_.document = std::make_shared<const std::string>(name);
+    report_.documents.push_back(name);
+}
+
+void QVRecordsBuilder::endDocument() {
+    flush();
+}
+
+void QVRecordsBuilder::start(const QVElement& element, QVElementName parent) {
+    const bool inCorrelation = parent == QVElementName::Correlation;
+    switch (element.name) {
+        case QVElementName::Record:
+            return startRecord(element, inCorrelation ? member_ : record_);
+        case QVElementName::Correlation:
+            return startCorrelation(element);
+        case QVElementName::Workout:
+            return startWorkout(element);
+        case QVElementName::MetadataEntry:
+            return addMetadata(element, member_.type || member_.refusal ? member_ : record_);
+        case QVElementName::WorkoutEvent:
+            return addWorkoutEvent(element);
+        case QVElementName::Me:
+            return readPerson(element);
+        case QVElementName::ExportDate:
+            return readExportDate(element);
+        default:
+            return;
+    }
+}
+
+void QVRecordsBuilder::end(QVElementName name, QVElementName parent) {
+    if (name == QVElementName::Record)
+        return parent == QVElementName::Correlation ? endMember() : endRecord();
+    if (name == QVElementName::Correlation) return endCorrelation();
+    if (name == QVElementName::Workout) return endWorkout();
+}
+
+void QVRecordsBuilder::unexpectedElement(const QVElement& element) {
+    refuse(element, {"unexpected element", "it and what it holds is passed over"});
+}
+
+// --- Starts ---------------------------------------------------------------------------------------------
+
+void QVRecordsBuilder::startRecord(const QVElement& element, Draft& draft) {
+    draft.reset();
+    draft.line = element.line;
+    draft.type = types_.find(element[QVAttributeName::Type]);
+    Check problem = readCommon(element, draft);
+    if (!problem && !draft.type->isQuantityType() && !draft.type->isCategoryType()) {
+        problem = Problem{"not a type of a Record",
+                          attributeText(QVAttributeName::Type, element[QVAttributeName::Type])};
+    }
+    if (!problem) problem = readValue(element, draft);
+    if (problem) draft.refusal = refusal(element, std::move(*problem));
+    if (draft.refusal && &draft == &record_) givenType_ = element[QVAttributeName::Type];
+}
+
+void QVRecordsBuilder::startCorrelation(const QVElement& element) {
+    record_.reset();
+    members_.clear();
+    record_.line = element.line;
+    record_.type = types_.find(element[QVAttributeName::Type]);
+    givenType_ = element[QVAttributeName::Type];
+    Check problem = readCommon(element, record_);
+    if (!problem && record_.type->kind() != VSTypeKind::Correlation) {
+        problem = Problem{"not a type of a Correlation", attributeText(QVAttributeName::Type, givenType_)};
+    }
+    if (problem) record_.refusal = refusal(element, std::move(*problem));
+}
+
+void QVRecordsBuilder::startWorkout(const QVElement& element) {
+    record_.reset();
+    workout_ = {};
+    record_.line = element.line;
+    record_.type = VSObjectType::workoutType();
+    givenType_ = element[QVAttributeName::WorkoutActivityType];
+    Check problem = checkLengths(element);
+    if (!problem) problem = readDates(element, record_);
+    if (!problem) problem = readOrigin(element, record_);
+    if (!problem) {
+        const auto activity = VSWorkoutActivityTypeForIdentifier(givenType_);
+        if (!element.has(QVAttributeName::WorkoutActivityType))
+            problem = Problem{"missing attribute", attributeName(QVAttributeName::WorkoutActivityType)};
+        else if (!activity)
+            problem =
+                Problem{"unknown activity", attributeText(QVAttributeName::WorkoutActivityType, givenType_)};
+        record_.value = activity.value_or(0);
+    }
+    if (!problem) problem = readDuration(element, workout_.duration);
+    if (!problem) {
+        problem = readAmount(element, QVAttributeName::TotalDistance, QVAttributeName::TotalDistanceUnit,
+                             VSCode::DistanceWalkingRunning, workout_.distance);
+    }
+    if (!problem) {
+        problem =
+            readAmount(element, QVAttributeName::TotalEnergyBurned, QVAttributeName::TotalEnergyBurnedUnit,
+                       VSCode::ActiveEnergyBurned, workout_.energy);
+    }
+    if (problem) record_.refusal = refusal(element, std::move(*problem));
+}
+
+void QVRecordsBuilder::addMetadata(const QVElement& element, Draft& draft) {
+    if (draft.refusal) return;
+    const std::string_view key = element[QVAttributeName::Key], value = element[QVAttributeName::Value];
+    if (key.empty()) return refuse(element, {"missing attribute", attributeName(QVAttributeName::Key)});
+    if (!element.has(QVAttributeName::Value))
+        return refuse(element, {"missing attribute", attributeName(QVAttributeName::Value)});
+    if (key.size() > kLongestAttribute || value.size() > kLongestAttribute) {
+        return refuse(element,
+                      {"attribute too long", std::to_string(std::max(key.size(), value.size())) + " bytes"});
+    }
+    if (!draft.metadata.emplace(std::string(key), metadataValue(key, value)).second) {
+        refuse(element, {"metadata key given twice", attributeText(QVAttributeName::Key, key)});
+    }
+}
+
+void QVRecordsBuilder::addWorkoutEvent(const QVElement& element) {
+    if (record_.refusal) return;
+    VSWorkoutEvent event;
+    const std::string_view type = element[QVAttributeName::Type];
+    if (type == "VSWorkoutEventTypePause")
+        event.type = 1;
+    else if (type == "VSWorkoutEventTypeResume")
+        event.type = 2;
+    else if (!type.empty())
+        return refuse(element, {"unknown event", attributeText(QVAttributeName::Type, type)});
+    if (element.has(QVAttributeName::Date)) {
+        QVImportDate date;
+        if (auto problem = readDate(element[QVAttributeName::Date], QVAttributeName::Date, date))
+            return refuse(element, std::move(*problem));
+        event.date = date.date;
+    }
+    workout_.events.push_back(event);
+}
+
+void QVRecordsBuilder::readPerson(const QVElement& element) {
+    QVImportPerson person;
+    if (const auto text = element[QVAttributeName::DateOfBirth]; !text.empty()) {
+        person.birthDate = QVImportBirthDateFromText(text);
+        if (!person.birthDate)
+            refuse(element, {"not a date", attributeText(QVAttributeName::DateOfBirth, text)});
+    }
+    const auto readValue = [&](QVAttributeName attribute, VSTypeCode code, int& value) {
+        const std::string_view text = element[attribute];
+        if (text.empty()) return;
+        const VSObjectType* type = VSObjectType::dataTypeWithCode(code);
+        const auto known = type ? type->valueForIdentifier(text) : std::nullopt;
+        if (known)
+            value = *known;
+        else
+            refuse(element, {"unknown value", attributeText(attribute, text)});
+    };
+    readValue(QVAttributeName::BiologicalSex, VSCode::BiologicalSex, person.biologicalSex);
+    readValue(QVAttributeName::BloodType, VSCode::BloodType, person.bloodType);
+    readValue(QVAttributeName::FitzpatrickSkinType, VSCode::FitzpatrickSkinType, person.skinType);
+    batch_.person = person;
+    flush();
+}
+
+void QVRecordsBuilder::readExportDate(const QVElement& element) {
+    const std::string_view text = element[QVAttributeName::Value];
+    const auto date = QVImportDateFromText(text);
+    if (!date) return refuse(element, {"not a date", attributeText(QVAttributeName::Value, text)});
+    if (!report_.exportDate || *report_.exportDate < date->date) report_.exportDate = date->date;
+}
+
+// --- Ends -----------------------------------------------------------------------------------------------
+
+void QVRecordsBuilder::endRecord() {
+    count(record_, givenType_);
+    if (!record_.refusal) {
+        finishMetadata(record_);
+        if (record_.quantity)
+            emit<VSQuantitySample>(record_.line, record_.type, *record_.quantity, record_.start, record_.end,
+                                   std::move(record_.provenance));
+        else
+            emit<VSCategorySample>(record_.line, record_.type, record_.value, record_.start, record_.end,
+                                   std::move(record_.provenance));
+    }
+}
+
+void QVRecordsBuilder::endMember() {
+    if (member_.refusal && !record_.refusal) {
+        // A correlation without one of its members would say something that the document does not say.
+        record_.refusal = std::move(member_.refusal);
+        record_.refusal->detail = std::string(record_.refusal->reason) + ": " + record_.refusal->detail;
+        record_.refusal->reason = "a member of the correlation is refused";
+    }
+    if (!record_.refusal) {
+        finishMetadata(member_);
+        if (member_.quantity)
+            members_.push_back(std::make_shared<const VSQuantitySample>(
+                member_.type, *member_.quantity, member_.start, member_.end, member_.provenance));
+        else
+            members_.push_back(std::make_shared<const VSCategorySample>(
+                member_.type, member_.value, member_.start, member_.end, member_.provenance));
+    }
+    member_.reset();
+}
+
+void QVRecordsBuilder::endCorrelation() {
+    if (!record_.refusal && members_.empty()) {
+        QVElement element;
+        element.name = QVElementName::Correlation;
+        element.givenName = "Correlation";
+        element.line = record_.line;
+        record_.refusal = refusal(element, {"no members", {}});
+        record_.refusal->type = givenType_;
+    }
+    count(record_, givenType_);
+    if (!record_.refusal) {
+        finishMetadata(record_);
+        emit<VSCorrelation>(record_.line, record_.type, record_.start, record_.end, std::move(members_),
+                            std::move(record_.provenance));
+        members_.clear();
+    }
+}
+
+void QVRecordsBuilder::endWorkout() {
+    count(record_, givenType_);
+    if (record_.refusal) return;
+    finishMetadata(record_);
+    emit<VSWorkout>(record_.line, record_.value, record_.start, record_.end, workout_.duration,
+                    workout_.energy, workout_.distance, std::move(workout_.events),
+                    std::move(record_.provenance));
+}
+
+// --- Attributes -----------------------------------------------------------------------------------------
+
+QVRecordsBuilder::Check QVRecordsBuilder::checkLengths(const QVElement& element) {
+    for (size_t i = 0; i < kQVAttributeCount; ++i) {
+        if (element.present >> i & 1U && element.values[i].size() > kLongestAttribute) {
+            return Problem{"attribute too long",
+                           attributeText(static_cast<QVAttributeName>(i), element.values[i])};
+        }
+    }
+    return {};
+}
+
+QVRecordsBuilder::Check QVRecordsBuilder::readCommon(const QVElement& element, Draft& draft) {
+    if (Check problem = checkLengths(element)) return problem;
+    if (!draft.type) {
+        const std::string_view type = element[QVAttributeName::Type];
+        if (type.empty()) return Problem{"missing attribute", attributeName(QVAttributeName::Type)};
+        return Problem{"unknown type", attributeText(QVAttributeName::Type, type)};
+    }
+    if (Check problem = readDates(element, draft)) return problem;
+    return readOrigin(element, draft);
+}
+
+QVRecordsBuilder::Check QVRecordsBuilder::readDates(const QVElement& element, Draft& draft) {
+    const std::string_view startText = element[QVAttributeName::StartDate],
+                           endText = element[QVAttributeName::EndDate],
+                           creationText = element[QVAttributeName::CreationDate];
+    QVImportDate start, end;
+    if (Check problem = readDate(startText, QVAttributeName::StartDate, start)) return problem;
+    if (endText == startText)
+        end = start;
+    else if (Check problem = readDate(endText, QVAttributeName::EndDate, end))
+        return problem;
+    if (end.date < start.date) {
+        return Problem{"ends before it starts", attributeText(QVAttributeName::StartDate, startText) + ", " +
+                                                    attributeText(QVAttributeName::EndDate, endText)};
+    }
+    draft.start = start.date;
+    draft.end = end.date;
+    draft.provenance.timeZoneOffset = start.offset;
+    if (element.has(QVAttributeName::CreationDate)) {
+        QVImportDate creation = start;
+        if (creationText == endText)
+            creation = end;
+        else if (creationText != startText) {
+            if (Check problem = readDate(creationText, QVAttributeName::CreationDate, creation))
+                return problem;
+        }
+        draft.provenance.creationDate = creation.date;
+    }
+    return {};
+}
+
+QVRecordsBuilder::Check QVRecordsBuilder::readDate(std::string_view text, QVAttributeName attribute,
+                                                   QVImportDate& date) const {
+    if (text.empty()) return Problem{"missing attribute", attributeName(attribute)};
+    const auto parsed = QVImportDateFromText(text);
+    if (!parsed) return Problem{"not a date", attributeText(attribute, text)};
+    if (parsed->date < limits_.earliest)
+        return Problem{"absurd date", attributeText(attribute, text) + " lies before 1900"};
+    if (parsed->date > limits_.latest)
+        return Problem{"absurd date", attributeText(attribute, text) + " lies in the future"};
+    date = *parsed;
+    return {};
+}
+
+QVRecordsBuilder::Check QVRecordsBuilder::readOrigin(const QVElement& element, Draft& draft) {
+    const std::string_view source = element[QVAttributeName::SourceName],
+                           version = element[QVAttributeName::SourceVersion];
+    if (source.empty()) return Problem{"missing attribute", attributeName(QVAttributeName::SourceName)};
+    revisionKey_.assign(source).append(1, '\0').append(version);
+    draft.provenance.sourceRevision = revisions_.get(revisionKey_, [&] {
+        return VSSourceRevision{VSSource::forImportedName(std::string(source)), std::string(version)};
+    });
+    if (const std::string_view device = element[QVAttributeName::Device]; !device.empty()) {
+        draft.provenance.device =
+            devices_.get(device, [&] { return VSDevice::fromDescription(std::string(device)); });
+    }
+    return {};
+}
+
+QVRecordsBuilder::Check QVRecordsBuilder::readValue(const QVElement& element, Draft& draft) {
+    const std::string_view text = element[QVAttributeName::Value];
+    if (text.empty()) return Problem{"missing attribute", attributeName(QVAttributeName::Value)};
+    if (draft.type->isQuantityType()) return readQuantity(element, draft);
+    const auto value = draft.type->valueForIdentifier(text);
+    if (!value) return Problem{"unknown value", attributeText(QVAttributeName::Value, text)};
+    draft.value = *value;
+    return {};
+}
+
+QVRecordsBuilder::Check QVRecordsBuilder::readQuantity(const QVElement& element, Draft& draft) {
+    const std::string_view text = element[QVAttributeName::Value], unitText = element[QVAttributeName::Unit];
+    const auto number = QVImportNumberFromText(text);
+    if (!number) return Problem{"not a number", attributeText(QVAttributeName::Value, text)};
+    if (unitText.empty()) return Problem{"missing attribute", attributeName(QVAttributeName::Unit)};
+    const QVUnitIndex::Entry& unit = units_.find(draft.type, unitText);
+    if (!unit.unit)
+        return Problem{"unknown or unfit unit",
+                       attributeText(QVAttributeName::Unit, unitText) + " (" + unit.problem + ")"};
+    if (*number < 0 && draft.type->isCumulative())
+        return Problem{"negative amount", attributeText(QVAttributeName::Value, text)};
+    const VSUnit& canonical = draft.type->canonicalUnit();
+    const auto value = unit.isCanonical ? number : unit.unit->convert(*number, canonical);
+    if (!value || !std::isfinite(*value))
+        return Problem{"not a number", attributeText(QVAttributeName::Value, text)};
+    draft.quantity.emplace(canonical, *value);
+    return {};
+}
+
+/// The total of a workout. Documents write 0 where a workout has none, so 0 is none.
+QVRecordsBuilder::Check QVRecordsBuilder::readAmount(const QVElement& element, QVAttributeName amount,
+                                                     QVAttributeName unitName, VSTypeCode code,
+                                                     std::optional<VSQuantity>& result) {
+    const std::string_view text = element[amount], unitText = element[unitName];
+    if (text.empty()) return {};
+    const auto number = QVImportNumberFromText(text);
+    if (!number) return Problem{"not a number", attributeText(amount, text)};
+    if (*number < 0) return Problem{"negative amount", attributeText(amount, text)};
+    if (*number == 0) return {};
+    if (unitText.empty()) return Problem{"missing attribute", attributeName(unitName)};
+    const VSObjectType* type = VSObjectType::dataTypeWithCode(code);
+    const QVUnitIndex::Entry& unit = units_.find(type, unitText);
+    if (!unit.unit)
+        return Problem{"unknown or unfit unit",
+                       attributeText(unitName, unitText) + " (" + unit.problem + ")"};
+    const auto value = unit.unit->convert(*number, type->canonicalUnit());
+    if (!value || !std::isfinite(*value)) return Problem{"not a number", attributeText(amount, text)};
+    result.emplace(type->canonicalUnit(), *value);
+    return {};
+}
+
+QVRecordsBuilder::Check QVRecordsBuilder::readDuration(const QVElement& element, VSDuration& duration) {
+    constexpr double kLongestSeconds = 200.0 * 366 * 86'400;
+    const std::string_view text = element[QVAttributeName::Duration],
+                           unitText = element[QVAttributeName::DurationUnit];
+    if (text.empty()) return {};
+    const auto number = QVImportNumberFromText(text);
+    if (!number) return Problem{"not a number", attributeText(QVAttributeName::Duration, text)};
+    if (*number < 0) return Problem{"negative amount", attributeText(QVAttributeName::Duration, text)};
+    if (unitText.empty()) return Problem{"missing attribute", attributeName(QVAttributeName::DurationUnit)};
+    const auto unit = VSUnit::parse(unitText);
+    const auto seconds = unit.ok() ? unit->convert(*number, VSUnit::secondUnit()) : std::nullopt;
+    if (!seconds)
+        return Problem{"unknown or unfit unit", attributeText(QVAttributeName::DurationUnit, unitText)};
+    if (!(*seconds <= kLongestSeconds))
+        return Problem{"absurd duration", attributeText(QVAttributeName::Duration, text)};
+    duration = VSDurationFromSeconds(*seconds);
+    return {};
+}
+
+// --- Results --------------------------------------------------------------------------------------------
+
+QVImportRefusal QVRecordsBuilder::refusal(const QVElement& element, Problem problem) const {
+    const std::string_view type =
+        element.name == QVElementName::Workout         ? element[QVAttributeName::WorkoutActivityType]
+        : element.name == QVElementName::MetadataEntry ? element[QVAttributeName::Key]
+                                                       : element[QVAttributeName::Type];
+    const std::string shownType = type.empty() ? std::string() : std::string(type.substr(0, 100));
+    return {*batch_.document, element.line,   std::string(element.givenName.substr(0, 100)),
+            shownType,        problem.reason, std::move(problem.detail),
+            element.excerpt()};
+}
+
+void QVRecordsBuilder::refuse(const QVElement& element, Problem problem) {
+    list(refusal(element, std::move(problem)));
+}
+
+void QVRecordsBuilder::list(QVImportRefusal refusal) {
+    ++report_.refusalsByReason[refusal.reason];
+    if (report_.refusals.size() < limits_.listedRefusals) report_.refusals.push_back(std::move(refusal));
+}
+
+QVImportCount& QVRecordsBuilder::countOf(const VSObjectType* type, std::string_view typeAsGiven) {
+    if (type) return counts_[static_cast<size_t>(VSTypeCodeValue(type->code()))];
+    const std::string quoted = QVImportQuoted(typeAsGiven, 100);
+    const std::string key = typeAsGiven.empty() ? "(no type)" : quoted.substr(1, quoted.size() - 2);
+    const auto known = report_.byType.find(key);
+    if (known != report_.byType.end()) return known->second;
+    return report_.byType[report_.byType.size() < kListedUnknownTypes ? key : kOtherUnknownTypes];
+}
+
+void QVRecordsBuilder::count(const Draft& draft, std::string_view typeAsGiven) {
+    QVImportCount& ofType = countOf(draft.type, typeAsGiven);
+    ++ofType.read;
+    ++report_.total.read;
+    if (!draft.refusal) return;
+    ++ofType.refused;
+    ++report_.total.refused;
+    list(*draft.refusal);
+}
+
+void QVRecordsBuilder::finishMetadata(Draft& draft) {
+    if (draft.metadata.empty()) return;
+    if (!lastMetadata_ || *lastMetadata_ != draft.metadata)
+        lastMetadata_ = std::make_shared<const VSMetadata>(std::move(draft.metadata));
+    draft.provenance.metadata = lastMetadata_;
+}
+
+template <typename Sample, typename... Arguments>
+void QVRecordsBuilder::emit(int64_t line, Arguments&&... arguments) {
+    batch_.items.push_back({Sample(std::forward<Arguments>(arguments)...), line});
+    if (batch_.items.size() >= QVImportBatch::kSize) flush();
+}
+
+void QVRecordsBuilder::flush() {
+    if (batch_.items.empty() && !batch_.person) return;
+    QVImportBatch next;
+    next.document = batch_.document;
+    next.items.reserve(QVImportBatch::kSize);
+    if (!queue_.push(std::exchange(batch_, std::move(next)))) stopped_ = true;
+}
+
+QVImportReport QVRecordsBuilder::takeReport() {
+    for (size_t code = 0; code < counts_.size(); ++code) {
+        if (counts_[code].read == 0) continue;
+        if (const VSObjectType* type = VSObjectType::dataTypeWithCode(static_cast<int>(code)))
+            report_.byType[std::string(type->name())] = counts_[code];
+    }
+    return std::move(report_);
+}

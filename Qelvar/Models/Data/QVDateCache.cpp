@@ -1,0 +1,65 @@
+#include "Qelvar/Models/Data/QVDateCache.h"
+
+#include "Platform/SystemEvents.h"
+#include "Vessa/Base/VSEnvironment.h"
+
+QVDateCache::QVDateCache()
+    : significantTimeChange_(QObject::connect(&platform::SystemEvents::shared(),
+                                              &platform::SystemEvents::significantTimeChange,
+                                              [this] { significantTimeDidChange(); })) {}
+
+QVDateCache::~QVDateCache() {
+    QObject::disconnect(significantTimeChange_);
+}
+
+QVDateCache::Dates& QVDateCache::dates(QVTimeScope timeScope, bool noon) {
+    return dates_.at(static_cast<size_t>(timeScope)).at(noon ? 1 : 0);
+}
+
+VSDate QVDateCache::start(QVTimeScope timeScope, bool noon) {
+    Dates& cached = dates(timeScope, noon);
+    if (!cached.start)
+        cached.start = QVTimeScopeSpan(timeScope, VSEnvironment::current()->now(), noon)->start;
+    return *cached.start;
+}
+
+VSDate QVDateCache::end(QVTimeScope timeScope, bool noon) {
+    Dates& cached = dates(timeScope, noon);
+    if (!cached.end) cached.end = QVTimeScopeSpanEnd(timeScope, start(timeScope, noon));
+    return *cached.end;
+}
+
+void QVDateCache::significantTimeDidChange() {
+    dates_ = {};
+    observers_.tell([this](QVDateCacheObserver& observer) { observer.dateCacheDidUpdate(*this); });
+}
+
+std::optional<VSDate> QVDateCacheStartDate(QVDateCache& dateCache, QVTimeScope timeScope, bool noon) {
+    switch (timeScope) {
+        case QVTimeScope::Day:
+            return dateCache.startOfDay(noon);
+        case QVTimeScope::Week:
+            return dateCache.startOfWeek(noon);
+        case QVTimeScope::Month:
+            return dateCache.startOfMonth(noon);
+        case QVTimeScope::Year:
+            return dateCache.startOfYear(noon);
+        default:
+            return std::nullopt;
+    }
+}
+
+std::optional<VSDate> QVDateCacheEndDate(QVDateCache& dateCache, QVTimeScope timeScope, bool noon) {
+    switch (timeScope) {
+        case QVTimeScope::Day:
+            return dateCache.endOfDay(noon);
+        case QVTimeScope::Week:
+            return dateCache.endOfWeek(noon);
+        case QVTimeScope::Month:
+            return dateCache.endOfMonth(noon);
+        case QVTimeScope::Year:
+            return dateCache.endOfYear(noon);
+        default:
+            return std::nullopt;
+    }
+}

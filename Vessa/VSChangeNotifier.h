@@ -1,0 +1,44 @@
+#pragma once
+
+#include <filesystem>
+#include <functional>
+#include <map>
+#include <memory>
+#include <thread>
+#include <vector>
+
+#include "Vessa/VSReaderPool.h"
+
+/// Learns of commits of this and of other processes and tells which types they changed. Other processes are
+/// heard of through a file in the folder that every commit touches.
+class VSChangeNotifier {
+   public:
+    struct Change { int type; int64_t number; };
+    /// Called on the notifier's thread, one call at a time.
+    using Handler = std::function<void(const std::vector<Change>&)>;
+
+    VSChangeNotifier(std::filesystem::path folder, VSReaderPool& readers, Handler handler);
+    ~VSChangeNotifier();
+    VSChangeNotifier(const VSChangeNotifier&) = delete;
+    VSChangeNotifier& operator=(const VSChangeNotifier&) = delete;
+
+    /// Changes from now on are told. The thread holds `owner` until it ends.
+    void start(std::shared_ptr<void> owner);
+    /// After a commit of this process: look now, and let the others look. Any thread.
+    void announce();
+    /// Ends the thread; does not wait when called on it. Once.
+    void finish();
+
+   private:
+    void run();
+    void look();
+    bool noticeTouched();
+
+    const std::filesystem::path folder_;
+    VSReaderPool& readers_;
+    const Handler handler_;
+    int wakeDescriptor_ = -1, watchDescriptor_ = -1;
+    std::atomic<bool> finishing_ = false;
+    std::map<int, int64_t> known_;  // of the thread
+    std::thread thread_;            // of the thread that starts and finishes
+};

@@ -1,0 +1,160 @@
+#include "Vessa/VSImportTransaction.h"
+
+#include "Vessa/Base/VSEnvironment.h"
+#include "Vessa/VSStoreCharacteristics.h"
+#include "Vessa/VSStoreSchema.h"
+
+namespace {
+constexpr size_t typeCodes = 128;
+
+size_t codeOf(const VSSample& sample) { return static_cast<size_t>(VSTypeCodeValue(sample.sampleType()->code())); }
+}  // namespace
+
+bool VSImportTransaction::Uses::has(int64_t id, Use use) const {
+    const size_t byte = static_cast<size_t>(id) / 4;
+    return byte < bits_.size() && (bits_[byte] >> (id % 4 * 2) & use);
+}
+
+void VSImportTransaction::Uses::set(int64_t id, Use use) {
+    const size_t byte = static_cast<size_t>(id) / 4;
+    if (byte >= bits_.size()) bits_.resize(byte + 1 + byte / 8);
+    bits_[byte] = static_cast<uint8_t>(bits_[byte] | use << (id % 4 * 2));
+}
+
+VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> VSImportTransaction::begin(std::shared_ptr<VSStoreCore> core,
+                                                                                      const std::string& name, VSDuration patience) {
+    if (core->options.readOnly) return VSError{VSErrorCode::NotAccessible, "the store was opened for reading only"};
+    try {
+        auto database = VSStoreSchema::openForWriting(core->folder, false, core->options.survivesPowerLoss, patience);
+        database->execute("PRAGMA cache_size = -32768");
+        return std::unique_ptr<ImportTransaction>(new VSImportTransaction(std::move(core), std::move(database), name));
+    } catch (const VSDatabaseFailure& failure) {
+        return failure.error();
+    }
+}
+
+VSImportTransaction::VSImportTransaction(std::shared_ptr<VSStoreCore> core, std::unique_ptr<VSDatabase> database, const std::string& name)
+    : core_(std::move(core)),
+      database_(std::move(database)),
+      writer_(*database_),
+      transaction_(std::make_unique<VSTransaction>(*database_, VSTransaction::Kind::Write)),
+      name_(name),
+      date_(VSEnvironment::current()->now()),
+      hadSamples_(typeCodes),
+      hasNewTopLevel_(typeCodes),
+      hasNewMembers_(typeCodes) {
+    writer_.begin();
+    lastBefore_ = writer_.lastNumber();
+    auto types = database_->use("SELECT DISTINCT type FROM type_sources");
+    while (types.step()) hadSamples_[static_cast<size_t>(types.integer(0))] = true;
+}
+
+VSImportTransaction::~VSImportTransaction() = default;
+
+VSError VSImportTransaction::ended() const {
+    return failure_.value_or(VSError{VSErrorCode::Invalid, "the import has ended"});
+}
+
+VSResult<VSHealthStore::ImportTransaction::Outcome> VSImportTransaction::add(const VSSample& sample) {
+    if (!transaction_ || failure_) return ended();
+    if (auto objection = VSStoreWriter::objection(sample)) return *objection;
+    try {
+        const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample);
+        return correlation ? addCorrelation(*correlation) : addRecord(sample);
+    } catch (const VSDatabaseFailure& failure) {
+        failure_ = failure.error();
+        return *failure_;
+    }
+}
+
+/// Whether a row that this record may join can exist: else no search is needed.
+bool VSImportTransaction::mayBePresent(const VSSample& sample, Use use) const {
+    const size_t type = codeOf(sample);
+    return hadSamples_[type] || (use == TopLevel ? hasNewMembers_[type] : hasNewTopLevel_[type]);
+}
+
+VSImportTransaction::Outcome VSImportTransaction::addRecord(const VSSample& sample) {
+    if (mayBePresent(sample, TopLevel)) {
+        const int64_t found = writer_.matcher().find(sample, [this](int64_t id) { return !uses_.has(id, TopLevel); });
+        if (found) {
+            uses_.set(found, TopLevel);
+            return found <= lastBefore_ ? Outcome::AlreadyPresent : Outcome::Added;
+        }
+    }
+    const int64_t id = writer_.insertAlone(sample, date_);
+    uses_.set(id, TopLevel);
+    hasNewTopLevel_[codeOf(sample)] = true;
+    ++added_;
+    return Outcome::Added;
+}
+
+VSImportTransaction::Outcome VSImportTransaction::addCorrelation(const VSCorrelation& correlation) {
+    const int64_t found = !hadSamples_[codeOf(correlation)] ? 0 : writer_.matcher().find(correlation, [this](int64_t id) {
+        return id <= lastBefore_ && !uses_.has(id, TopLevel);
+    });
+    if (found) {
+        uses_.set(found, TopLevel);
+        for (const VSMemberKey& member : writer_.matcher().members(found)) uses_.set(member.id, Member);
+        return Outcome::AlreadyPresent;
+    }
+    std::vector<VSMemberKey> members;
+    for (const VSSamplePtr& object : correlation.objects()) members.push_back(addMember(*object));
+    const int64_t id = writer_.insertAlone(correlation, date_);
+    uses_.set(id, TopLevel);
+    ++added_;
+    for (size_t index = 0; index < members.size(); ++index) writer_.insertMember(id, static_cast<int>(index), members[index]);
+    return Outcome::Added;
+}
+
+VSMemberKey VSImportTransaction::addMember(const VSSample& member) {
+    int64_t id = 0;
+    if (mayBePresent(member, Member)) id = writer_.matcher().find(member, [this](int64_t row) { return !uses_.has(row, Member); });
+    if (!id) {
+        id = writer_.insertAlone(member, date_);
+        hasNewMembers_[codeOf(member)] = true;
+        ++added_;
+    }
+    uses_.set(id, Member);
+    return {member.sampleType(), member.startDate().microseconds(), id};
+}
+
+VSResult<int> VSImportTransaction::setCharacteristicsIfUnset(std::optional<VSBirthDate> birthDate, int biologicalSex, int bloodType, int skinType) {
+    if (!transaction_ || failure_) return ended();
+    try {
+        int set = 0;
+        const auto setUnset = [&](VSTypeCode code, int64_t value) {
+            const auto* type = VSObjectType::dataTypeWithCode(code);
+            if (!value || VSReadCharacteristic(*database_, type)) return;
+            VSWriteCharacteristic(writer_, type, value);
+            ++set;
+        };
+        if (birthDate) setUnset(VSCode::DateOfBirth, VSStoredBirthDate(*birthDate));
+        setUnset(VSCode::BiologicalSex, biologicalSex);
+        setUnset(VSCode::BloodType, bloodType);
+        setUnset(VSCode::FitzpatrickSkinType, skinType);
+        changedCharacteristics_ = changedCharacteristics_ || set;
+        return set;
+    } catch (const VSDatabaseFailure& failure) {
+        failure_ = failure.error();
+        return *failure_;
+    }
+}
+
+VSStatus VSImportTransaction::commit() {
+    if (!transaction_ || failure_) return ended();
+    try {
+        if (added_) {
+            auto batch = database_->use("INSERT INTO batches(name, date, first_id, last_id) VALUES (?, ?, ?, ?)");
+            batch.bindText(1, name_).bind(2, date_.microseconds()).bind(3, lastBefore_ + 1).bind(4, writer_.lastNumber()).run();
+        }
+        writer_.finish();
+        transaction_->commit();
+        transaction_.reset();
+    } catch (const VSDatabaseFailure& failure) {
+        failure_ = failure.error();
+        transaction_.reset();
+        return *failure_;
+    }
+    if (added_ || changedCharacteristics_) core_->committed();
+    return {};
+}

@@ -1,0 +1,270 @@
+#include "Vessa/VSStoreSchema.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <string>
+
+namespace {
+
+constexpr const char* tables = R"sql(
+CREATE TABLE state(
+    only INTEGER PRIMARY KEY CHECK (only = 1),
+    last INTEGER NOT NULL,
+    last_metadata INTEGER NOT NULL);
+INSERT INTO state VALUES (1, 0, 0);
+
+CREATE TABLE types(
+    type INTEGER PRIMARY KEY,
+    change INTEGER NOT NULL,
+    longest INTEGER NOT NULL);
+
+CREATE TABLE sources(
+    source INTEGER PRIMARY KEY,
+    name TEXT NOT NULL,
+    bundle TEXT NOT NULL,
+    UNIQUE (bundle, name));
+
+CREATE TABLE devices(
+    device INTEGER PRIMARY KEY,
+    name TEXT, manufacturer TEXT, model TEXT, hardware TEXT, firmware TEXT, software TEXT, local TEXT, udi TEXT);
+
+CREATE TABLE provenances(
+    provenance INTEGER PRIMARY KEY,
+    source INTEGER NOT NULL REFERENCES sources,
+    version TEXT NOT NULL,
+    device INTEGER REFERENCES devices,
+    zone INTEGER);
+
+CREATE TABLE metadata(
+    metadata INTEGER PRIMARY KEY,
+    content TEXT NOT NULL UNIQUE,
+    uses INTEGER NOT NULL);
+
+CREATE TABLE samples(
+    type INTEGER NOT NULL,
+    start INTEGER NOT NULL,
+    id INTEGER NOT NULL,
+    duration INTEGER NOT NULL,
+    value,
+    provenance INTEGER NOT NULL,
+    created INTEGER NOT NULL,
+    metadata INTEGER,
+    PRIMARY KEY (type, start, id)) WITHOUT ROWID;
+CREATE INDEX samples_by_id ON samples(type, id);
+CREATE INDEX samples_long ON samples(type, start) WHERE duration > )sql" VS_LONG_SPAN_SQL R"sql(;
+
+CREATE TABLE members(
+    parent INTEGER NOT NULL,
+    position INTEGER NOT NULL,
+    member INTEGER NOT NULL,
+    type INTEGER NOT NULL,
+    start INTEGER NOT NULL,
+    PRIMARY KEY (parent, position)) WITHOUT ROWID;
+CREATE INDEX members_by_member ON members(member);
+
+CREATE TABLE workouts(
+    workout INTEGER PRIMARY KEY,
+    duration INTEGER NOT NULL,
+    energy,
+    distance);
+CREATE TABLE workout_events(
+    workout INTEGER NOT NULL,
+    position INTEGER NOT NULL,
+    type INTEGER NOT NULL,
+    date INTEGER,
+    PRIMARY KEY (workout, position)) WITHOUT ROWID;
+
+CREATE TABLE deleted(
+    change INTEGER PRIMARY KEY,
+    type INTEGER NOT NULL,
+    id INTEGER NOT NULL);
+CREATE INDEX deleted_by_type ON deleted(type, change);
+
+CREATE TABLE type_sources(
+    type INTEGER NOT NULL,
+    source INTEGER NOT NULL,
+    count INTEGER NOT NULL,
+    first_start INTEGER NOT NULL,
+    last_end INTEGER NOT NULL,
+    PRIMARY KEY (type, source)) WITHOUT ROWID;
+
+CREATE TABLE rollups(
+    slot INTEGER PRIMARY KEY,
+    quarters BLOB NOT NULL);
+
+CREATE TABLE source_order(
+    type INTEGER NOT NULL,
+    position INTEGER NOT NULL,
+    source INTEGER NOT NULL,
+    PRIMARY KEY (type, position)) WITHOUT ROWID;
+
+CREATE TABLE batches(
+    batch INTEGER PRIMARY KEY,
+    name TEXT NOT NULL,
+    date INTEGER NOT NULL,
+    first_id INTEGER NOT NULL,
+    last_id INTEGER NOT NULL);
+
+CREATE TABLE defaults(
+    application TEXT NOT NULL,
+    key TEXT NOT NULL,
+    value TEXT NOT NULL,
+    PRIMARY KEY (application, key)) WITHOUT ROWID;
+
+CREATE TABLE characteristics(
+    type INTEGER PRIMARY KEY,
+    value INTEGER NOT NULL);
+
+CREATE TABLE medical_id(
+    only INTEGER PRIMARY KEY CHECK (only = 1),
+    content TEXT NOT NULL,
+    picture BLOB);
+)sql";
+
+constexpr const char* tableNames[] = {"state", "types", "sources", "devices", "provenances", "metadata", "samples", "members",
+                                      "workouts", "workout_events", "deleted", "type_sources", "rollups", "source_order",
+                                      "batches", "defaults", "characteristics", "medical_id"};
+
+[[noreturn]] void refuse(VSErrorCode code, std::string message) { throw VSDatabaseFailure({code, std::move(message)}); }
+
+void makeFolder(const std::filesystem::path& folder) {
+    std::error_code error;
+    if (std::filesystem::is_directory(folder, error)) return;
+    if (folder.has_parent_path()) std::filesystem::create_directories(folder.parent_path(), error);
+    if (::mkdir(folder.c_str(), 0700) != 0 && errno != EEXIST)
+        refuse(VSErrorCode::NotAccessible, "the folder " + folder.string() + " cannot be made: " + std::strerror(errno));
+}
+
+/// SQLite gives its other files the rights of this one.
+void makeFile(const std::filesystem::path& file) {
+    const int descriptor = ::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600);
+    if (descriptor >= 0) {
+        ::close(descriptor);
+        return;
+    }
+    const int reason = errno;
+    refuse(reason == ENOSPC ? VSErrorCode::DiskFull : VSErrorCode::NotAccessible,
+           "the store " + file.string() + " cannot be made: " + std::strerror(reason));
+}
+
+bool fileExists(const std::filesystem::path& file) {
+    std::error_code error;
+    return std::filesystem::exists(file, error);
+}
+
+/// 0: a database without tables, which may become ours; else its schema version.
+int versionOf(VSDatabase& database, const std::filesystem::path& file) {
+    const int64_t identity = database.integer("PRAGMA application_id");
+    const int64_t version = database.integer("PRAGMA user_version");
+    const int64_t count = database.integer("SELECT count(*) FROM sqlite_master");
+    if (identity == 0 && version == 0 && count == 0) return 0;
+    if (identity != VSStoreSchema::applicationID)
+        refuse(VSErrorCode::Refused, file.string() + " is a database of another program");
+    if (version > VSStoreSchema::currentVersion)
+        refuse(VSErrorCode::Refused, file.string() + " was written by a newer version of this program (its format is " +
+                                         std::to_string(version) + ", this program knows " +
+                                         std::to_string(VSStoreSchema::currentVersion) + ")");
+    if (version < 1) refuse(VSErrorCode::Corrupt, file.string() + " has no valid format number");
+    return static_cast<int>(version);
+}
+
+void checkTables(VSDatabase& database, const std::filesystem::path& file) {
+    auto statement = database.use("SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name = ?");
+    for (const char* name : tableNames) {
+        statement.bindText(1, name);
+        if (!statement.step() || statement.integer(0) != 1)
+            refuse(VSErrorCode::Corrupt, file.string() + " lacks its table " + name);
+        statement.reset();
+    }
+}
+
+void createTables(VSDatabase& database, const std::filesystem::path& file) {
+    // In the old journal mode, so that the identity stands in the file itself from the first commit on.
+    database.execute("BEGIN EXCLUSIVE");
+    try {
+        if (versionOf(database, file) == 0) {  // else another process was faster
+            database.execute(tables);
+            database.execute(("PRAGMA application_id = " + std::to_string(VSStoreSchema::applicationID)).c_str());
+            database.execute(("PRAGMA user_version = " + std::to_string(VSStoreSchema::currentVersion)).c_str());
+        }
+        database.execute("COMMIT");
+    } catch (const VSDatabaseFailure&) {
+        try {
+            database.execute("ROLLBACK");
+        } catch (const VSDatabaseFailure&) {
+            // The failure that brought us here is the one to tell; the connection is closed next.
+        }
+        throw;
+    }
+}
+
+/// Migrations to come stand here: step n brings version n to n + 1.
+void migrate(VSDatabase&, const std::filesystem::path& file, int version) {
+    refuse(VSErrorCode::Refused, file.string() + " has the format " + std::to_string(version) + ", which nothing migrates");
+}
+
+void configure(VSDatabase& database) { database.execute("PRAGMA cache_size = -16384; PRAGMA temp_store = MEMORY;"); }
+
+void configureForWriting(VSDatabase& database, bool survivesPowerLoss) {
+    // Full: a commit is on the disk before it is acknowledged.
+    database.execute(survivesPowerLoss ? "PRAGMA synchronous = FULL" : "PRAGMA synchronous = NORMAL");
+    database.execute("PRAGMA journal_size_limit = 67108864; PRAGMA secure_delete = FAST;");
+}
+
+}  // namespace
+
+std::unique_ptr<VSDatabase> VSStoreSchema::openForWriting(const std::filesystem::path& folder, bool createIfMissing,
+                                                          bool survivesPowerLoss, VSDuration patience) {
+    const auto file = folder / fileName;
+    if (!fileExists(file)) {
+        if (!createIfMissing) refuse(VSErrorCode::NotAccessible, "there is no store in " + folder.string());
+        makeFolder(folder);
+        makeFile(file);
+    }
+    auto database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::Write, patience);
+    if (database->isReadOnly()) refuse(VSErrorCode::NotAccessible, "the store " + file.string() + " cannot be written to");
+    int version = versionOf(*database, file);
+    if (version == 0) {
+        createTables(*database, file);
+        version = currentVersion;
+    }
+    if (version < currentVersion) migrate(*database, file, version);
+    checkTables(*database, file);
+    if (auto mode = database->use("PRAGMA journal_mode"); !mode.step() || mode.text(0) != "wal") {
+        mode.reset();
+        auto change = database->use("PRAGMA journal_mode = WAL");
+        if (!change.step() || change.text(0) != "wal")
+            refuse(VSErrorCode::NotAccessible, "the store " + file.string() + " cannot use a write-ahead log where it lies");
+    }
+    configure(*database);
+    configureForWriting(*database, survivesPowerLoss);
+    return database;
+}
+
+std::unique_ptr<VSDatabase> VSStoreSchema::openForReading(const std::filesystem::path& folder, VSDuration patience) {
+    const auto file = folder / fileName;
+    if (!fileExists(file)) refuse(VSErrorCode::NotAccessible, "there is no store in " + folder.string());
+    auto database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::Read, patience);
+    int version = 0;
+    try {
+        version = versionOf(*database, file);
+    } catch (const VSDatabaseFailure& failure) {
+        // A write-ahead log needs its index file. Where the folder cannot be written to and no log is left, the
+        // file alone is complete and nobody can change it.
+        std::error_code ignored;
+        const bool emptyLog = !fileExists(file.string() + "-wal") || std::filesystem::file_size(file.string() + "-wal", ignored) == 0;
+        if (failure.error().code != VSErrorCode::NotAccessible || ::access(folder.c_str(), W_OK) == 0 || !emptyLog) throw;
+        database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::ReadImmutable, patience);
+        version = versionOf(*database, file);
+    }
+    if (version == 0) refuse(VSErrorCode::NotAccessible, "the store in " + folder.string() + " is empty");
+    if (version < currentVersion)
+        refuse(VSErrorCode::Refused, file.string() + " has an older format; open it once for writing");
+    checkTables(*database, file);
+    configure(*database);
+    return database;
+}

@@ -1,0 +1,77 @@
+#pragma once
+
+#include <array>
+#include <map>
+#include <optional>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "Vessa/VSObject.h"
+#include "Vessa/VSRollup.h"
+#include "Vessa/VSSampleRow.h"
+#include "Vessa/VSStoreMatcher.h"
+#include "Vessa/VSStoreProvenances.h"
+
+/// Changes samples and everything that follows from them (order, summaries, rollups) inside one writing
+/// transaction after another: begin, changes, finish, and then the commit; or abandon after a rollback. Used by the
+/// thread of its connection. Throws VSDatabaseFailure.
+class VSStoreWriter {
+   public:
+    explicit VSStoreWriter(VSDatabase& database);
+
+    /// REQUIRES: the transaction has begun.
+    void begin();
+    /// Writes down what was kept in memory; the commit comes next.
+    void finish();
+    void abandon();
+
+    /// Why a sample cannot be saved; none: it can.
+    static std::optional<VSError> objection(const VSSample& sample);
+    /// Saves a sample without objection; a correlation with those members that are not in the store yet. Returns its number.
+    int64_t insert(const VSSample& sample, VSDate now);
+    /// A sample of any kind without its members.
+    int64_t insertAlone(const VSSample& sample, VSDate now);
+    void insertMember(int64_t parent, int position, const VSMemberKey& member);
+    /// The saved object that is meant: the one of its number, or without a number the newest equal one. 0: none.
+    int64_t find(const VSSample& sample);
+    /// False: there is no such object.
+    bool remove(const VSObjectType* type, int64_t start, int64_t id);
+    /// Of one source, or of all; returns how many.
+    int64_t removeAll(const VSObjectType* type, std::optional<std::string> bundleIdentifier);
+    /// Relates a saved sample to a saved workout, once.
+    void addToWorkout(int64_t workout, const VSMemberKey& sample);
+    /// Notes a change of something that queries of the type watch.
+    void touch(const VSObjectType* type);
+
+    int64_t lastNumber() const { return last_; }
+    VSStoreProvenances& provenances() { return provenances_; }
+    VSStoreMetadata& metadata() { return metadata_; }
+    VSStoreMatcher& matcher() { return matcher_; }
+    VSDatabase& database() { return database_; }
+
+   private:
+    static constexpr size_t typeCodes = 128;
+    struct TypeState { int64_t change = 0, longest = 0; };
+    struct SourceChange { int64_t count = 0, firstStart = INT64_MAX, lastEnd = INT64_MIN; bool removed = false; };
+
+    SourceChange& sourceChange(int type, int64_t source);
+    void insertWorkout(int64_t id, const VSWorkout& workout);
+    void removeDetails(int64_t id);
+    void writeTypes();
+    void writeTypeSources();
+    void measureAgain(int type, int64_t source);
+
+    VSDatabase& database_;
+    VSStoreProvenances provenances_;
+    VSStoreMetadata metadata_;
+    VSStoreMatcher matcher_;
+    VSRollupWriter rollups_;
+    VSStatement insert_;
+
+    int64_t last_ = 0;
+    std::array<TypeState, typeCodes> types_{};
+    std::map<std::pair<int, int64_t>, SourceChange> sourceChanges_;
+    std::pair<int, int64_t> recentKey_{-1, -1};
+    SourceChange* recentChange_ = nullptr;
+};

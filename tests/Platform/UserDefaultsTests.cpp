@@ -1,0 +1,102 @@
+#include "Platform/UserDefaults.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <fstream>
+#include <iterator>
+
+#include "TestSupport.h"
+#include "Vessa/Base/VSLog.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+using platform::UserDefaults;
+
+class UserDefaultsTest : public testing::Test {
+ protected:
+    UserDefaultsTest() {
+        previousSink_ = VSSetLogSink([this](VSLogLevel, std::string_view line) { log_.emplace_back(line); });
+    }
+    ~UserDefaultsTest() override { VSSetLogSink(previousSink_); }
+    fs::path file() const { return folder_.path() / "settings" / "defaults.json"; }
+    size_t filesBeside() const {
+        return static_cast<size_t>(
+            std::distance(fs::directory_iterator(file().parent_path()), fs::directory_iterator()));
+    }
+
+    test::TemporaryFolder folder_;
+    std::vector<std::string> log_;
+    VSLogSink previousSink_;
+};
+
+TEST_F(UserDefaultsTest, ValuesOfEveryKindComeBackFromTheFile) {
+    const VSValue::Dictionary dictionary{{"order", VSValue::Array{1, 2.5, "three"}},
+                                         {"nested", VSValue::Dictionary{}}};
+    {
+        UserDefaults defaults(file());
+        EXPECT_FALSE(defaults.value("absent"));
+        EXPECT_FALSE(defaults.boolean("absent"));
+        defaults.setValue("flag", true);
+        defaults.setValue("date", VSReferenceDate);
+        defaults.setValue("dictionary", dictionary);
+        defaults.setValue("text", "Ægte \"tekst\"\n");
+        defaults.setValue("gone", 1);
+        defaults.removeValue("gone");
+    }
+    const UserDefaults again(file());
+    EXPECT_TRUE(again.boolean("flag"));
+    EXPECT_EQ(again.value("date"), VSValue(VSReferenceDate));
+    EXPECT_EQ(again.value("dictionary"), VSValue(dictionary));
+    EXPECT_EQ(again.value("text"), VSValue("Ægte \"tekst\"\n"));
+    EXPECT_FALSE(again.value("gone"));
+    EXPECT_FALSE(again.boolean("text"));
+    EXPECT_EQ(filesBeside(), 1u);
+    struct stat status {};
+    ASSERT_EQ(stat(file().c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 0777, 0600u);
+    EXPECT_TRUE(log_.empty());
+}
+
+TEST_F(UserDefaultsTest, FileThatCannotBeReadIsKeptAside) {
+    fs::create_directories(file().parent_path());
+    for (int round = 1; round <= 2; ++round) {
+        std::ofstream(file()) << "{\"half a file" << round;
+        UserDefaults defaults(file());
+        EXPECT_FALSE(defaults.value("flag"));
+        defaults.setValue("flag", true);
+        ASSERT_EQ(log_.size(), static_cast<size_t>(round));
+    }
+    EXPECT_TRUE(UserDefaults(file()).boolean("flag"));
+    EXPECT_EQ(filesBeside(), 3u);
+    std::ifstream aside(fs::path(file()).concat(".unreadable-2"));
+    std::string text((std::istreambuf_iterator<char>(aside)), {});
+    EXPECT_EQ(text, "{\"half a file2");
+}
+
+TEST_F(UserDefaultsTest, FailedWriteLeavesTheOldFileAndSaysSo) {
+    UserDefaults defaults(file());
+    defaults.setValue("flag", true);
+    // The name of the new file is taken by a folder: the write fails whoever runs the test.
+    fs::create_directory(fs::path(file()).concat(".new"));
+    std::ofstream(fs::path(file()).concat(".new") / "in the way") << "x";
+    defaults.setValue("flag", false);
+    EXPECT_EQ(log_.size(), 1u);
+    EXPECT_FALSE(defaults.boolean("flag"));
+    EXPECT_TRUE(UserDefaults(file()).boolean("flag"));
+}
+
+TEST_F(UserDefaultsTest, LeftOverOfAKilledProcessDoesNoHarm) {
+    UserDefaults defaults(file());
+    defaults.setValue("flag", true);
+    std::ofstream(fs::path(file()).concat(".new")) << "{\"fl";
+    UserDefaults again(file());
+    EXPECT_TRUE(again.boolean("flag"));
+    again.setValue("flag", false);
+    EXPECT_FALSE(UserDefaults(file()).boolean("flag"));
+    EXPECT_EQ(filesBeside(), 1u);
+}
+
+}  // namespace

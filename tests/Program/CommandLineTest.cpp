@@ -1,0 +1,181 @@
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <sstream>
+
+#include "RunProgram.h"
+#include "TestSupport.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+const fs::path kData = fs::path(QELVAR_TEST_DATA) / "import";
+
+class CommandLine : public testing::Test {
+ protected:
+    test::Outcome run(const std::vector<std::string>& arguments) { return program_.run(arguments); }
+    void import(const std::string& name) {
+        const auto outcome = run(
+            {"import", kData / name / (fs::exists(kData / name / "input.zip") ? "input.zip" : "input.xml")});
+        ASSERT_EQ(outcome.status, 0) << outcome.errors;
+    }
+
+    const test::TemporaryFolder folder_;
+    test::Program program_{folder_.path()};
+};
+
+TEST_F(CommandLine, TellsAboutItself) {
+    const auto help = run({"--help"});
+    EXPECT_EQ(help.status, 0);
+    for (const char* command : {"import", "statistics", "samples", "types", "sources", "check"}) {
+        EXPECT_NE(help.output.find(std::string("\n  ") + command), std::string::npos) << command;
+        const auto ofCommand = run({command, "--help"});
+        EXPECT_EQ(ofCommand.status, 0);
+        EXPECT_EQ(ofCommand.output.find(std::string("Usage: qelvar ") + command), 0U);
+    }
+    EXPECT_EQ(run({"--version"}).output.find("qelvar "), 0U);
+}
+
+TEST_F(CommandLine, WrongCommandLinesAreTwo) {
+    for (const std::vector<std::string>& arguments : std::vector<std::vector<std::string>>{
+             {"--nonsense"},
+             {"nonsense"},
+             {"export", "--to", "x.zip"},
+             {"import"},
+             {"import", "--loud", "x"},
+             {"statistics"},
+             {"statistics", "HeartRate", "StepCount"},
+             {"statistics", "HeartRate", "--every", "fortnight"},
+             {"statistics", "HeartRate", "--options", "median"},
+             {"statistics", "HeartRate", "--from", "soon"},
+             {"statistics", "HeartRate", "--from"},
+             {"statistics", "HeartRate", "--from", "2020-03-02", "--to", "2020-03-01"},
+             {"samples"},
+             {"samples", "HeartRate", "--limit", "few"},
+             {"types", "all"},
+             {"check", "--help=yes"},
+             {"--size", "big"},
+             {"--now", "later", "types"},
+             {"--size", "1x1", "types"}}) {
+        const auto outcome = run(arguments);
+        EXPECT_EQ(outcome.status, 2) << arguments[0] << ": " << outcome.errors;
+        EXPECT_EQ(outcome.output, "");
+        EXPECT_EQ(outcome.errors.find("qelvar: "), 0U);
+    }
+}
+
+TEST_F(CommandLine, EachKindOfFailureHasItsStatus) {
+    EXPECT_EQ(run({"sources"}).status, 3);
+    EXPECT_EQ(run({"samples", "Aura"}).status, 3);
+    EXPECT_EQ(run({"samples", "BloodType"}).status, 4);
+    EXPECT_EQ(run({"import", folder_.path() / "missing.zip"}).status, 3);
+    EXPECT_FALSE(fs::exists(folder_.path() / "data" / "qelvar")) << "no store is made for nothing";
+    const auto refused = run({"import", kData / "refused-entity-bomb" / "input.xml"});
+    EXPECT_EQ(refused.status, 4);
+    EXPECT_NE(refused.errors.find("input.xml:3: declares the entity"), std::string::npos);
+    import("identical-records");
+    EXPECT_EQ(run({"samples", "HeartRate", "--source", "Nobody"}).status, 3);
+    std::ofstream(folder_.path() / "data" / "qelvar" / "vessa.sqlite", std::ios::binary)
+        << std::string(10'000, 'x');
+    const int damaged = run({"types"}).status;
+    EXPECT_TRUE(damaged == 5 || damaged == 7) << damaged;
+}
+
+TEST_F(CommandLine, TheStoreIsWhereItIsAskedFor) {
+    const std::string store = folder_.path() / "elsewhere";
+    EXPECT_EQ(run({"--store", store, "import", kData / "identical-records" / "input.xml"}).status, 0);
+    EXPECT_EQ(test::rowsOf(run({"types", "--recorded", "--store=" + store}).output).size(), 2U);
+    EXPECT_FALSE(fs::exists(folder_.path() / "data" / "qelvar"));
+}
+
+TEST_F(CommandLine, ImportTellsWhatItDid) {
+    const auto first = run({"import", "--refusals", "2", kData / "refused-records" / "input.xml"});
+    EXPECT_EQ(first.status, 0);
+    EXPECT_NE(first.output.find("\ntotal\t49\t2\t0\t47\n"), std::string::npos) << first.output;
+    EXPECT_NE(first.errors.find("qelvar: input.xml:5: Record VSQuantityTypeIdentifierHeartRate: not a "
+                                "number: value \"NaN\"\n    <Record "),
+              std::string::npos)
+        << first.errors;
+    EXPECT_NE(first.errors.find("and 45 more"), std::string::npos);
+    EXPECT_NE(first.errors.find("absurd date 4; "), std::string::npos);
+    const auto second =
+        run({"import", kData / "refused-records" / "input.xml", kData / "identical-records" / "input.xml"});
+    EXPECT_NE(second.output.find("\ntotal\t54\t5\t2\t47\n"), std::string::npos) << second.output;
+}
+
+TEST_F(CommandLine, StatisticsFollowZoneUnitAndSource) {
+    import("every-kind");
+    const auto days = test::rowsOf(
+        run({"statistics", "VSQuantityTypeIdentifierStepCount", "--every", "day", "--options", "sum,maximum"})
+            .output);
+    ASSERT_EQ(days.size(), 2U);
+    EXPECT_EQ(days[0].at("start"), "2020-03-01T00:00:00+01:00");
+    EXPECT_EQ(days[1].at("end"), "2020-03-03T00:00:00+01:00");
+    EXPECT_EQ(days[0].at("sum"), "617283.5");
+    EXPECT_EQ(days[1].at("count"), "0");
+    EXPECT_EQ(days[1].at("maximum"), "");
+    EXPECT_FALSE(days[0].contains("average"));
+    program_.set("TZ", "America/New_York");
+    const auto elsewhere = test::rowsOf(run({"statistics", "StepCount", "--every", "day"}).output);
+    ASSERT_EQ(elsewhere.size(), 1U);
+    EXPECT_EQ(elsewhere[0].at("start"), "2020-03-01T00:00:00-05:00");
+
+    const auto mass = test::rowsOf(run({"statistics", "BodyMass", "--unit", "lb", "--by-source"}).output);
+    ASSERT_EQ(mass.size(), 2U);
+    EXPECT_EQ(mass[0].at("source"), "");
+    EXPECT_EQ(mass[1].at("source"), "Kent & Søn");
+    EXPECT_NEAR(std::stod(mass[1].at("average")), 150, 1e-9);
+    EXPECT_EQ(mass[1].at("unit"), "lb");
+    EXPECT_EQ(run({"statistics", "BodyMass", "--unit", "km"}).status, 4);
+}
+
+TEST_F(CommandLine, WhatHasNoQuantityIsCounted) {
+    import("every-kind");
+    for (const char* type : {"SleepAnalysis", "Workout", "BloodPressure"}) {
+        const auto rows = test::rowsOf(run({"statistics", type, "--every", "month"}).output);
+        ASSERT_EQ(rows.size(), 1U) << type;
+        EXPECT_EQ(rows[0].at("count"), "1");
+        EXPECT_EQ(rows[0].at("sum"), "");
+        EXPECT_EQ(rows[0].at("start"), "2020-03-01T00:00:00+01:00");
+    }
+}
+
+TEST_F(CommandLine, SamplesAreListedInOrderAndWithinTheirLimits) {
+    import("wrist-two-days");
+    const auto all = test::rowsOf(run({"samples", "HeartRate"}).output);
+    ASSERT_EQ(all.size(), 2366U);
+    EXPECT_TRUE(std::is_sorted(all.begin(), all.end(), [](const auto& a, const auto& b) {
+        return a.at("start").substr(0, 10) < b.at("start").substr(0, 10);
+    }));
+    EXPECT_EQ(all[0].at("device"), "name:Wrist tracker, hardware:1");
+    EXPECT_EQ(all[0].at("offset"), "3600");
+    const auto newest = test::rowsOf(run({"samples", "HeartRate", "--limit", "2", "--newest-first"}).output);
+    ASSERT_EQ(newest.size(), 2U);
+    EXPECT_EQ(newest[0], all.back());
+    const auto hour = test::rowsOf(run({"samples", "HeartRate", "--from", "2020-03-29T10:00", "--to",
+                                        "2020-03-29T11:00", "--source", "Wrist tracker"})
+                                       .output);
+    ASSERT_FALSE(hour.empty());
+    for (const auto& row : hour) EXPECT_EQ(row.at("start").substr(0, 14), "2020-03-29T10:");
+    const auto sources = test::rowsOf(run({"sources"}).output);
+    ASSERT_EQ(sources.size(), 2U);
+    EXPECT_EQ(sources[0].at("count"), "2545");
+}
+
+TEST_F(CommandLine, SamplesOfEveryKindShowWhatTheySay) {
+    import("every-kind");
+    EXPECT_EQ(test::rowsOf(run({"samples", "SleepAnalysis"}).output).at(0).at("value"),
+              "VSCategoryValueSleepAnalysisAsleep");
+    const auto workout = test::rowsOf(run({"samples", "Workout"}).output).at(0);
+    EXPECT_EQ(workout.at("value"), "VSWorkoutActivityTypeRunning");
+    EXPECT_EQ(workout.at("details"),
+              "duration=1830 s; distance=5200 m; pause=2020-03-01T10:10:00+01:00; "
+              "resume=2020-03-01T10:19:30+01:00");
+    const auto pressure = test::rowsOf(run({"samples", "BloodPressure"}).output).at(0);
+    EXPECT_NE(pressure.at("value").find("BloodPressureSystolic=120 mmHg"), std::string::npos);
+    EXPECT_NE(test::rowsOf(run({"samples", "BodyMass"}).output).at(0).at("metadata").find("after"),
+              std::string::npos);
+}
+
+}  // namespace

@@ -1,0 +1,194 @@
+#include "Qelvar/Models/Data/QVTimeScope.h"
+
+#include <gtest/gtest.h>
+
+#include "Platform/SystemEvents.h"
+#include "Qelvar/Models/Data/QVDateCache.h"
+#include "Qelvar/Models/Data/QVSelectedTimeScopeController.h"
+#include "Qelvar/Models/Data/QVTimePeriod.h"
+#include "TestSupport.h"
+#include "Vessa/VSObject.h"
+
+namespace {
+
+using test::date;
+
+QVDateSpan span(const std::string& start, const std::string& end) {
+    return {date(start), date(end)};
+}
+
+QVDateSpan spanOf(QVTimeScope timeScope, bool noon = false) {
+    return QVTimeScopeSpan(timeScope, VSEnvironment::current()->now(), noon).value();
+}
+
+void PrintTo(const QVDateSpan& value, std::ostream* out) {
+    *out << VSISO8601FromDate(value.start, VSCalendar::current()) << " .. "
+         << VSISO8601FromDate(value.end, VSCalendar::current());
+}
+
+TEST(QVTimeScope, NamesAndZoomLevels) {
+    test::FixedEnvironment environment;
+    EXPECT_EQ(QVTimeScopeDisplayName(QVTimeScope::Hour), "Hour");
+    EXPECT_EQ(QVTimeScopeDisplayName(QVTimeScope::Year), "Year");
+    EXPECT_TRUE(QVTimeScopeDisplayName(QVTimeScope{5}).isNull());
+    EXPECT_TRUE(QVTimeScopeDisplayName(QVTimeScope{-1}).isNull());
+
+    EXPECT_EQ(QVDateZoomForTimeScope(QVTimeScope::Hour), VSDateZoom::Hour);
+    EXPECT_EQ(QVDateZoomForTimeScope(QVTimeScope::Day), VSDateZoom::Day);
+    EXPECT_EQ(QVDateZoomForTimeScope(QVTimeScope::Year), VSDateZoom::Year);
+    for (const auto timeScope : {QVTimeScope::Day, QVTimeScope::Week, QVTimeScope::Month, QVTimeScope::Year})
+        EXPECT_EQ(QVTimeScopeForDateZoom(QVDateZoomForTimeScope(timeScope)), timeScope);
+    // The hour level comes back as a day, which is the level before it.
+    EXPECT_EQ(QVDateZoomForTimeScope(QVTimeScopeForDateZoom(VSDateZoom::Hour)), VSDateZoom::Day);
+    EXPECT_EQ(QVTimeScopeForDateZoom(VSDateZoom{9}), QVTimeScope::Hour);
+}
+
+class QVTimeScopeSpanInZone : public testing::TestWithParam<const char*> {};
+
+TEST_P(QVTimeScopeSpanInZone, SpansEndWithTheAnchorsDayOrMonth) {
+    test::FixedEnvironment environment("2015-11-16T19:40", GetParam());
+    EXPECT_EQ(spanOf(QVTimeScope::Day), span("2015-11-16T00:00", "2015-11-17T00:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Week), span("2015-11-10T00:00", "2015-11-17T00:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Month), span("2015-10-17T00:00", "2015-11-17T00:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Year), span("2014-12-01T00:00", "2015-11-30T23:59:59"));
+
+    EXPECT_EQ(spanOf(QVTimeScope::Day, true), span("2015-11-15T12:00", "2015-11-16T12:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Week, true), span("2015-11-09T12:00", "2015-11-16T12:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Month, true), span("2015-10-16T12:00", "2015-11-16T12:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Year, true), span("2014-12-01T12:00", "2015-12-01T11:59:59"));
+
+    for (const bool noon : {false, true})
+        for (const auto none : {QVTimeScope::Hour, QVTimeScope{5}, QVTimeScope{INT64_MIN}})
+            EXPECT_EQ(QVTimeScopeSpan(none, VSEnvironment::current()->now(), noon), std::nullopt);
+}
+
+INSTANTIATE_TEST_SUITE_P(Zones, QVTimeScopeSpanInZone,
+                         testing::Values("Europe/Copenhagen", "America/New_York", "Asia/Kathmandu"));
+
+TEST(QVTimeScope, DaysOfTheClocksChangeAreCalendarDays) {
+    using std::chrono::hours;
+    test::FixedEnvironment environment("2020-03-29T20:00", "Europe/Copenhagen");
+    EXPECT_EQ(spanOf(QVTimeScope::Day), span("2020-03-29T00:00", "2020-03-30T00:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Day).end - spanOf(QVTimeScope::Day).start, hours(23));
+    EXPECT_EQ(spanOf(QVTimeScope::Day, true), span("2020-03-28T12:00", "2020-03-29T12:00"));
+    environment->setNow(date("2020-04-03T00:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Week), span("2020-03-28T00:00", "2020-04-04T00:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Week).end - spanOf(QVTimeScope::Week).start, hours(7 * 24 - 1));
+
+    test::FixedEnvironment newYork("2020-11-01T00:30", "America/New_York");
+    EXPECT_EQ(spanOf(QVTimeScope::Day).end - spanOf(QVTimeScope::Day).start, hours(25));
+    EXPECT_EQ(spanOf(QVTimeScope::Month), span("2020-10-02T00:00", "2020-11-02T00:00"));
+}
+
+TEST(QVTimeScope, FirstAndLastMomentsOfADayAndOfAYear) {
+    test::FixedEnvironment environment("2020-01-01T00:00", "Europe/Copenhagen");
+    EXPECT_EQ(spanOf(QVTimeScope::Day), span("2020-01-01T00:00", "2020-01-02T00:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Year), span("2019-02-01T00:00", "2020-01-31T23:59:59"));
+    environment->setNow(date("2019-12-31T23:59:59.999999"));
+    EXPECT_EQ(spanOf(QVTimeScope::Day), span("2019-12-31T00:00", "2020-01-01T00:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Year), span("2019-01-01T00:00", "2019-12-31T23:59:59"));
+    environment->setNow(date("2020-02-29T08:00"));
+    EXPECT_EQ(spanOf(QVTimeScope::Year), span("2019-03-01T00:00", "2020-02-29T23:59:59"));
+}
+
+struct CacheObserver : QVDateCacheObserver {
+    void dateCacheDidUpdate(QVDateCache& cache) override {
+        ++updates;
+        startSeen = cache.startOfDayMidnight();
+    }
+    int updates = 0;
+    std::optional<VSDate> startSeen;
+};
+
+TEST(QVDateCache, KeepsItsDatesUntilTheSignificantTimeChange) {
+    test::FixedEnvironment environment("2015-11-16T19:40", "Europe/Copenhagen");
+    QVDateCache cache;
+    auto observer = std::make_shared<CacheObserver>();
+    cache.addObserver(observer);
+    cache.addObserver(std::make_shared<CacheObserver>());  // gone at once
+    const VSDate start = cache.startOfDayMidnight(), noon = cache.startOfWeekNoon();
+
+    environment->setNow(date("2015-11-18T08:00"));
+    EXPECT_EQ(cache.startOfDayMidnight(), start);
+    EXPECT_EQ(cache.startOfWeekNoon(), noon);
+    EXPECT_EQ(cache.endOfDayMidnight(), date("2015-11-17T00:00"));  // follows the start that is cached
+
+    platform::SystemEvents::shared().postSignificantTimeChange();
+    EXPECT_EQ(observer->updates, 1);
+    EXPECT_EQ(observer->startSeen, date("2015-11-18T00:00"));
+    EXPECT_EQ(cache.startOfDayNoon(), date("2015-11-17T12:00"));
+
+    environment->setTimeZone("America/New_York");
+    platform::SystemEvents::shared().postSignificantTimeChange();
+    EXPECT_EQ(cache.startOfDayMidnight(), date("2015-11-18T00:00"));  // in New York now
+    EXPECT_EQ(observer->updates, 2);
+
+    cache.removeObserver(observer.get());
+    platform::SystemEvents::shared().postSignificantTimeChange();
+    EXPECT_EQ(observer->updates, 2);
+}
+
+TEST(QVDateCache, LooksUpEveryScopeAndVariant) {
+    test::FixedEnvironment environment("2015-11-16T19:40", "Asia/Kathmandu");
+    QVDateCache cache;
+    for (const bool noon : {false, true}) {
+        for (const auto timeScope :
+             {QVTimeScope::Day, QVTimeScope::Week, QVTimeScope::Month, QVTimeScope::Year}) {
+            EXPECT_EQ(QVDateCacheStartDate(cache, timeScope, noon), spanOf(timeScope, noon).start);
+            EXPECT_EQ(QVDateCacheEndDate(cache, timeScope, noon), spanOf(timeScope, noon).end);
+        }
+        for (const auto none : {QVTimeScope::Hour, QVTimeScope{5}}) {
+            EXPECT_EQ(QVDateCacheStartDate(cache, none, noon), std::nullopt);
+            EXPECT_EQ(QVDateCacheEndDate(cache, none, noon), std::nullopt);
+        }
+    }
+    EXPECT_EQ(cache.endOfYearMidnight(), date("2015-11-30T23:59:59"));
+    EXPECT_EQ(cache.endOfMonthNoon(), date("2015-11-16T12:00"));
+    EXPECT_EQ(cache.startOfWeek(true), cache.startOfWeekNoon());
+    EXPECT_EQ(cache.startOfWeek(false), cache.startOfWeekMidnight());
+}
+
+TEST(QVDateCache, CacheThatIsGoneHearsNothing) {
+    test::FixedEnvironment environment;
+    auto observer = std::make_shared<CacheObserver>();
+    auto cache = std::make_unique<QVDateCache>();
+    cache->addObserver(observer);
+    cache.reset();
+    platform::SystemEvents::shared().postSignificantTimeChange();
+    EXPECT_EQ(observer->updates, 0);
+}
+
+struct ScopeObserver : QVSelectedTimeScopeControllerObserver {
+    void timeScopeControllerDidUpdateSelectedTimeScope(QVSelectedTimeScopeController& controller) override {
+        seen.push_back(controller.selectedTimeScope());
+    }
+    std::vector<QVTimeScope> seen;
+};
+
+TEST(QVSelectedTimeScopeController, TellsAlsoWhenNothingChanged) {
+    QVSelectedTimeScopeController controller;
+    EXPECT_EQ(controller.selectedTimeScope(), QVTimeScope::Week);
+    auto observer = std::make_shared<ScopeObserver>();
+    controller.addObserver(observer);
+    controller.setSelectedTimeScope(QVTimeScope::Year);
+    controller.setSelectedTimeScope(QVTimeScope::Year);
+    EXPECT_EQ(observer->seen, (std::vector{QVTimeScope::Year, QVTimeScope::Year}));
+    controller.removeObserver(observer.get());
+    controller.setSelectedTimeScope(QVTimeScope::Day);
+    EXPECT_EQ(observer->seen.size(), 2u);
+}
+
+TEST(QVTimePeriod, IsAValueOfTwoDates) {
+    test::FixedEnvironment environment;
+    const auto* type = VSObjectType::dataTypeWithCode(VSCode::SleepAnalysis);
+    QVTimePeriod period(VSCategorySample(type, 1, date("2020-03-30T23:00"), date("2020-03-31T07:00")));
+    EXPECT_EQ(period, QVTimePeriod(date("2020-03-30T23:00"), date("2020-03-31T07:00")));
+    EXPECT_EQ(period.description(), "2020-03-30T23:00:00+02:00 - 2020-03-31T07:00:00+02:00");
+    EXPECT_EQ(std::hash<QVTimePeriod>()(period),
+              std::hash<VSDate>()(period.startDate()) ^ std::hash<VSDate>()(period.endDate()));
+    QVTimePeriod copy = period;
+    copy.setEndDate(date("2020-03-31T08:00"));
+    EXPECT_NE(copy, period);
+}
+
+}  // namespace

@@ -1,0 +1,314 @@
+#include "Vessa/Base/VSCalendar.h"
+
+#include <gtest/gtest.h>
+#include <unicode/basictz.h>
+#include <unicode/gregocal.h>
+#include <unicode/tztrans.h>
+
+#include <random>
+
+#include "TestSupport.h"
+
+namespace {
+
+constexpr int64_t kMinute = 60'000'000, kDay = 1440 * kMinute;
+
+/// The slow truth: a zone's wall clock asked of ICU minute by minute.
+class WallClock {
+ public:
+    explicit WallClock(const std::string& zone)
+        : zone_(icu::TimeZone::createTimeZone(icu::UnicodeString::fromUTF8(zone))) {}
+
+    /// Microseconds since 1970 as the clock on the wall shows them.
+    int64_t local(int64_t time) const {
+        int32_t raw = 0, saving = 0;
+        UErrorCode status = U_ZERO_ERROR;
+        zone_->getOffset(static_cast<double>(time) / 1000, false, raw, saving, status);
+        return time + (raw + saving) * int64_t{1000};
+    }
+
+    /// The first moment at which the clock shows the local time or has jumped over it. Changes lie on half
+    /// minutes.
+    VSDate firstMomentOf(int64_t localTime) const {
+        int64_t time = localTime - 15 * 60 * kMinute;  // no zone is further east
+        while (local(time) < localTime) time += kMinute / 2;
+        return VSDate::fromMicroseconds(time);
+    }
+
+    /// Moments of the zone's changes of the clock from 1950 to 2037.
+    std::vector<int64_t> changes() const {
+        std::vector<int64_t> result;
+        const auto& rules = dynamic_cast<const icu::BasicTimeZone&>(*zone_);
+        icu::TimeZoneTransition transition;
+        UDate time = -631'152'000'000.0;
+        while (rules.getNextTransition(time, false, transition) &&
+               transition.getTime() < 2'114'380'800'000.0) {
+            time = transition.getTime();
+            result.push_back(static_cast<int64_t>(time) * 1000);
+        }
+        return result;
+    }
+
+ private:
+    std::unique_ptr<icu::TimeZone> zone_;
+};
+
+int64_t floorToDay(int64_t local) {
+    return (local >= 0 ? local / kDay : -((-local + kDay - 1) / kDay)) * kDay;
+}
+
+class CalendarOfZone : public testing::TestWithParam<const char*> {
+ protected:
+    /// Whole minutes, most of them within three days of a change of the clock.
+    std::vector<VSDate> interestingDates(int count) {
+        const auto changes = clock.changes();
+        std::mt19937_64 random(7);
+        std::uniform_int_distribution<int64_t> near(-3 * 1440, 3 * 1440), anywhere(-10'000'000, 35'000'000);
+        std::vector<VSDate> dates;
+        for (int i = 0; i < count; ++i) {
+            const bool quiet = changes.empty() || i % 8 == 0;
+            const int64_t minutes =
+                quiet ? anywhere(random) : changes[random() % changes.size()] / kMinute + near(random);
+            dates.push_back(VSDate::fromMicroseconds(minutes * kMinute));
+        }
+        return dates;
+    }
+
+    const WallClock clock{GetParam()};
+    const VSCalendar calendar{GetParam(), "en_US"};
+};
+
+INSTANTIATE_TEST_SUITE_P(Zones, CalendarOfZone,
+                         testing::Values("Europe/Copenhagen", "America/New_York", "Asia/Kathmandu",
+                                         "Africa/Monrovia", "Pacific/Apia", "America/Sao_Paulo",
+                                         "Asia/Beirut", "Australia/Lord_Howe", "America/St_Johns",
+                                         "Africa/Casablanca", "GMT+05:45"),
+                         [](const auto& zone) {
+                             std::string name = zone.param;
+                             std::erase_if(
+                                 name, [](char c) { return !std::isalnum(static_cast<unsigned char>(c)); });
+                             return name;
+                         });
+
+TEST_P(CalendarOfZone, AgreesWithTheWallClock) {
+    for (const VSDate date : interestingDates(100)) {
+        SCOPED_TRACE(VSISO8601FromDate(date, calendar));
+        const int64_t local = clock.local(date.microseconds());
+        const int64_t day = floorToDay(local);
+        EXPECT_EQ(calendar.secondsFromGMT(date) * int64_t{1'000'000}, local - date.microseconds());
+        EXPECT_EQ(calendar.startOfDay(date), clock.firstMomentOf(day));
+        EXPECT_EQ(calendar.noonOfDay(date), clock.firstMomentOf(day + kDay / 2));
+        EXPECT_EQ(calendar.yesterdayAtNoon(date), clock.firstMomentOf(day - kDay / 2));
+        EXPECT_EQ(calendar.addDays(date, 1), clock.firstMomentOf(local + kDay));
+        EXPECT_EQ(calendar.addDays(date, -3), clock.firstMomentOf(local - 3 * kDay));
+        EXPECT_EQ(calendar.component(VSCalendarUnit::Hour, date), (local - day) / kMinute / 60);
+        EXPECT_EQ(calendar.component(VSCalendarUnit::Minute, date), (local - day) / kMinute % 60);
+        EXPECT_LE(calendar.startOfHour(date), date);
+        EXPECT_EQ(calendar.startOfHour(calendar.startOfHour(date)), calendar.startOfHour(date));
+        if (testing::Test::HasFailure()) return;
+    }
+}
+
+TEST_P(CalendarOfZone, AgreesWithTheCalendarOfICU) {
+    UErrorCode status = U_ZERO_ERROR;
+    icu::GregorianCalendar icu(icu::TimeZone::createTimeZone(icu::UnicodeString(GetParam())),
+                               icu::Locale("en_US"), status);
+    icu.setGregorianChange(-1e15, status);
+    icu.setRepeatedWallTimeOption(UCAL_WALLTIME_FIRST);
+    icu.setSkippedWallTimeOption(UCAL_WALLTIME_NEXT_VALID);
+    ASSERT_TRUE(U_SUCCESS(status));
+    std::mt19937 random(3);
+    for (const VSDate date : interestingDates(3000)) {
+        SCOPED_TRACE(VSISO8601FromDate(date, calendar));
+        const auto fields = [&](VSDate of) {
+            icu.setTime(of.icuMilliseconds(), status);
+            return std::array{icu.get(UCAL_ERA, status),         icu.get(UCAL_YEAR, status),
+                              icu.get(UCAL_MONTH, status) + 1,   icu.get(UCAL_DATE, status),
+                              icu.get(UCAL_HOUR_OF_DAY, status), icu.get(UCAL_DAY_OF_WEEK, status)};
+        };
+        const std::array ours{calendar.component(VSCalendarUnit::Era, date),
+                              calendar.component(VSCalendarUnit::Year, date),
+                              calendar.component(VSCalendarUnit::Month, date),
+                              calendar.component(VSCalendarUnit::Day, date),
+                              calendar.component(VSCalendarUnit::Hour, date),
+                              calendar.component(VSCalendarUnit::Weekday, date)};
+        ASSERT_EQ(ours, fields(date));
+
+        // Months: the fields of ICU's sum, set anew so that gaps and overlaps follow the rule chosen above.
+        const int months = static_cast<int>(random() % 61) - 30;
+        icu.setTime(date.icuMilliseconds(), status);
+        const int hour = icu.get(UCAL_HOUR_OF_DAY, status), minute = icu.get(UCAL_MINUTE, status),
+                  second = icu.get(UCAL_SECOND, status);
+        icu.set(UCAL_HOUR_OF_DAY, 12);
+        icu.add(UCAL_MONTH, months, status);
+        const int year = icu.get(UCAL_YEAR, status), month = icu.get(UCAL_MONTH, status),
+                  day = icu.get(UCAL_DATE, status);
+        icu.clear();
+        icu.set(year, month, day, hour, minute, second);
+        if (months != 0) {
+            ASSERT_EQ(calendar.addMonths(date, months).icuMilliseconds(), icu.getTime(status))
+                << months << " months";
+        }
+    }
+}
+
+TEST(VSCalendar, DaysThatHaveNoMidnightBeginAfterTheGap) {
+    const VSCalendar brazil("America/Sao_Paulo", "pt_BR"), beirut("Asia/Beirut", "ar_LB");
+    EXPECT_EQ(VSISO8601FromDate(brazil.startOfDay(*brazil.date(2018, 11, 4, 15)), brazil),
+              "2018-11-04T01:00:00-02:00");
+    EXPECT_EQ(VSISO8601FromDate(beirut.startOfDay(*beirut.date(2021, 3, 28, 15)), beirut),
+              "2021-03-28T01:00:00+03:00");
+    // Adding days from there keeps the time of day of the date, not of the midnight that was meant.
+    EXPECT_EQ(VSISO8601FromDate(brazil.addDays(*brazil.date(2018, 11, 3), 1), brazil),
+              "2018-11-04T01:00:00-02:00");
+}
+
+TEST(VSCalendar, ADayThatAZoneLeftOut) {
+    const VSCalendar apia("Pacific/Apia", "en_WS");  // went from 29 to 31 December 2011
+    const VSDate before = *apia.date(2011, 12, 29), after = *apia.date(2011, 12, 31);
+    EXPECT_EQ(after - before, std::chrono::hours(24));
+    EXPECT_EQ(apia.date(2011, 12, 30), after);
+    EXPECT_EQ(apia.addDays(before, 1), after);
+    const auto days =
+        apia.bucketBoundaries(*apia.date(2011, 12, 1), {.days = 1}, before, *apia.date(2012, 1, 2));
+    EXPECT_EQ(days, (std::vector{before, after, *apia.date(2012, 1, 1), *apia.date(2012, 1, 2)}));
+}
+
+TEST(VSCalendar, HoursAcrossAChangeOfTheClock) {
+    const VSCalendar newYork("America/New_York", "en_US"), lordHowe("Australia/Lord_Howe", "en_AU");
+    const auto hour = [](const VSCalendar& calendar, const char* text) {
+        return VSISO8601FromDate(calendar.startOfHour(*VSDateFromISO8601(text, calendar)), calendar);
+    };
+    EXPECT_EQ(hour(newYork, "2020-11-01T01:30:00-04:00"), "2020-11-01T01:00:00-04:00");
+    EXPECT_EQ(hour(newYork, "2020-11-01T01:30:00-05:00"), "2020-11-01T01:00:00-05:00");
+    EXPECT_EQ(hour(lordHowe, "2020-10-04T02:45:00"),
+              "2020-10-04T02:30:00+11:00");  // the clock jumped to 2:30
+    const VSDate late = *VSDateFromISO8601("2020-10-31T23:59:59.999999", newYork);
+    EXPECT_EQ(newYork.add(late, {.hours = 3}) - late, std::chrono::hours(3));
+    EXPECT_EQ(VSISO8601FromDate(newYork.add(late, {.days = 1}), newYork), "2020-11-01T23:59:59.999999-05:00");
+    // Nothing added to the second of two equal hours gives that hour again.
+    const VSDate second = *VSDateFromISO8601("2020-11-01T01:30:00-05:00", newYork);
+    EXPECT_EQ(newYork.add(second, {}), second);
+}
+
+TEST(VSCalendar, MonthsKeepTheDayWhereItExists) {
+    const VSCalendar calendar("Europe/Copenhagen", "da_DK");
+    const VSDate last = *calendar.date(2020, 1, 31, 10);
+    EXPECT_EQ(calendar.addMonths(last, 1), calendar.date(2020, 2, 29, 10));
+    EXPECT_EQ(calendar.addMonths(last, -11), calendar.date(2019, 2, 28, 10));
+    EXPECT_EQ(calendar.add(last, {.years = 1, .months = 1, .days = 1}), calendar.date(2021, 3, 1, 10));
+    EXPECT_EQ(calendar.startOfMonth(last), calendar.date(2020, 1, 1));
+    // March 2020 is an hour short: its middle is half an hour before that of 31 whole days.
+    EXPECT_EQ(calendar.middleOfMonth(*calendar.date(2020, 3, 5)), *calendar.date(2020, 3, 16, 11, 30));
+    const auto months = calendar.bucketBoundaries(last, {.months = 1}, *calendar.date(2020, 2, 1),
+                                                  *calendar.date(2020, 4, 30));
+    EXPECT_EQ(months, (std::vector{last, *calendar.date(2020, 2, 29, 10), *calendar.date(2020, 3, 31, 10),
+                                   *calendar.date(2020, 4, 30, 10)}));
+}
+
+TEST(VSCalendar, BucketsCoverTheRangeFromEitherSideOfTheAnchor) {
+    std::mt19937_64 random(11);
+    const std::array<VSDateComponents, 7> intervals{{{.days = 1},
+                                                     {.days = 7},
+                                                     {.months = 1},
+                                                     {.years = 1},
+                                                     {.hours = 1},
+                                                     {.minutes = 15},
+                                                     {.months = 1, .days = 3, .hours = 5}}};
+    for (const char* zone :
+         {"Europe/Copenhagen", "America/Sao_Paulo", "Australia/Lord_Howe", "Pacific/Apia"}) {
+        const VSCalendar calendar(zone, "en_US");
+        for (int i = 0; i < 400; ++i) {
+            const auto& interval = intervals[random() % intervals.size()];
+            const bool fine = interval.days == 0 && interval.months == 0 && interval.years == 0;
+            const auto years = [&](int from, int to) {
+                return VSDate::fromSeconds(
+                    (from + static_cast<int64_t>(random() % static_cast<uint64_t>(to - from))) * 31'557'600 +
+                    static_cast<int64_t>(random() % 31'000'000));
+            };
+            const VSDate anchor = calendar.startOfDay(years(-5, 60)), start = years(20, 50);
+            const VSDate end =
+                start + VSDuration(1 + static_cast<int64_t>(random() % (fine ? 30 : 3000)) * kDay / 2);
+            const auto dates = calendar.bucketBoundaries(anchor, interval, start, end);
+            SCOPED_TRACE(std::string(zone) + " " + VSISO8601FromDate(start, calendar) + " to " +
+                         VSISO8601FromDate(end, calendar));
+            ASSERT_GE(dates.size(), 2U);
+            EXPECT_LE(dates.front(), start);
+            EXPECT_GT(dates[1], start);
+            EXPECT_GE(dates.back(), end);
+            EXPECT_LT(dates[dates.size() - 2], end);
+            ASSERT_TRUE(std::is_sorted(dates.begin(), dates.end(), std::less_equal<>()) || dates.size() == 1);
+            ASSERT_EQ(std::adjacent_find(dates.begin(), dates.end(), std::greater_equal<>()), dates.end());
+        }
+    }
+}
+
+TEST(VSCalendar, DayBucketsAreTheDays) {
+    const VSCalendar calendar("America/Sao_Paulo", "pt_BR");
+    const VSDate anchor = *calendar.date(2018, 6, 1);
+    const auto days = calendar.bucketBoundaries(anchor, {.days = 1}, *calendar.date(2010, 1, 1),
+                                                *calendar.date(2019, 1, 1));
+    EXPECT_EQ(days.size(), 3287U + 1);
+    for (const VSDate day : days) ASSERT_EQ(calendar.startOfDay(day), day);
+}
+
+TEST(VSCalendar, LocalDatesThatDoNotExistAreRefused) {
+    const VSCalendar calendar("Europe/Copenhagen", "da_DK");
+    EXPECT_FALSE(calendar.date(2021, 2, 29));
+    EXPECT_FALSE(calendar.date(1900, 2, 29));
+    EXPECT_TRUE(calendar.date(2000, 2, 29));
+    EXPECT_FALSE(calendar.date(2021, 0, 1));
+    EXPECT_FALSE(calendar.date(2021, 13, 1));
+    EXPECT_FALSE(calendar.date(2021, 4, 31));
+    EXPECT_FALSE(calendar.date(2021, 4, 1, 24));
+    EXPECT_FALSE(calendar.date(2021, 4, 1, 0, 0, 60));
+    EXPECT_EQ(calendar.date(2021, 3, 28, 2, 30), calendar.date(2021, 3, 28, 3));  // in the gap
+}
+
+TEST(VSCalendar, WholeYearsAreCountedAsBirthdays) {
+    const VSCalendar calendar("Europe/Copenhagen", "da_DK");
+    const VSDate born = *calendar.date(1980, 2, 29);
+    EXPECT_EQ(calendar.wholeYearsBetween(born, *calendar.date(2020, 2, 28)), 39);
+    EXPECT_EQ(calendar.wholeYearsBetween(born, *calendar.date(2020, 2, 29)), 40);
+    EXPECT_EQ(calendar.wholeYearsBetween(born, *calendar.date(2021, 2, 28)), 41);
+    EXPECT_EQ(calendar.wholeYearsBetween(*calendar.date(2020, 2, 29), born), -40);
+    EXPECT_EQ(calendar.wholeYearsBetween(born, born), 0);
+}
+
+TEST(VSCalendar, DistantDatesAreReckonedToo) {
+    const VSCalendar calendar("America/New_York", "en_US");
+    EXPECT_EQ(VSISO8601FromDate(*calendar.date(2755, 7, 1, 12), calendar), "2755-07-01T12:00:00-04:00");
+    EXPECT_EQ(VSISO8601FromDate(*calendar.date(2755, 1, 1, 12), calendar), "2755-01-01T12:00:00-05:00");
+    EXPECT_EQ(calendar.component(VSCalendarUnit::Year, *calendar.date(0, 6, 1)), 1);
+    EXPECT_EQ(calendar.component(VSCalendarUnit::Era, *calendar.date(0, 6, 1)), 0);
+    for (const VSDate date : {VSDate::distantPast(), VSDate::distantFuture()}) {
+        const VSDate day = calendar.startOfDay(date);
+        EXPECT_LE(day, date);
+        EXPECT_LT(date - day, std::chrono::hours(25));
+    }
+}
+
+TEST(VSCalendar, WeeksFollowTheLocale) {
+    const auto week = [](const char* locale) { return VSCalendar("Etc/UTC", locale); };
+    EXPECT_EQ(week("en_US").firstWeekday(), 1);
+    EXPECT_EQ(week("da_DK").firstWeekday(), 2);
+    EXPECT_EQ(week("ar_EG").firstWeekday(), 7);
+    EXPECT_EQ(week("en_US").weekendDays(), (std::vector{1, 7}));
+    EXPECT_EQ(week("ar_EG").weekendDays(), (std::vector{6, 7}));
+    EXPECT_EQ(week("fa_IR").weekendDays(), (std::vector{6}));
+}
+
+TEST(VSCalendar, TodayAndYesterdayFollowClockAndZone) {
+    test::FixedEnvironment environment("2020-03-31T23:30", "Europe/Copenhagen");
+    const VSDate now = environment->now();
+    EXPECT_TRUE(VSCalendar::current().isToday(now - std::chrono::hours(23)));
+    EXPECT_TRUE(VSCalendar::current().isYesterday(now - std::chrono::hours(24)));
+    EXPECT_FALSE(VSCalendar::current().isYesterday(now - std::chrono::hours(48)));
+    environment->setTimeZone("Asia/Kathmandu");  // there it is already 1 April
+    EXPECT_EQ(VSCalendar::current().component(VSCalendarUnit::Day, now), 1);
+    EXPECT_TRUE(VSCalendar::current().isYesterday(now - std::chrono::hours(23)));
+    environment->setNow(now + std::chrono::hours(24));
+    EXPECT_TRUE(VSCalendar::current().isYesterday(now));
+}
+
+}  // namespace

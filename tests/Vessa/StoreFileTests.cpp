@@ -1,0 +1,282 @@
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <fstream>
+#include <functional>
+
+#include "StoreTestSupport.h"
+#include "Vessa/VSDatabase.h"
+
+using namespace test;
+
+namespace {
+
+struct StoreFile : testing::Test {
+    FixedEnvironment environment;
+    TemporaryFolder folder;
+    const std::filesystem::path file = folder.path() / "vessa.sqlite";
+
+    std::string bytes() const {
+        std::ifstream stream(file, std::ios::binary);
+        return {std::istreambuf_iterator<char>(stream), {}};
+    }
+    void makeStore(int samples = 10) const {
+        const auto store = openStore(folder.path());
+        std::vector<VSSamplePtr> objects;
+        for (int i = 0; i < samples; ++i)
+            objects.push_back(quantity(heartRate(), i, date("2020-03-01") + std::chrono::seconds(i), date("2020-03-01") + std::chrono::seconds(i)));
+        EXPECT_OK(store->saveObjectsAndWait(objects));
+    }
+    void change(const char* sql) const { VSDatabase(file, VSDatabase::Mode::Write, VSDuration(0)).execute(sql); }
+    VSErrorCode refusal(VSHealthStore::Options options = {}) const {
+        const auto store = VSHealthStore::open(folder.path(), options);
+        EXPECT_FALSE(store.ok());
+        if (store.ok()) return VSErrorCode::Failed;
+        EXPECT_NE(store.error().message, "");
+        return store.error().code;
+    }
+};
+
+/// Another process that runs the block and ends; it shares nothing with this one but the pipes. No other thread
+/// runs in a test that makes one.
+class Child {
+   public:
+    /// The block gets a function that says a line to the parent and one that waits for the parent's word.
+    using Block = std::function<void(const std::function<void(char)>& say, const std::function<bool()>& listen)>;
+    explicit Child(const Block& block) {
+        int up[2], down[2];
+        if (pipe2(up, O_CLOEXEC) || pipe2(down, O_CLOEXEC)) std::abort();
+        process_ = fork();
+        if (process_ == 0) {
+            close(up[0]);
+            close(down[1]);
+            block([&](char word) { if (write(up[1], &word, 1) != 1) _exit(2); },
+                  [&] { char word; return read(down[0], &word, 1) == 1; });
+            _exit(0);
+        }
+        close(up[1]);
+        close(down[0]);
+        hear_ = up[0];
+        tell_ = down[1];
+    }
+    ~Child() {
+        end();
+        close(hear_);
+        close(tell_);
+    }
+    bool hear() { char word; return read(hear_, &word, 1) == 1; }
+    void tell() { if (write(tell_, "x", 1) != 1) ADD_FAILURE() << "the other process is gone"; }
+    void kill() {
+        ::kill(process_, SIGKILL);
+        end();
+    }
+    void end() {
+        if (process_ <= 0) return;
+        waitpid(process_, nullptr, 0);
+        process_ = 0;
+    }
+
+   private:
+    pid_t process_;
+    int hear_, tell_;
+};
+
+}  // namespace
+
+TEST_F(StoreFile, BelongsToItsUserOnly) {
+    const auto inner = folder.path() / "deep" / "store";
+    openStore(inner);
+    const auto rights = [](const std::filesystem::path& path) {
+        struct stat status{};
+        EXPECT_EQ(stat(path.c_str(), &status), 0) << path;
+        return status.st_mode & 0777;
+    };
+    EXPECT_EQ(rights(inner), 0700u);
+    EXPECT_EQ(rights(inner / "vessa.sqlite"), 0600u);
+}
+
+TEST_F(StoreFile, IsRefusedUntouchedWhenItIsNotOurs) {
+    VSHealthStore::Options options;
+    options.createIfMissing = false;
+    EXPECT_EQ(refusal(options), VSErrorCode::NotAccessible) << "missing";
+
+    std::ofstream(file) << std::string(5000, 'x');
+    EXPECT_EQ(refusal(), VSErrorCode::Corrupt);
+    EXPECT_EQ(bytes(), std::string(5000, 'x'));
+    std::filesystem::remove(file);
+
+    std::ofstream(file) << "";
+    change("CREATE TABLE theirs(a)");
+    const std::string theirs = bytes();
+    EXPECT_EQ(refusal(), VSErrorCode::Refused);
+    EXPECT_EQ(bytes(), theirs);
+}
+
+TEST_F(StoreFile, OfANewerFormatIsRefusedUntouched) {
+    makeStore();
+    change("PRAGMA user_version = 2; PRAGMA wal_checkpoint(TRUNCATE)");
+    const std::string before = bytes();
+    EXPECT_EQ(refusal(), VSErrorCode::Refused);
+    VSHealthStore::Options options;
+    options.readOnly = true;
+    EXPECT_EQ(refusal(options), VSErrorCode::Refused);
+    EXPECT_EQ(bytes(), before);
+}
+
+TEST_F(StoreFile, DamageIsReportedAndNothingIsChanged) {
+    makeStore(20000);
+    const auto whole = bytes();
+    std::filesystem::resize_file(file, whole.size() / 2);
+    EXPECT_EQ(refusal(), VSErrorCode::Corrupt);
+    EXPECT_EQ(bytes(), whole.substr(0, whole.size() / 2));
+
+    // Broken pages: the store opens, what reads them says so, and the check finds them.
+    std::string broken = whole;
+    for (size_t at = broken.size() / 4; at < broken.size() / 2; ++at) broken[at] = static_cast<char>(at * 31);
+    std::ofstream(file, std::ios::binary) << broken;
+    const auto store = openStore(folder.path());
+    ASSERT_TRUE(store);
+    const auto samples = store->samples(heartRate(), {}, 0, {});
+    ASSERT_FALSE(samples.ok()) << "an empty or partial answer would be a lie";
+    EXPECT_EQ(samples.error().code, VSErrorCode::Corrupt);
+    const auto report = store->check();
+    EXPECT_TRUE(!report.ok() || !report->problems.empty());
+}
+
+TEST_F(StoreFile, TheCheckFindsWhatWasTamperedWith) {
+    makeStore();
+    for (const char* sql : {"UPDATE samples SET value = 9 WHERE value = 5", "UPDATE type_sources SET count = 11", "DELETE FROM rollups",
+                            "DELETE FROM samples WHERE value = 3", "UPDATE provenances SET source = 99"}) {
+        TemporaryFolder copy;
+        std::filesystem::copy(folder.path(), copy.path(), std::filesystem::copy_options::recursive);
+        VSDatabase(copy.path() / "vessa.sqlite", VSDatabase::Mode::Write, VSDuration(0)).execute(sql);
+        const auto report = openStore(copy.path())->check();
+        EXPECT_TRUE(!report.ok() || !report->problems.empty()) << sql;
+    }
+    const auto store = openStore(folder.path());
+    EXPECT_EQ(store->check()->samples, 10);
+    expectSound(*store);
+}
+
+TEST_F(StoreFile, ReadOnlyReadsAndRefusesToWrite) {
+    makeStore();
+    VSHealthStore::Options options;
+    options.readOnly = true;
+    const auto store = openStore(folder.path(), options);
+    EXPECT_EQ(allSamples(*store, heartRate()).size(), 10u);
+    const VSStatus status = store->saveObjectsAndWait({quantity(heartRate(), 1, "2020-03-01", "2020-03-01")});
+    ASSERT_FALSE(status.ok());
+    EXPECT_EQ(status.error().code, VSErrorCode::NotAccessible);
+    EXPECT_FALSE(store->beginImport("x").ok());
+}
+
+TEST_F(StoreFile, AFullDiskFailsTheSaveAndHurtsNothing) {
+    const auto store = openStore(folder.path());
+    EXPECT_OK(store->saveObjectsAndWait({quantity(heartRate(), 1, "2020-03-01", "2020-03-01")}));
+    std::vector<VSSamplePtr> many;
+    for (int i = 0; i < 50000; ++i)
+        many.push_back(quantity(heartRate(), i, date("2020-03-01") + std::chrono::seconds(i), date("2020-03-01") + std::chrono::seconds(i)));
+
+    signal(SIGXFSZ, SIG_IGN);
+    rlimit before{};
+    ASSERT_EQ(getrlimit(RLIMIT_FSIZE, &before), 0);
+    rlimit small = before;
+    small.rlim_cur = 1 << 20;
+    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &small), 0);
+    const VSStatus full = store->saveObjectsAndWait(many);
+    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &before), 0);
+    ASSERT_FALSE(full.ok());
+    EXPECT_EQ(full.error().code, VSErrorCode::DiskFull) << full.error().message;
+    EXPECT_EQ(allSamples(*store, heartRate()).size(), 1u);
+    EXPECT_OK(store->saveObjectsAndWait(many));
+    EXPECT_EQ(allSamples(*store, heartRate()).size(), 50001u);
+    expectSound(*store);
+}
+
+TEST_F(StoreFile, AnotherConnectionSeesAndHearsOfChanges) {
+    const auto writing = openStore(folder.path()), watching = openStore(folder.path());
+    Log<bool> told;
+    watching->executeQuery(std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto& error) { told.add(!error); }));
+    ASSERT_TRUE(told.waitFor(1));
+    EXPECT_OK(writing->saveObjectsAndWait({quantity(heartRate(), 1, "2020-03-01", "2020-03-01")}));
+    ASSERT_TRUE(told.waitFor(2));
+    EXPECT_EQ(allSamples(*watching, heartRate()).size(), 1u);
+    // Numbers of sources and metadata that the other one gave are known here.
+    auto provenance = from("Phone");
+    provenance.metadata = std::make_shared<VSMetadata>(VSMetadata{{"k", 1}});
+    for (int i = 0; i < 3; ++i) {
+        EXPECT_OK(writing->saveObjectsAndWait({quantity(heartRate(), i, "2020-03-02", "2020-03-02", provenance)}));
+        EXPECT_OK(watching->saveObjectsAndWait({quantity(heartRate(), i, "2020-03-02", "2020-03-02", provenance)}));
+    }
+    EXPECT_EQ(writing->sourceSummaries()->size(), 2u);
+    expectSound(*writing);
+}
+
+TEST_F(StoreFile, AnotherProcessIsHeardOf) {
+    Child child([this](const auto& say, const auto& listen) {
+        listen();
+        const auto store = openStore(folder.path());
+        if (store->saveObjectsAndWait({quantity(heartRate(), 1, "2020-03-01", "2020-03-01")}).ok()) say('+');
+    });
+    {
+        const auto store = openStore(folder.path());
+        Log<size_t> told;
+        store->executeQuery(std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto&) { told.add(0); }));
+        ASSERT_TRUE(told.waitFor(1));
+        child.tell();
+        EXPECT_TRUE(child.hear());
+        EXPECT_TRUE(told.waitFor(2));
+        EXPECT_EQ(allSamples(*store, heartRate()).size(), 1u);
+    }
+}
+
+TEST_F(StoreFile, AKilledProcessLosesNoAcknowledgedSave) {
+    openStore(folder.path());
+    int acknowledged = 0;
+    for (int round = 0; round < 12; ++round) {
+        Child child([&](const auto& say, const auto&) {
+            const auto store = openStore(folder.path());
+            for (int i = 0;; ++i) {
+                // Some saves are large, some replace what was there, so that every phase of a commit is hit.
+                std::vector<VSSamplePtr> objects;
+                for (int n = 0; n < (i % 7 == 3 ? 500 : 1); ++n)
+                    objects.push_back(quantity(steps(), n, date("2020-03-01") + std::chrono::minutes(i), date("2020-03-01") + std::chrono::minutes(i + 30), from("Watch")));
+                objects.push_back(quantity(heartRate(), round, "2020-03-01", "2020-03-01"));
+                if (!store->saveObjectsAndWait(objects).ok()) _exit(3);
+                say('+');
+            }
+        });
+        for (int heard = 0; heard < 1 + round * 3; ++heard) acknowledged += child.hear();
+        child.kill();
+        while (child.hear()) ++acknowledged;
+        const auto store = openStore(folder.path());
+        const auto kept = static_cast<int>(allSamples(*store, heartRate()).size());
+        EXPECT_GE(kept, acknowledged);
+        EXPECT_LE(kept, acknowledged + 1) << "at most the one that was under way when it died";
+        acknowledged = kept;
+        expectSound(*store);
+    }
+}
+
+TEST_F(StoreFile, AKilledImportLeavesNoTrace) {
+    makeStore();
+    Child child([this](const auto& say, const auto& listen) {
+        const auto store = openStore(folder.path());
+        auto transaction = store->beginImport("killed");
+        for (int i = 0; i < 60000; ++i)
+            if (!(*transaction)->add(*quantity(steps(), i, date("2020-03-01") + std::chrono::minutes(i), date("2020-03-01") + std::chrono::minutes(i + 1), from("New"))).ok()) _exit(3);
+        say('+');
+        listen();
+    });
+    ASSERT_TRUE(child.hear());
+    child.kill();
+    const auto store = openStore(folder.path());
+    EXPECT_TRUE(allSamples(*store, steps()).empty());
+    EXPECT_EQ(store->sourceSummaries()->size(), 1u);
+    expectSound(*store);
+}
