@@ -72,7 +72,7 @@ QImage icon(const QString& name, QSizeF size, double scale, const QColor& tint, 
     }
     const QString path = QStringLiteral(":/icons/%1.svg").arg(name);
     if (!QFile::exists(path)) return {};
-    const QImage image = rendered(path, key, scale);
+    QImage image = rendered(path, key, scale);
     QMutexLocker lock(&mutex);
     cache.insert(key, new QImage(image), std::max<qsizetype>(1, image.sizeInBytes() / 1024));
     return image;

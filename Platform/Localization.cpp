@@ -30,7 +30,7 @@ struct Language {
 
     QString text(const char* key, int number = -1) const {
         for (const auto& table : tables) {
-            const QString found = table->translate(nullptr, key, nullptr, number);
+            QString found = table->translate(nullptr, key, nullptr, number);
             if (!found.isNull()) return found;
         }
         return QString::fromUtf8(key);

@@ -1,5 +1,7 @@
 #include "Platform/Queue.h"
 
+#include <pthread.h>
+
 #include <QAbstractEventDispatcher>
 #include <QCoreApplication>
 #include <QEvent>
@@ -82,7 +84,7 @@ void runOnPool(std::function<void()> function) {
 // What a queue and its running blocks share. `limit` blocks run at the same time; 0 means any number.
 class WorkQueueState : public std::enable_shared_from_this<WorkQueueState> {
  public:
-    explicit WorkQueueState(int limit) : limit_(limit) {}
+    WorkQueueState(std::string name, int limit) : name_(std::move(name)), limit_(limit) {}
 
     void async(Block block) {
         {
@@ -111,6 +113,8 @@ class WorkQueueState : public std::enable_shared_from_this<WorkQueueState> {
  private:
     void run() {
         const WorkQueueState* const outer = std::exchange(current_, this);
+        // For debuggers and profilers; the kernel takes 15 characters.
+        pthread_setname_np(pthread_self(), name_.substr(0, 15).c_str());
         while (true) {
             Block block;
             {
@@ -135,6 +139,7 @@ class WorkQueueState : public std::enable_shared_from_this<WorkQueueState> {
 
     static thread_local const WorkQueueState* current_;  // the queue whose block this thread runs
 
+    const std::string name_;
     const int limit_;
     std::mutex mutex_;
     std::condition_variable idle_;
@@ -146,7 +151,8 @@ thread_local const WorkQueueState* WorkQueueState::current_ = nullptr;
 
 class WorkQueue final : public Queue {
  public:
-    explicit WorkQueue(int limit) : state_(std::make_shared<WorkQueueState>(limit)) {}
+    WorkQueue(std::string name, int limit)
+        : state_(std::make_shared<WorkQueueState>(std::move(name), limit)) {}
     ~WorkQueue() override { state_->drain(); }
     void async(Block block) override { state_->async(std::move(block)); }
 
@@ -164,12 +170,12 @@ bool isMainThread() {
     return std::this_thread::get_id() == mainThreadID;
 }
 
-std::shared_ptr<Queue> makeSerialQueue(std::string) {
-    return std::make_shared<WorkQueue>(1);
+std::shared_ptr<Queue> makeSerialQueue(std::string name) {
+    return std::make_shared<WorkQueue>(std::move(name), 1);
 }
 
-std::shared_ptr<Queue> makeConcurrentQueue(std::string) {
-    return std::make_shared<WorkQueue>(0);
+std::shared_ptr<Queue> makeConcurrentQueue(std::string name) {
+    return std::make_shared<WorkQueue>(std::move(name), 0);
 }
 
 }  // namespace platform

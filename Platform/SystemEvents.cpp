@@ -53,11 +53,10 @@ void forgetZone() {
 
 }  // namespace
 
-struct SystemEvents::Private : public QObject {
-    Q_OBJECT
- public:
+struct SystemEvents::Private {
     explicit Private(SystemEvents& owner) : events(owner) {}
-    ~Private() override {
+    ~Private() {
+        notifier.reset();  // before what it watches
         if (timer >= 0) close(timer);
     }
 
@@ -67,7 +66,7 @@ struct SystemEvents::Private : public QObject {
             startTimer();
             startWatchingZoneFile();
             // The bus may take a moment to answer; the first screen need not wait for it.
-            QTimer::singleShot(0, this, [this] { startListeningToBus(); });
+            QTimer::singleShot(0, &events, [this] { startListeningToBus(); });
         }
         arm();
     }
@@ -88,13 +87,6 @@ struct SystemEvents::Private : public QObject {
         emit events.significantTimeChange();
     }
 
- public slots:
-    void timeDateChanged(const QString&, const QVariantMap&, const QStringList&) { check(); }
-    void prepareForSleep(bool goingToSleep) {
-        if (!goingToSleep) check();
-    }
-
- private:
     // One kernel timer does for midnight (also one that passes while the machine sleeps) and for a set clock,
     // which cancels it.
     void startTimer() {
@@ -104,7 +96,7 @@ struct SystemEvents::Private : public QObject {
             return;
         }
         notifier = std::make_unique<QSocketNotifier>(timer, QSocketNotifier::Read);
-        connect(notifier.get(), &QSocketNotifier::activated, this, [this] { timerDidFire(); });
+        QObject::connect(notifier.get(), &QSocketNotifier::activated, &events, [this] { timerDidFire(); });
     }
 
     void arm() {
@@ -138,11 +130,12 @@ struct SystemEvents::Private : public QObject {
         // The link itself is replaced when the zone is changed, which only its folder notices.
         watcher = std::make_unique<QFileSystemWatcher>();
         watcher->addPaths({QStringLiteral("/etc/localtime"), QStringLiteral("/etc")});
-        connect(watcher.get(), &QFileSystemWatcher::fileChanged, this, [this](const QString& path) {
-            if (!watcher->files().contains(path)) watcher->addPath(path);
-            check();
-        });
-        connect(watcher.get(), &QFileSystemWatcher::directoryChanged, this, [this] { check(); });
+        QObject::connect(watcher.get(), &QFileSystemWatcher::fileChanged, &events,
+                         [this](const QString& path) {
+                             if (!watcher->files().contains(path)) watcher->addPath(path);
+                             check();
+                         });
+        QObject::connect(watcher.get(), &QFileSystemWatcher::directoryChanged, &events, [this] { check(); });
     }
 
     // A machine without a system bus or without these services never sends anything, which is no error.
@@ -151,10 +144,10 @@ struct SystemEvents::Private : public QObject {
         if (!bus.isConnected()) return;
         bus.connect(QStringLiteral("org.freedesktop.timedate1"), QStringLiteral("/org/freedesktop/timedate1"),
                     QStringLiteral("org.freedesktop.DBus.Properties"), QStringLiteral("PropertiesChanged"),
-                    this, SLOT(timeDateChanged(QString, QVariantMap, QStringList)));
+                    &events, SLOT(busTimeDateChanged(QString, QVariantMap, QStringList)));
         bus.connect(QStringLiteral("org.freedesktop.login1"), QStringLiteral("/org/freedesktop/login1"),
-                    QStringLiteral("org.freedesktop.login1.Manager"), QStringLiteral("PrepareForSleep"), this,
-                    SLOT(prepareForSleep(bool)));
+                    QStringLiteral("org.freedesktop.login1.Manager"), QStringLiteral("PrepareForSleep"),
+                    &events, SLOT(busPrepareForSleep(bool)));
     }
 
     SystemEvents& events;
@@ -184,11 +177,17 @@ void SystemEvents::postSignificantTimeChange() {
     private_->post();
 }
 
+void SystemEvents::busTimeDateChanged(const QString&, const QVariantMap&, const QStringList&) {
+    private_->check();
+}
+
+void SystemEvents::busPrepareForSleep(bool goingToSleep) {
+    if (!goingToSleep) private_->check();
+}
+
 void SystemEvents::postLocaleChange() {
     loadTranslations();
     emit localeDidChange();
 }
 
 }  // namespace platform
-
-#include "SystemEvents.moc"

@@ -1,6 +1,8 @@
 #pragma once
 
 #include <QObject>
+#include <QStringList>
+#include <QVariantMap>
 #include <memory>
 
 namespace platform {
@@ -23,6 +25,12 @@ class SystemEvents : public QObject {
     void significantTimeChange();
     /// The user's locale changed; translations have been loaded anew.
     void localeDidChange();
+
+ private slots:
+    // What the system bus tells.
+    void busTimeDateChanged(const QString& interface, const QVariantMap& changed,
+                            const QStringList& invalidated);
+    void busPrepareForSleep(bool goingToSleep);
 
  private:
     SystemEvents();

@@ -21,7 +21,8 @@ constexpr int pollMilliseconds = 500;
 void touch(const std::filesystem::path& file) {
     const int descriptor = ::open(file.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600);
     if (descriptor < 0 || ::futimens(descriptor, nullptr) != 0)
-        VSLog(VSLogLevel::Error, "Other programs cannot be told of a change: " + file.string() + ": " + std::strerror(errno));
+        VSLog(VSLogLevel::Error,
+              "Other programs cannot be told of a change: " + file.string() + ": " + std::strerror(errno));
     if (descriptor >= 0) ::close(descriptor);
 }
 
@@ -31,7 +32,8 @@ VSChangeNotifier::VSChangeNotifier(std::filesystem::path folder, VSReaderPool& r
     : folder_(std::move(folder)), readers_(readers), handler_(std::move(handler)) {
     wakeDescriptor_ = ::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK);
     watchDescriptor_ = ::inotify_init1(IN_CLOEXEC | IN_NONBLOCK);
-    if (watchDescriptor_ >= 0 && ::inotify_add_watch(watchDescriptor_, folder_.c_str(), IN_ATTRIB | IN_CREATE | IN_MOVED_TO) < 0) {
+    if (watchDescriptor_ >= 0 &&
+        ::inotify_add_watch(watchDescriptor_, folder_.c_str(), IN_ATTRIB | IN_CREATE | IN_MOVED_TO) < 0) {
         ::close(watchDescriptor_);
         watchDescriptor_ = -1;
     }
@@ -55,17 +57,21 @@ void VSChangeNotifier::announce() {
     const uint64_t one = 1;
     // A full counter wakes as well, so a failed write loses nothing.
     if (::write(wakeDescriptor_, &one, sizeof one) < 0 && errno != EAGAIN)
-        VSLog(VSLogLevel::Error, std::string("The store's notifier cannot be woken: ") + std::strerror(errno));
+        VSLog(VSLogLevel::Error,
+              std::string("The store's notifier cannot be woken: ") + std::strerror(errno));
     touch(folder_ / VSStoreSchema::noticeFileName);
 }
 
 void VSChangeNotifier::finish() {
     finishing_ = true;
     const uint64_t one = 1;
-    while (::write(wakeDescriptor_, &one, sizeof one) < 0 && errno == EINTR) {}
+    while (::write(wakeDescriptor_, &one, sizeof one) < 0 && errno == EINTR) {
+    }
     if (!thread_.joinable()) return;
-    if (thread_.get_id() == std::this_thread::get_id()) thread_.detach();
-    else thread_.join();
+    if (thread_.get_id() == std::this_thread::get_id())
+        thread_.detach();
+    else
+        thread_.join();
 }
 
 bool VSChangeNotifier::noticeTouched() {
@@ -77,7 +83,9 @@ bool VSChangeNotifier::noticeTouched() {
         for (ssize_t at = 0; at < size;) {
             const auto* event = reinterpret_cast<const inotify_event*>(buffer + at);
             // Lost notices may have been ours.
-            if ((event->mask & IN_Q_OVERFLOW) || (event->len && std::strcmp(event->name, VSStoreSchema::noticeFileName) == 0)) touched = true;
+            if ((event->mask & IN_Q_OVERFLOW) ||
+                (event->len && std::strcmp(event->name, VSStoreSchema::noticeFileName) == 0))
+                touched = true;
             at += static_cast<ssize_t>(sizeof(inotify_event) + event->len);
         }
     }
@@ -92,7 +100,8 @@ void VSChangeNotifier::run() {
         bool shouldLook = ready == 0;
         if (ready > 0 && (descriptors[0].revents & POLLIN)) {
             uint64_t count;
-            while (::read(wakeDescriptor_, &count, sizeof count) > 0) {}
+            while (::read(wakeDescriptor_, &count, sizeof count) > 0) {
+            }
             shouldLook = true;
         }
         if (ready > 0 && watching && (descriptors[1].revents & POLLIN) && noticeTouched()) shouldLook = true;

@@ -12,8 +12,11 @@
 /// Learns of commits of this and of other processes and tells which types they changed. Other processes are
 /// heard of through a file in the folder that every commit touches.
 class VSChangeNotifier {
-   public:
-    struct Change { int type; int64_t number; };
+ public:
+    struct Change {
+        int type;
+        int64_t number;
+    };
     /// Called on the notifier's thread, one call at a time.
     using Handler = std::function<void(const std::vector<Change>&)>;
 
@@ -29,7 +32,7 @@ class VSChangeNotifier {
     /// Ends the thread; does not wait when called on it. Once.
     void finish();
 
-   private:
+ private:
     void run();
     void look();
     bool noticeTouched();

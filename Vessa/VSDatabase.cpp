@@ -12,38 +12,53 @@
 namespace {
 
 int64_t steadyMicroseconds() {
-    return std::chrono::duration_cast<VSDuration>(std::chrono::steady_clock::now().time_since_epoch()).count();
+    return std::chrono::duration_cast<VSDuration>(std::chrono::steady_clock::now().time_since_epoch())
+        .count();
 }
 
 VSErrorCode errorCode(int code) {
     switch (code & 0xff) {
-        case SQLITE_FULL: return VSErrorCode::DiskFull;
+        case SQLITE_FULL:
+            return VSErrorCode::DiskFull;
         case SQLITE_BUSY:
         case SQLITE_LOCKED:
         case SQLITE_CANTOPEN:
         case SQLITE_READONLY:
         case SQLITE_PERM:
-        case SQLITE_AUTH: return VSErrorCode::NotAccessible;
+        case SQLITE_AUTH:
+            return VSErrorCode::NotAccessible;
         case SQLITE_CORRUPT:
-        case SQLITE_NOTADB: return VSErrorCode::Corrupt;
-        case SQLITE_INTERRUPT: return VSErrorCode::Cancelled;
-        default: return VSErrorCode::Failed;
+        case SQLITE_NOTADB:
+            return VSErrorCode::Corrupt;
+        case SQLITE_INTERRUPT:
+            return VSErrorCode::Cancelled;
+        default:
+            return VSErrorCode::Failed;
     }
 }
 
 const char* meaning(int code) {
     switch (code & 0xff) {
-        case SQLITE_FULL: return "the disk is full";
+        case SQLITE_FULL:
+            return "the disk is full";
         case SQLITE_BUSY:
-        case SQLITE_LOCKED: return "the store is held by another program";
-        case SQLITE_CANTOPEN: return "the store cannot be opened";
-        case SQLITE_READONLY: return "the store cannot be written to";
+        case SQLITE_LOCKED:
+            return "the store is held by another program";
+        case SQLITE_CANTOPEN:
+            return "the store cannot be opened";
+        case SQLITE_READONLY:
+            return "the store cannot be written to";
         case SQLITE_PERM:
-        case SQLITE_AUTH: return "the store may not be used by this user";
-        case SQLITE_CORRUPT: return "the store's file is damaged";
-        case SQLITE_NOTADB: return "the file is not a store";
-        case SQLITE_IOERR: return "the disk reported a failure";
-        default: return "the database failed";
+        case SQLITE_AUTH:
+            return "the store may not be used by this user";
+        case SQLITE_CORRUPT:
+            return "the store's file is damaged";
+        case SQLITE_NOTADB:
+            return "the file is not a store";
+        case SQLITE_IOERR:
+            return "the disk reported a failure";
+        default:
+            return "the database failed";
     }
 }
 
@@ -80,18 +95,21 @@ VSStatement& VSStatement::bindReal(int index, double value) {
 
 VSStatement& VSStatement::bindNumber(int index, double value) {
     constexpr double limit = 140737488355328.0;  // 2^47: longer integers take eight bytes, as a double does
-    const bool whole = std::abs(value) < limit && value == std::trunc(value) && !(value == 0 && std::signbit(value));
+    const bool whole =
+        std::abs(value) < limit && value == std::trunc(value) && !(value == 0 && std::signbit(value));
     return whole ? bind(index, static_cast<int64_t>(value)) : bindReal(index, value);
 }
 
 VSStatement& VSStatement::bindText(int index, std::string_view text) {
-    if (int code = sqlite3_bind_text64(statement_, index, text.data() ? text.data() : "", text.size(), SQLITE_TRANSIENT, SQLITE_UTF8))
+    if (int code = sqlite3_bind_text64(statement_, index, text.data() ? text.data() : "", text.size(),
+                                       SQLITE_TRANSIENT, SQLITE_UTF8))
         database_->fail(code);
     return *this;
 }
 
 VSStatement& VSStatement::bindBlob(int index, const void* bytes, size_t size) {
-    if (int code = sqlite3_bind_blob64(statement_, index, bytes, size, SQLITE_TRANSIENT)) database_->fail(code);
+    if (int code = sqlite3_bind_blob64(statement_, index, bytes, size, SQLITE_TRANSIENT))
+        database_->fail(code);
     return *this;
 }
 
@@ -112,7 +130,8 @@ bool VSStatement::step() {
 }
 
 void VSStatement::run() {
-    while (step()) {}
+    while (step()) {
+    }
     reset();
 }
 
@@ -120,13 +139,20 @@ void VSStatement::reset() {
     if (int code = sqlite3_reset(statement_)) database_->fail(code);
 }
 
-int64_t VSStatement::integer(int column) const { return sqlite3_column_int64(statement_, column); }
-double VSStatement::real(int column) const { return sqlite3_column_double(statement_, column); }
-bool VSStatement::isNull(int column) const { return sqlite3_column_type(statement_, column) == SQLITE_NULL; }
+int64_t VSStatement::integer(int column) const {
+    return sqlite3_column_int64(statement_, column);
+}
+double VSStatement::real(int column) const {
+    return sqlite3_column_double(statement_, column);
+}
+bool VSStatement::isNull(int column) const {
+    return sqlite3_column_type(statement_, column) == SQLITE_NULL;
+}
 
 std::string VSStatement::text(int column) const {
     const auto* bytes = reinterpret_cast<const char*>(sqlite3_column_text(statement_, column));
-    return bytes ? std::string(bytes, static_cast<size_t>(sqlite3_column_bytes(statement_, column))) : std::string();
+    return bytes ? std::string(bytes, static_cast<size_t>(sqlite3_column_bytes(statement_, column)))
+                 : std::string();
 }
 
 std::optional<std::string> VSStatement::optionalText(int column) const {
@@ -136,13 +162,16 @@ std::optional<std::string> VSStatement::optionalText(int column) const {
 
 std::string_view VSStatement::blob(int column) const {
     const auto* bytes = static_cast<const char*>(sqlite3_column_blob(statement_, column));
-    return bytes ? std::string_view(bytes, static_cast<size_t>(sqlite3_column_bytes(statement_, column))) : std::string_view();
+    return bytes ? std::string_view(bytes, static_cast<size_t>(sqlite3_column_bytes(statement_, column)))
+                 : std::string_view();
 }
 
 // VSDatabase
 
-VSDatabase::VSDatabase(const std::filesystem::path& file, Mode mode, VSDuration patience) : patience_(patience) {
-    int flags = SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE | (mode == Mode::Write ? SQLITE_OPEN_READWRITE : SQLITE_OPEN_READONLY);
+VSDatabase::VSDatabase(const std::filesystem::path& file, Mode mode, VSDuration patience)
+    : patience_(patience) {
+    int flags = SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE |
+                (mode == Mode::Write ? SQLITE_OPEN_READWRITE : SQLITE_OPEN_READONLY);
     std::string name = file.string();
     if (mode == Mode::ReadImmutable) {
         flags |= SQLITE_OPEN_URI;
@@ -167,7 +196,9 @@ VSDatabase::VSDatabase(const std::filesystem::path& file, Mode mode, VSDuration 
     sqlite3_busy_handler(handle_, &VSDatabase::waitForLock, this);
 }
 
-VSDatabase::~VSDatabase() { close(); }
+VSDatabase::~VSDatabase() {
+    close();
+}
 
 void VSDatabase::close() {
     for (auto& [sql, list] : statements_) {
@@ -183,7 +214,8 @@ int VSDatabase::waitForLock(void* self, int attempt) {
     const int64_t now = steadyMicroseconds();
     if (attempt == 0) database->waitingSince_ = now;
     VSDuration patience = database->patience_;
-    if (database->hurry_ && database->hurry_->load()) patience = std::min<VSDuration>(patience, std::chrono::seconds(5));
+    if (database->hurry_ && database->hurry_->load())
+        patience = std::min<VSDuration>(patience, std::chrono::seconds(5));
     if (now - database->waitingSince_ >= patience.count()) return 0;
     std::this_thread::sleep_for(std::chrono::milliseconds(std::min(1 + attempt, 20)));
     return 1;
@@ -206,7 +238,8 @@ VSStatement VSDatabase::use(std::string_view sql) {
         return VSStatement(*this, statement, list);
     }
     sqlite3_stmt* statement = nullptr;
-    const int code = sqlite3_prepare_v3(handle_, sql.data(), static_cast<int>(sql.size()), SQLITE_PREPARE_PERSISTENT, &statement, nullptr);
+    const int code = sqlite3_prepare_v3(handle_, sql.data(), static_cast<int>(sql.size()),
+                                        SQLITE_PREPARE_PERSISTENT, &statement, nullptr);
     if (code) fail(code);
     return VSStatement(*this, statement, list);
 }
@@ -220,7 +253,9 @@ int64_t VSDatabase::integer(std::string_view sql) {
     return statement.step() ? statement.integer(0) : 0;
 }
 
-bool VSDatabase::isReadOnly() const { return sqlite3_db_readonly(handle_, "main") == 1; }
+bool VSDatabase::isReadOnly() const {
+    return sqlite3_db_readonly(handle_, "main") == 1;
+}
 
 bool VSDatabase::othersHaveCommitted() {
     const int64_t version = integer("PRAGMA data_version");
@@ -229,7 +264,9 @@ bool VSDatabase::othersHaveCommitted() {
     return changed;
 }
 
-int64_t VSDatabase::changes() const { return sqlite3_changes64(handle_); }
+int64_t VSDatabase::changes() const {
+    return sqlite3_changes64(handle_);
+}
 
 // VSTransaction
 

@@ -21,19 +21,19 @@ class VSDatabase;
 /// What every failure of the database becomes inside the store; it never leaves the store's operations,
 /// which answer with the error it holds.
 class VSDatabaseFailure final : public std::exception {
-   public:
+ public:
     explicit VSDatabaseFailure(VSError error) : error_(std::move(error)) {}
     const VSError& error() const { return error_; }
     const char* what() const noexcept override { return error_.message.c_str(); }
 
-   private:
+ private:
     VSError error_;
 };
 
 /// A statement borrowed from its connection's cache; given back, reset, at the end of its life. Parameters
 /// and columns count from 1 and 0, as SQLite does. Every call throws VSDatabaseFailure on an error.
 class VSStatement {
-   public:
+ public:
     VSStatement(VSStatement&& other) noexcept;
     VSStatement& operator=(VSStatement&&) = delete;
     ~VSStatement();
@@ -62,7 +62,7 @@ class VSStatement {
     /// Valid until the next step.
     std::string_view blob(int column) const;
 
-   private:
+ private:
     friend class VSDatabase;
     VSStatement(VSDatabase& database, sqlite3_stmt* statement, std::vector<sqlite3_stmt*>& home);
     VSDatabase* database_;
@@ -72,7 +72,7 @@ class VSStatement {
 
 /// One connection to the database file. Used by one thread at a time. Everything throws VSDatabaseFailure.
 class VSDatabase {
-   public:
+ public:
     enum class Mode { Write, Read, ReadImmutable };
     /// `patience`: how long a lock held by others is waited for before NotAccessible.
     VSDatabase(const std::filesystem::path& file, Mode mode, VSDuration patience);
@@ -96,7 +96,7 @@ class VSDatabase {
 
     [[noreturn]] void fail(int code) const;
 
-   private:
+ private:
     static int waitForLock(void* self, int attempt);
     void close();
 
@@ -110,7 +110,7 @@ class VSDatabase {
 
 /// A transaction: rolled back unless committed.
 class VSTransaction {
-   public:
+ public:
     enum class Kind { Read, Write };
     VSTransaction(VSDatabase& database, Kind kind);
     ~VSTransaction();
@@ -118,7 +118,7 @@ class VSTransaction {
     VSTransaction& operator=(const VSTransaction&) = delete;
     void commit();
 
-   private:
+ private:
     VSDatabase& database_;
     bool open_ = true;
 };

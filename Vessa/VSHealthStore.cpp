@@ -54,7 +54,12 @@ VSStatus writeOrder(VSStoreWriter& writer, const std::vector<VSSource>& sources,
         const int64_t number = writer.provenances().sourceFor(source);
         if (std::find(known.begin(), known.end(), number) != known.end()) continue;
         known.push_back(number);
-        writer.database().use("INSERT INTO source_order VALUES (?, ?, ?)").bind(1, code).bind(2, position++).bind(3, number).run();
+        writer.database()
+            .use("INSERT INTO source_order VALUES (?, ?, ?)")
+            .bind(1, code)
+            .bind(2, position++)
+            .bind(3, number)
+            .run();
     }
     writer.touch(type);
     return {};
@@ -62,7 +67,7 @@ VSStatus writeOrder(VSStoreWriter& writer, const std::vector<VSSource>& sources,
 
 /// The store of one folder as its users see it; the work is the core's.
 class VSHealthStoreConnection final : public VSHealthStore {
-   public:
+ public:
     explicit VSHealthStoreConnection(std::shared_ptr<VSStoreCore> core) : core_(std::move(core)) {}
     ~VSHealthStoreConnection() override { core_->close(); }
 
@@ -70,15 +75,21 @@ class VSHealthStoreConnection final : public VSHealthStore {
     void stopQuery(const std::shared_ptr<VSQuery>& query) override { core_->queries.stop(query.get()); }
 
     void saveObjects(std::vector<VSSamplePtr> objects, Completion completion) override {
-        core_->write([objects = std::move(objects)](VSStoreWriter& writer) { return insertAll(writer, objects); }, std::move(completion));
+        core_->write(
+            [objects = std::move(objects)](VSStoreWriter& writer) { return insertAll(writer, objects); },
+            std::move(completion));
     }
     VSStatus saveObjectsAndWait(std::vector<VSSamplePtr> objects) override {
-        return core_->writeAndWait([objects = std::move(objects)](VSStoreWriter& writer) { return insertAll(writer, objects); });
+        return core_->writeAndWait(
+            [objects = std::move(objects)](VSStoreWriter& writer) { return insertAll(writer, objects); });
     }
     void deleteObjects(std::vector<VSSamplePtr> objects, Completion completion) override {
-        core_->write([objects = std::move(objects)](VSStoreWriter& writer) { return removeAll(writer, objects); }, std::move(completion));
+        core_->write(
+            [objects = std::move(objects)](VSStoreWriter& writer) { return removeAll(writer, objects); },
+            std::move(completion));
     }
-    void deleteAllSamples(std::vector<const VSObjectType*> types, std::optional<std::string> sourceBundleIdentifier, Completion completion) override {
+    void deleteAllSamples(std::vector<const VSObjectType*> types,
+                          std::optional<std::string> sourceBundleIdentifier, Completion completion) override {
         core_->write(
             [types = std::move(types), source = std::move(sourceBundleIdentifier)](VSStoreWriter& writer) {
                 for (const VSObjectType* type : types) writer.removeAll(type, source);
@@ -86,7 +97,8 @@ class VSHealthStoreConnection final : public VSHealthStore {
             },
             std::move(completion));
     }
-    void addSamplesToWorkout(std::vector<VSSamplePtr> samples, VSSamplePtr workout, Completion completion) override {
+    void addSamplesToWorkout(std::vector<VSSamplePtr> samples, VSSamplePtr workout,
+                             Completion completion) override {
         core_->write([samples = std::move(samples), workout = std::move(workout)](
                          VSStoreWriter& writer) { return relate(writer, samples, *workout); },
                      std::move(completion));
@@ -94,7 +106,8 @@ class VSHealthStoreConnection final : public VSHealthStore {
 
     VSResult<std::optional<VSBirthDate>> dateOfBirth() override {
         return core_->readers.read([](VSStoreReader& reader) -> std::optional<VSBirthDate> {
-            const auto value = VSReadCharacteristic(reader.database(), VSObjectType::dataTypeWithCode(VSCode::DateOfBirth));
+            const auto value =
+                VSReadCharacteristic(reader.database(), VSObjectType::dataTypeWithCode(VSCode::DateOfBirth));
             if (!value) return std::nullopt;
             return VSBirthDateFromStored(*value);
         });
@@ -105,14 +118,18 @@ class VSHealthStoreConnection final : public VSHealthStore {
     void setDateOfBirth(std::optional<VSBirthDate> date, Completion completion) override {
         std::optional<int64_t> value;
         if (date) value = VSStoredBirthDate(*date);
-        writeCharacteristic(VSObjectType::dataTypeWithCode(VSCode::DateOfBirth), value, std::move(completion));
+        writeCharacteristic(VSObjectType::dataTypeWithCode(VSCode::DateOfBirth), value,
+                            std::move(completion));
     }
     void setCharacteristic(const VSObjectType* type, int value, Completion completion) override {
-        writeCharacteristic(type, value ? std::optional<int64_t>(value) : std::nullopt, std::move(completion));
+        writeCharacteristic(type, value ? std::optional<int64_t>(value) : std::nullopt,
+                            std::move(completion));
     }
 
-    void fetchMedicalIDData(std::function<void(const VSResult<std::optional<VSMedicalIDData>>&)> completion) override {
-        core_->readLater([](VSStoreReader& reader) { return VSReadMedicalID(reader.database()); }, std::move(completion));
+    void fetchMedicalIDData(
+        std::function<void(const VSResult<std::optional<VSMedicalIDData>>&)> completion) override {
+        core_->readLater([](VSStoreReader& reader) { return VSReadMedicalID(reader.database()); },
+                         std::move(completion));
     }
     void updateMedicalIDData(VSMedicalIDData data, Completion completion) override {
         core_->write(
@@ -125,9 +142,12 @@ class VSHealthStoreConnection final : public VSHealthStore {
 
     void setDefaultValue(VSValue value, std::string key, Completion completion) override {
         core_->write(
-            [application = core_->options.applicationIdentifier, value = std::move(value), key = std::move(key)](VSStoreWriter& writer) {
+            [application = core_->options.applicationIdentifier, value = std::move(value),
+             key = std::move(key)](VSStoreWriter& writer) {
                 writer.database()
-                    .use("INSERT INTO defaults VALUES (?1, ?2, ?3) ON CONFLICT(application, key) DO UPDATE SET value = ?3")
+                    .use(
+                        "INSERT INTO defaults VALUES (?1, ?2, ?3) ON CONFLICT(application, key) DO UPDATE "
+                        "SET value = ?3")
                     .bindText(1, application)
                     .bindText(2, key)
                     .bindText(3, value.serialized())
@@ -136,60 +156,81 @@ class VSHealthStoreConnection final : public VSHealthStore {
             },
             std::move(completion));
     }
-    void getDefaultValue(std::string key, std::function<void(const VSResult<std::optional<VSValue>>&)> handler) override {
+    void getDefaultValue(std::string key,
+                         std::function<void(const VSResult<std::optional<VSValue>>&)> handler) override {
         core_->readLater(
-            [application = core_->options.applicationIdentifier, key = std::move(key)](VSStoreReader& reader) -> std::optional<VSValue> {
-                auto row = reader.database().use("SELECT value FROM defaults WHERE application = ? AND key = ?");
+            [application = core_->options.applicationIdentifier,
+             key = std::move(key)](VSStoreReader& reader) -> std::optional<VSValue> {
+                auto row =
+                    reader.database().use("SELECT value FROM defaults WHERE application = ? AND key = ?");
                 if (!row.bindText(1, application).bindText(2, key).step()) return std::nullopt;
                 auto value = VSValue::fromSerialized(row.text(0));
-                if (!value) throw VSDatabaseFailure({VSErrorCode::Corrupt, "the default value " + key + " cannot be read"});
+                if (!value)
+                    throw VSDatabaseFailure(
+                        {VSErrorCode::Corrupt, "the default value " + key + " cannot be read"});
                 return value;
             },
             std::move(handler));
     }
 
-    void orderedSources(const VSObjectType* type, std::function<void(const VSResult<std::vector<VSSource>>&)> completion) override {
+    void orderedSources(const VSObjectType* type,
+                        std::function<void(const VSResult<std::vector<VSSource>>&)> completion) override {
         core_->readLater(
             [type](VSStoreReader& reader) {
                 std::vector<VSSource> sources;
-                for (int64_t id : reader.orderedSources(type)) sources.push_back(reader.provenances().source(id));
+                for (int64_t id : reader.orderedSources(type))
+                    sources.push_back(reader.provenances().source(id));
                 return sources;
             },
             std::move(completion));
     }
-    void setOrderedSources(std::vector<VSSource> sources, const VSObjectType* type, Completion completion) override {
-        core_->write([sources = std::move(sources), type](VSStoreWriter& writer) { return writeOrder(writer, sources, type); },
+    void setOrderedSources(std::vector<VSSource> sources, const VSObjectType* type,
+                           Completion completion) override {
+        core_->write([sources = std::move(sources),
+                      type](VSStoreWriter& writer) { return writeOrder(writer, sources, type); },
                      std::move(completion));
     }
 
-    VSResult<std::vector<VSSamplePtr>> samples(const VSObjectType* type, const VSPredicate& predicate, int limit,
+    VSResult<std::vector<VSSamplePtr>> samples(const VSObjectType* type, const VSPredicate& predicate,
+                                               int limit,
                                                const std::vector<VSSortDescriptor>& sort) override {
-        return core_->readers.read([&](VSStoreReader& reader) { return reader.samples(type, predicate, limit, sort); });
+        return core_->readers.read(
+            [&](VSStoreReader& reader) { return reader.samples(type, predicate, limit, sort); });
     }
-    VSResult<VSStatistics> statistics(const VSObjectType* type, const VSPredicate& predicate, int options) override {
-        return core_->readers.read([&](VSStoreReader& reader) { return VSStatisticsEngine(reader, type, predicate, options).statistics(); });
-    }
-    VSResult<std::shared_ptr<const VSStatisticsCollection>> statisticsCollection(const VSObjectType* type, const VSPredicate& predicate, int options,
-                                                                                VSDate anchor, const VSDateComponents& interval) override {
-        return core_->readers.read([&](VSStoreReader& reader) -> std::shared_ptr<const VSStatisticsCollection> {
-            const VSCalendar calendar = VSCalendar::current();
-            return std::make_shared<VSStatisticsCollection>(
-                type, anchor, interval, calendar, VSStatisticsEngine(reader, type, predicate, options).buckets(anchor, interval, calendar));
+    VSResult<VSStatistics> statistics(const VSObjectType* type, const VSPredicate& predicate,
+                                      int options) override {
+        return core_->readers.read([&](VSStoreReader& reader) {
+            return VSStatisticsEngine(reader, type, predicate, options).statistics();
         });
+    }
+    VSResult<std::shared_ptr<const VSStatisticsCollection>> statisticsCollection(
+        const VSObjectType* type, const VSPredicate& predicate, int options, VSDate anchor,
+        const VSDateComponents& interval) override {
+        return core_->readers.read(
+            [&](VSStoreReader& reader) -> std::shared_ptr<const VSStatisticsCollection> {
+                const VSCalendar calendar = VSCalendar::current();
+                return std::make_shared<VSStatisticsCollection>(
+                    type, anchor, interval, calendar,
+                    VSStatisticsEngine(reader, type, predicate, options).buckets(anchor, interval, calendar));
+            });
     }
     VSResult<std::vector<SourceSummary>> sourceSummaries() override;
     VSResult<std::vector<TypeSummary>> typeSummaries() override;
-    VSResult<VSCheckReport> check() override { return core_->readers.read([](VSStoreReader& reader) { return VSCheckStore(reader); }); }
-    VSResult<std::unique_ptr<ImportTransaction>> beginImport(const std::string& name, VSDuration patience) override {
+    VSResult<VSCheckReport> check() override {
+        return core_->readers.read([](VSStoreReader& reader) { return VSCheckStore(reader); });
+    }
+    VSResult<std::unique_ptr<ImportTransaction>> beginImport(const std::string& name,
+                                                             VSDuration patience) override {
         return VSImportTransaction::begin(core_, name, patience);
     }
     VSResult<int64_t> databaseSizeInBytes() override;
     const std::filesystem::path& folder() const override { return core_->folder; }
 
-   private:
+ private:
     VSResult<int> characteristic(VSTypeCode code) {
         return core_->readers.read([code](VSStoreReader& reader) {
-            return static_cast<int>(VSReadCharacteristic(reader.database(), VSObjectType::dataTypeWithCode(code)).value_or(0));
+            return static_cast<int>(
+                VSReadCharacteristic(reader.database(), VSObjectType::dataTypeWithCode(code)).value_or(0));
         });
     }
     void writeCharacteristic(const VSObjectType* type, std::optional<int64_t> value, Completion completion) {
@@ -208,9 +249,11 @@ VSResult<std::vector<VSHealthStore::SourceSummary>> VSHealthStoreConnection::sou
     return core_->readers.read([](VSStoreReader& reader) {
         std::vector<SourceSummary> summaries;
         auto rows = reader.database().use(
-            "SELECT source, sum(count), min(first_start), max(last_end) FROM type_sources GROUP BY source ORDER BY source");
+            "SELECT source, sum(count), min(first_start), max(last_end) FROM type_sources GROUP BY source "
+            "ORDER BY source");
         while (rows.step())
-            summaries.push_back({reader.provenances().source(rows.integer(0)), rows.integer(1), VSDate::fromMicroseconds(rows.integer(2)),
+            summaries.push_back({reader.provenances().source(rows.integer(0)), rows.integer(1),
+                                 VSDate::fromMicroseconds(rows.integer(2)),
                                  VSDate::fromMicroseconds(rows.integer(3))});
         return summaries;
     });
@@ -220,10 +263,12 @@ VSResult<std::vector<VSHealthStore::TypeSummary>> VSHealthStoreConnection::typeS
     return core_->readers.read([](VSStoreReader& reader) {
         std::vector<TypeSummary> summaries;
         auto rows = reader.database().use(
-            "SELECT type, sum(count), min(first_start), max(last_end) FROM type_sources GROUP BY type ORDER BY type");
+            "SELECT type, sum(count), min(first_start), max(last_end) FROM type_sources GROUP BY type ORDER "
+            "BY type");
         while (rows.step())
-            summaries.push_back({VSObjectType::dataTypeWithCode(static_cast<int>(rows.integer(0))), rows.integer(1),
-                                 VSDate::fromMicroseconds(rows.integer(2)), VSDate::fromMicroseconds(rows.integer(3))});
+            summaries.push_back({VSObjectType::dataTypeWithCode(static_cast<int>(rows.integer(0))),
+                                 rows.integer(1), VSDate::fromMicroseconds(rows.integer(2)),
+                                 VSDate::fromMicroseconds(rows.integer(3))});
         return summaries;
     });
 }
@@ -234,15 +279,18 @@ VSResult<int64_t> VSHealthStoreConnection::databaseSizeInBytes() {
     for (const char* suffix : {"", "-wal"}) {
         std::error_code error;
         const auto bytes = std::filesystem::file_size(file.string() + suffix, error);
-        if (!error) size += static_cast<int64_t>(bytes);
-        else if (!*suffix) return VSError{VSErrorCode::NotAccessible, file.string() + ": " + error.message()};
+        if (!error)
+            size += static_cast<int64_t>(bytes);
+        else if (!*suffix)
+            return VSError{VSErrorCode::NotAccessible, file.string() + ": " + error.message()};
     }
     return size;
 }
 
 }  // namespace
 
-VSResult<std::shared_ptr<VSHealthStore>> VSHealthStore::open(const std::filesystem::path& folder, Options options) {
+VSResult<std::shared_ptr<VSHealthStore>> VSHealthStore::open(const std::filesystem::path& folder,
+                                                             Options options) {
     auto core = VSStoreCore::open(folder, options);
     if (!core) return core.error();
     return std::shared_ptr<VSHealthStore>(std::make_shared<VSHealthStoreConnection>(*core));

@@ -7,7 +7,9 @@
 namespace {
 constexpr size_t typeCodes = 128;
 
-size_t codeOf(const VSSample& sample) { return static_cast<size_t>(VSTypeCodeValue(sample.sampleType()->code())); }
+size_t codeOf(const VSSample& sample) {
+    return static_cast<size_t>(VSTypeCodeValue(sample.sampleType()->code()));
+}
 }  // namespace
 
 bool VSImportTransaction::Uses::has(int64_t id, Use use) const {
@@ -21,19 +23,23 @@ void VSImportTransaction::Uses::set(int64_t id, Use use) {
     bits_[byte] = static_cast<uint8_t>(bits_[byte] | use << (id % 4 * 2));
 }
 
-VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> VSImportTransaction::begin(std::shared_ptr<VSStoreCore> core,
-                                                                                      const std::string& name, VSDuration patience) {
-    if (core->options.readOnly) return VSError{VSErrorCode::NotAccessible, "the store was opened for reading only"};
+VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> VSImportTransaction::begin(
+    std::shared_ptr<VSStoreCore> core, const std::string& name, VSDuration patience) {
+    if (core->options.readOnly)
+        return VSError{VSErrorCode::NotAccessible, "the store was opened for reading only"};
     try {
-        auto database = VSStoreSchema::openForWriting(core->folder, false, core->options.survivesPowerLoss, patience);
+        auto database =
+            VSStoreSchema::openForWriting(core->folder, false, core->options.survivesPowerLoss, patience);
         database->execute("PRAGMA cache_size = -32768");
-        return std::unique_ptr<ImportTransaction>(new VSImportTransaction(std::move(core), std::move(database), name));
+        return std::unique_ptr<ImportTransaction>(
+            new VSImportTransaction(std::move(core), std::move(database), name));
     } catch (const VSDatabaseFailure& failure) {
         return failure.error();
     }
 }
 
-VSImportTransaction::VSImportTransaction(std::shared_ptr<VSStoreCore> core, std::unique_ptr<VSDatabase> database, const std::string& name)
+VSImportTransaction::VSImportTransaction(std::shared_ptr<VSStoreCore> core,
+                                         std::unique_ptr<VSDatabase> database, const std::string& name)
     : core_(std::move(core)),
       database_(std::move(database)),
       writer_(*database_),
@@ -75,7 +81,8 @@ bool VSImportTransaction::mayBePresent(const VSSample& sample, Use use) const {
 
 VSImportTransaction::Outcome VSImportTransaction::addRecord(const VSSample& sample) {
     if (mayBePresent(sample, TopLevel)) {
-        const int64_t found = writer_.matcher().find(sample, [this](int64_t id) { return !uses_.has(id, TopLevel); });
+        const int64_t found =
+            writer_.matcher().find(sample, [this](int64_t id) { return !uses_.has(id, TopLevel); });
         if (found) {
             uses_.set(found, TopLevel);
             return found <= lastBefore_ ? Outcome::AlreadyPresent : Outcome::Added;
@@ -89,9 +96,10 @@ VSImportTransaction::Outcome VSImportTransaction::addRecord(const VSSample& samp
 }
 
 VSImportTransaction::Outcome VSImportTransaction::addCorrelation(const VSCorrelation& correlation) {
-    const int64_t found = !hadSamples_[codeOf(correlation)] ? 0 : writer_.matcher().find(correlation, [this](int64_t id) {
-        return id <= lastBefore_ && !uses_.has(id, TopLevel);
-    });
+    const int64_t found =
+        !hadSamples_[codeOf(correlation)] ? 0 : writer_.matcher().find(correlation, [this](int64_t id) {
+            return id <= lastBefore_ && !uses_.has(id, TopLevel);
+        });
     if (found) {
         uses_.set(found, TopLevel);
         for (const VSMemberKey& member : writer_.matcher().members(found)) uses_.set(member.id, Member);
@@ -102,13 +110,15 @@ VSImportTransaction::Outcome VSImportTransaction::addCorrelation(const VSCorrela
     const int64_t id = writer_.insertAlone(correlation, date_);
     uses_.set(id, TopLevel);
     ++added_;
-    for (size_t index = 0; index < members.size(); ++index) writer_.insertMember(id, static_cast<int>(index), members[index]);
+    for (size_t index = 0; index < members.size(); ++index)
+        writer_.insertMember(id, static_cast<int>(index), members[index]);
     return Outcome::Added;
 }
 
 VSMemberKey VSImportTransaction::addMember(const VSSample& member) {
     int64_t id = 0;
-    if (mayBePresent(member, Member)) id = writer_.matcher().find(member, [this](int64_t row) { return !uses_.has(row, Member); });
+    if (mayBePresent(member, Member))
+        id = writer_.matcher().find(member, [this](int64_t row) { return !uses_.has(row, Member); });
     if (!id) {
         id = writer_.insertAlone(member, date_);
         hasNewMembers_[codeOf(member)] = true;
@@ -118,7 +128,8 @@ VSMemberKey VSImportTransaction::addMember(const VSSample& member) {
     return {member.sampleType(), member.startDate().microseconds(), id};
 }
 
-VSResult<int> VSImportTransaction::setCharacteristicsIfUnset(std::optional<VSBirthDate> birthDate, int biologicalSex, int bloodType, int skinType) {
+VSResult<int> VSImportTransaction::setCharacteristicsIfUnset(std::optional<VSBirthDate> birthDate,
+                                                             int biologicalSex, int bloodType, int skinType) {
     if (!transaction_ || failure_) return ended();
     try {
         int set = 0;
@@ -144,8 +155,13 @@ VSStatus VSImportTransaction::commit() {
     if (!transaction_ || failure_) return ended();
     try {
         if (added_) {
-            auto batch = database_->use("INSERT INTO batches(name, date, first_id, last_id) VALUES (?, ?, ?, ?)");
-            batch.bindText(1, name_).bind(2, date_.microseconds()).bind(3, lastBefore_ + 1).bind(4, writer_.lastNumber()).run();
+            auto batch =
+                database_->use("INSERT INTO batches(name, date, first_id, last_id) VALUES (?, ?, ?, ?)");
+            batch.bindText(1, name_)
+                .bind(2, date_.microseconds())
+                .bind(3, lastBefore_ + 1)
+                .bind(4, writer_.lastNumber())
+                .run();
         }
         writer_.finish();
         transaction_->commit();

@@ -8,27 +8,29 @@
 
 /// An import into a store, on a writing connection of its own. Used by one thread.
 class VSImportTransaction final : public VSHealthStore::ImportTransaction {
-   public:
+ public:
     /// Waits for the writer, at most `patience`.
-    static VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> begin(std::shared_ptr<VSStoreCore> core, const std::string& name,
-                                                                            VSDuration patience);
+    static VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> begin(
+        std::shared_ptr<VSStoreCore> core, const std::string& name, VSDuration patience);
     ~VSImportTransaction() override;
 
     VSResult<Outcome> add(const VSSample& sample) override;
-    VSResult<int> setCharacteristicsIfUnset(std::optional<VSBirthDate> birthDate, int biologicalSex, int bloodType, int skinType) override;
+    VSResult<int> setCharacteristicsIfUnset(std::optional<VSBirthDate> birthDate, int biologicalSex,
+                                            int bloodType, int skinType) override;
     VSStatus commit() override;
 
-   private:
-    VSImportTransaction(std::shared_ptr<VSStoreCore> core, std::unique_ptr<VSDatabase> database, const std::string& name);
+ private:
+    VSImportTransaction(std::shared_ptr<VSStoreCore> core, std::unique_ptr<VSDatabase> database,
+                        const std::string& name);
 
     /// Which records of the document a row stands for: one at the top level, and one member of a correlation.
     enum Use : uint8_t { TopLevel = 1, Member = 2 };
     class Uses {
-       public:
+     public:
         bool has(int64_t id, Use use) const;
         void set(int64_t id, Use use);
 
-       private:
+     private:
         std::vector<uint8_t> bits_;  // two bits a number, four numbers a byte
     };
 
@@ -44,11 +46,11 @@ class VSImportTransaction final : public VSHealthStore::ImportTransaction {
     std::unique_ptr<VSTransaction> transaction_;
     const std::string name_;
     const VSDate date_;
-    int64_t lastBefore_ = 0;              // numbers up to here were in the store before
-    std::vector<bool> hadSamples_;        // by type: there were samples of it before
+    int64_t lastBefore_ = 0;                            // numbers up to here were in the store before
+    std::vector<bool> hadSamples_;                      // by type: there were samples of it before
     std::vector<bool> hasNewTopLevel_, hasNewMembers_;  // by type: this import added such rows
     Uses uses_;
     int64_t added_ = 0;
     bool changedCharacteristics_ = false;
-    std::optional<VSError> failure_;      // after the first one nothing goes on
+    std::optional<VSError> failure_;  // after the first one nothing goes on
 };

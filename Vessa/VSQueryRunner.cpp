@@ -19,7 +19,7 @@ struct VSQueryRunner::Running {
     int64_t answered = 0;  // the newest change that its last answer knew
 
     // Of the job that runs, one at a time:
-    bool live = false;     // lives on after its first answer
+    bool live = false;  // lives on after its first answer
     bool first = true;
     int64_t snapshot = 0;  // the newest change that the answer under way knows
     VSQueryAnchor anchor;
@@ -30,7 +30,8 @@ void VSQueryRunner::execute(std::shared_ptr<VSQuery> query) {
     if (const auto* anchored = dynamic_cast<const VSAnchoredObjectQuery*>(running->query.get())) {
         running->anchor = anchored->anchor;
         running->live = static_cast<bool>(anchored->updateHandler);
-    } else if (const auto* collection = dynamic_cast<const VSStatisticsCollectionQuery*>(running->query.get())) {
+    } else if (const auto* collection =
+                   dynamic_cast<const VSStatisticsCollectionQuery*>(running->query.get())) {
         running->live = static_cast<bool>(collection->statisticsUpdateHandler);
     } else {
         running->live = dynamic_cast<const VSObserverQuery*>(running->query.get()) != nullptr;
@@ -39,7 +40,8 @@ void VSQueryRunner::execute(std::shared_ptr<VSQuery> query) {
     if (closed_) return;
     const auto [place, isNew] = running_.emplace(running->query.get(), running);
     if (!isNew) {
-        VSLog(VSLogLevel::Error, "A query that is executing was executed again; the second call does nothing.");
+        VSLog(VSLogLevel::Error,
+              "A query that is executing was executed again; the second call does nothing.");
         return;
     }
     schedule(running);
@@ -72,7 +74,8 @@ void VSQueryRunner::typesChanged(const std::vector<VSChangeNotifier::Change>& ch
     std::lock_guard lock(mutex_);
     for (const auto& [query, running] : running_) {
         const int type = VSTypeCodeValue(query->type()->code());
-        const auto change = std::find_if(changes.begin(), changes.end(), [type](const auto& c) { return c.type == type; });
+        const auto change =
+            std::find_if(changes.begin(), changes.end(), [type](const auto& c) { return c.type == type; });
         if (change == changes.end()) continue;
         running->told = std::max(running->told, change->number);
         if (running->live && running->told > running->answered) schedule(running);
@@ -121,20 +124,26 @@ auto VSQueryRunner::read(Running& running, Block block) {
 
 VSQueryRunner::Delivery VSQueryRunner::answer(Running& running) {
     const VSQuery* query = running.query.get();
-    if (const auto* samples = dynamic_cast<const VSSampleQuery*>(query)) return answerSamples(running, *samples);
-    if (const auto* observer = dynamic_cast<const VSObserverQuery*>(query)) return answerObserver(running, *observer);
-    if (const auto* anchored = dynamic_cast<const VSAnchoredObjectQuery*>(query)) return answerChanges(running, *anchored);
-    if (const auto* statistics = dynamic_cast<const VSStatisticsQuery*>(query)) return answerStatistics(running, *statistics);
-    if (const auto* collection = dynamic_cast<const VSStatisticsCollectionQuery*>(query)) return answerCollection(running, *collection);
-    if (const auto* sources = dynamic_cast<const VSSourceQuery*>(query)) return answerSources(running, *sources);
+    if (const auto* samples = dynamic_cast<const VSSampleQuery*>(query))
+        return answerSamples(running, *samples);
+    if (const auto* observer = dynamic_cast<const VSObserverQuery*>(query))
+        return answerObserver(running, *observer);
+    if (const auto* anchored = dynamic_cast<const VSAnchoredObjectQuery*>(query))
+        return answerChanges(running, *anchored);
+    if (const auto* statistics = dynamic_cast<const VSStatisticsQuery*>(query))
+        return answerStatistics(running, *statistics);
+    if (const auto* collection = dynamic_cast<const VSStatisticsCollectionQuery*>(query))
+        return answerCollection(running, *collection);
+    if (const auto* sources = dynamic_cast<const VSSourceQuery*>(query))
+        return answerSources(running, *sources);
     VSLog(VSLogLevel::Error, "A query of an unknown kind was executed.");
     return {};
 }
 
 VSQueryRunner::Delivery VSQueryRunner::answerSamples(Running& running, const VSSampleQuery& query) {
     return [&query, result = read(running, [&](VSStoreReader& reader) {
-                return reader.samples(query.type(), query.predicate(), query.limit, query.sort);
-            })] {
+                        return reader.samples(query.type(), query.predicate(), query.limit, query.sort);
+                    })] {
         if (query.handler) query.handler(result);
     };
 }
@@ -151,10 +160,12 @@ VSQueryRunner::Delivery VSQueryRunner::answerObserver(Running& running, const VS
 VSQueryRunner::Delivery VSQueryRunner::answerChanges(Running& running, const VSAnchoredObjectQuery& query) {
     const bool first = running.first;
     auto result = read(running, [&](VSStoreReader& reader) {
-        return reader.changes(query.type(), query.predicate(), running.anchor, first ? query.limit : VSObjectQueryNoLimit);
+        return reader.changes(query.type(), query.predicate(), running.anchor,
+                              first ? query.limit : VSObjectQueryNoLimit);
     });
     if (result) running.anchor = result->anchor;
-    if (!first && result && result->added.empty() && result->deleted.empty()) return {};  // changes that the predicate leaves out
+    if (!first && result && result->added.empty() && result->deleted.empty())
+        return {};  // changes that the predicate leaves out
     return [&query, first, result = std::move(result)] {
         const auto& handler = first ? query.initialResultsHandler : query.updateHandler;
         if (handler) handler(result);
@@ -162,18 +173,22 @@ VSQueryRunner::Delivery VSQueryRunner::answerChanges(Running& running, const VSA
 }
 
 VSQueryRunner::Delivery VSQueryRunner::answerStatistics(Running& running, const VSStatisticsQuery& query) {
-    return [&query, result = read(running, [&](VSStoreReader& reader) {
-                return VSStatisticsEngine(reader, query.type(), query.predicate(), query.options).statistics();
-            })] {
-        if (query.completionHandler) query.completionHandler(result);
-    };
+    return
+        [&query,
+         result = read(running, [&](VSStoreReader& reader) {
+             return VSStatisticsEngine(reader, query.type(), query.predicate(), query.options).statistics();
+         })] {
+            if (query.completionHandler) query.completionHandler(result);
+        };
 }
 
-VSQueryRunner::Delivery VSQueryRunner::answerCollection(Running& running, const VSStatisticsCollectionQuery& query) {
+VSQueryRunner::Delivery VSQueryRunner::answerCollection(Running& running,
+                                                        const VSStatisticsCollectionQuery& query) {
     auto result = read(running, [&](VSStoreReader& reader) -> std::shared_ptr<const VSStatisticsCollection> {
         auto buckets = VSStatisticsEngine(reader, query.type(), query.predicate(), query.options)
                            .buckets(query.anchorDate, query.interval, running.calendar);
-        return std::make_shared<VSStatisticsCollection>(query.type(), query.anchorDate, query.interval, running.calendar, std::move(buckets));
+        return std::make_shared<VSStatisticsCollection>(query.type(), query.anchorDate, query.interval,
+                                                        running.calendar, std::move(buckets));
     });
     return [&query, first = running.first, result = std::move(result)] {
         const auto& handler = first ? query.initialResultsHandler : query.statisticsUpdateHandler;
@@ -182,7 +197,9 @@ VSQueryRunner::Delivery VSQueryRunner::answerCollection(Running& running, const 
 }
 
 VSQueryRunner::Delivery VSQueryRunner::answerSources(Running& running, const VSSourceQuery& query) {
-    return [&query, result = read(running, [&](VSStoreReader& reader) { return reader.sources(query.type(), query.predicate()); })] {
+    return [&query, result = read(running, [&](VSStoreReader& reader) {
+                        return reader.sources(query.type(), query.predicate());
+                    })] {
         if (query.completionHandler) query.completionHandler(result);
     };
 }

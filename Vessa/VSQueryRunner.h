@@ -10,10 +10,10 @@
 #include "Vessa/VSReaderPool.h"
 #include "Vessa/VSWorkQueue.h"
 
-/// The executing queries of a store: answers them on the reading threads, again after changes of their type, and
-/// calls their handlers there, one call of one query at a time. Any thread.
+/// The executing queries of a store: answers them on the reading threads, again after changes of their type,
+/// and calls their handlers there, one call of one query at a time. Any thread.
 class VSQueryRunner {
-   public:
+ public:
     VSQueryRunner(VSReaderPool& readers, VSWorkQueue& threads) : readers_(readers), threads_(threads) {}
 
     void execute(std::shared_ptr<VSQuery> query);
@@ -21,7 +21,7 @@ class VSQueryRunner {
     void stopAll();
     void typesChanged(const std::vector<VSChangeNotifier::Change>& changes);
 
-   private:
+ private:
     struct Running;
     using RunningPtr = std::shared_ptr<Running>;
     /// Calls the handler with the answer.

@@ -10,10 +10,11 @@
 
 /// Reading connections, lent to one user at a time. Any thread.
 class VSReaderPool {
-   public:
+ public:
     explicit VSReaderPool(std::filesystem::path folder) : folder_(std::move(folder)) {}
 
-    /// Runs `block(VSStoreReader&)` in one snapshot of the store and answers what it returned, or the failure.
+    /// Runs `block(VSStoreReader&)` in one snapshot of the store and answers what it returned, or the
+    /// failure.
     template <typename Block>
     auto read(Block block) -> VSResult<decltype(block(std::declval<VSStoreReader&>()))> {
         try {
@@ -31,9 +32,10 @@ class VSReaderPool {
     /// Closes the connections that nobody uses.
     void close();
 
-   private:
+ private:
     struct Connection {
-        explicit Connection(std::unique_ptr<VSDatabase> opened) : database(std::move(opened)), reader(*database) {}
+        explicit Connection(std::unique_ptr<VSDatabase> opened)
+            : database(std::move(opened)), reader(*database) {}
         std::unique_ptr<VSDatabase> database;
         VSStoreReader reader;
     };

@@ -14,7 +14,9 @@ constexpr size_t entriesKept = 1024;  // 4 MB
 constexpr int dayBits = 28, sourceBits = 20;
 constexpr int64_t dayOffset = int64_t{1} << (dayBits - 1);
 
-struct Quarters { int64_t first, last; };  // counted from 1970, both included
+struct Quarters {
+    int64_t first, last;
+};  // counted from 1970, both included
 
 Quarters quartersOf(int64_t start, int64_t duration) {
     const int64_t first = VSFloorDivide(start, VSQuarterMicroseconds);
@@ -23,19 +25,28 @@ Quarters quartersOf(int64_t start, int64_t duration) {
 
 }  // namespace
 
-void VSThrowCorruptRollup() { throw VSDatabaseFailure({VSErrorCode::Corrupt, "a rollup of the store is damaged"}); }
+void VSThrowCorruptRollup() {
+    throw VSDatabaseFailure({VSErrorCode::Corrupt, "a rollup of the store is damaged"});
+}
 
 int64_t VSRollupSlot(int type, int64_t source, int64_t day) {
     return (int64_t{type} << sourceBits | source) << dayBits | (day + dayOffset);
 }
-int64_t VSRollupDayOfSlot(int64_t slot) { return (slot & ((int64_t{1} << dayBits) - 1)) - dayOffset; }
-int64_t VSRollupSourceOfSlot(int64_t slot) { return slot >> dayBits & ((int64_t{1} << sourceBits) - 1); }
-int VSRollupTypeOfSlot(int64_t slot) { return static_cast<int>(slot >> (dayBits + sourceBits)); }
+int64_t VSRollupDayOfSlot(int64_t slot) {
+    return (slot & ((int64_t{1} << dayBits) - 1)) - dayOffset;
+}
+int64_t VSRollupSourceOfSlot(int64_t slot) {
+    return slot >> dayBits & ((int64_t{1} << sourceBits) - 1);
+}
+int VSRollupTypeOfSlot(int64_t slot) {
+    return static_cast<int>(slot >> (dayBits + sourceBits));
+}
 
 // VSDayRollup
 
 bool VSDayRollup::isEmpty() const {
-    return std::all_of(quarters.begin(), quarters.end(), [](const VSRollupQuarter& q) { return q.touching == 0; });
+    return std::all_of(quarters.begin(), quarters.end(),
+                       [](const VSRollupQuarter& q) { return q.touching == 0; });
 }
 
 void VSDayRollup::add(int64_t day, int64_t start, int64_t duration, double value) {
@@ -73,7 +84,8 @@ std::string VSDayRollup::encoded() const {
 
 VSDayRollup VSDayRollup::decoded(std::string_view bytes) {
     VSDayRollup rollup;
-    VSForEachRollupQuarter(bytes, [&](int index, const VSRollupQuarter& q) { rollup.quarters[static_cast<size_t>(index)] = q; });
+    VSForEachRollupQuarter(
+        bytes, [&](int index, const VSRollupQuarter& q) { rollup.quarters[static_cast<size_t>(index)] = q; });
     return rollup;
 }
 
@@ -98,7 +110,8 @@ VSRollupWriter::Entry& VSRollupWriter::entry(int64_t slot) {
 void VSRollupWriter::add(int type, int64_t source, int64_t start, int64_t duration, double value) {
     if (duration > VSStoreSchema::longSpan.count()) return;
     const auto [first, last] = quartersOf(start, duration);
-    for (int64_t day = VSFloorDivide(first, VSQuartersPerDay); day <= VSFloorDivide(last, VSQuartersPerDay); ++day) {
+    for (int64_t day = VSFloorDivide(first, VSQuartersPerDay); day <= VSFloorDivide(last, VSQuartersPerDay);
+         ++day) {
         entry(VSRollupSlot(type, source, day)).rollup.add(day, start, duration, value);
     }
 }
@@ -106,7 +119,8 @@ void VSRollupWriter::add(int type, int64_t source, int64_t start, int64_t durati
 void VSRollupWriter::rebuild(int type, int64_t source, int64_t start, int64_t duration) {
     if (duration > VSStoreSchema::longSpan.count()) return;
     const auto [first, last] = quartersOf(start, duration);
-    for (int64_t day = VSFloorDivide(first, VSQuartersPerDay); day <= VSFloorDivide(last, VSQuartersPerDay); ++day) {
+    for (int64_t day = VSFloorDivide(first, VSQuartersPerDay); day <= VSFloorDivide(last, VSQuartersPerDay);
+         ++day) {
         rebuild_.insert(VSRollupSlot(type, source, day));
     }
 }
@@ -117,7 +131,10 @@ void VSRollupWriter::write(int64_t slot, const VSDayRollup& rollup) {
         return;
     }
     const std::string bytes = rollup.encoded();
-    database_.use("INSERT INTO rollups(slot, quarters) VALUES (?1, ?2) ON CONFLICT(slot) DO UPDATE SET quarters = ?2")
+    database_
+        .use(
+            "INSERT INTO rollups(slot, quarters) VALUES (?1, ?2) ON CONFLICT(slot) DO UPDATE SET quarters = "
+            "?2")
         .bind(1, slot)
         .bindBlob(2, bytes.data(), bytes.size())
         .run();
@@ -132,8 +149,8 @@ void VSRollupWriter::writeEntries() {
 void VSRollupWriter::flush(VSStoreProvenances& provenances) {
     writeEntries();
     for (int64_t slot : rebuild_) {
-        write(slot, VSRollupFromSamples(database_, provenances, VSRollupTypeOfSlot(slot), VSRollupSourceOfSlot(slot),
-                                        VSRollupDayOfSlot(slot)));
+        write(slot, VSRollupFromSamples(database_, provenances, VSRollupTypeOfSlot(slot),
+                                        VSRollupSourceOfSlot(slot), VSRollupDayOfSlot(slot)));
     }
     rebuild_.clear();
 }
@@ -144,11 +161,16 @@ void VSRollupWriter::clear() {
     rebuild_.clear();
 }
 
-VSDayRollup VSRollupFromSamples(VSDatabase& database, VSStoreProvenances& provenances, int type, int64_t source, int64_t day) {
-    struct Row { int64_t id, start, duration; double value; };
+VSDayRollup VSRollupFromSamples(VSDatabase& database, VSStoreProvenances& provenances, int type,
+                                int64_t source, int64_t day) {
+    struct Row {
+        int64_t id, start, duration;
+        double value;
+    };
     std::vector<Row> rows;
     auto statement = database.use(
-        "SELECT id, start, duration, value, provenance FROM samples WHERE type = ?1 AND start >= ?2 AND start < ?3"
+        "SELECT id, start, duration, value, provenance FROM samples WHERE type = ?1 AND start >= ?2 AND "
+        "start < ?3"
         " AND start + duration >= ?4 AND duration <= " VS_LONG_SPAN_SQL);
     const int64_t dayStart = day * VSDayMicroseconds;
     auto longest = database.use("SELECT longest FROM types WHERE type = ?");

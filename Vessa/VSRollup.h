@@ -20,8 +20,12 @@ inline constexpr int VSQuartersPerDay = 96;
 inline constexpr int64_t VSDayMicroseconds = VSQuarterMicroseconds * VSQuartersPerDay;
 
 /// Division towards the past, for times before 1970 too.
-constexpr int64_t VSFloorDivide(int64_t a, int64_t b) { return a / b - (a % b < 0 ? 1 : 0); }
-constexpr int64_t VSCeilingDivide(int64_t a, int64_t b) { return a / b + (a % b > 0 ? 1 : 0); }
+constexpr int64_t VSFloorDivide(int64_t a, int64_t b) {
+    return a / b - (a % b < 0 ? 1 : 0);
+}
+constexpr int64_t VSCeilingDivide(int64_t a, int64_t b) {
+    return a / b + (a % b > 0 ? 1 : 0);
+}
 
 /// What one quarter of an hour holds of one type and source. The layout is that on disk (little-endian).
 struct VSRollupQuarter {
@@ -63,19 +67,22 @@ int VSRollupTypeOfSlot(int64_t slot);
 
 /// The rollups that a writing transaction changes, kept in memory until `flush`.
 class VSRollupWriter {
-   public:
+ public:
     explicit VSRollupWriter(VSDatabase& database) : database_(database) {}
     /// Adds a sample to every day that it touches.
     void add(int type, int64_t source, int64_t start, int64_t duration, double value);
-    /// Something was deleted from the days that this span touches: they are made anew from the samples at the flush.
+    /// Something was deleted from the days that this span touches: they are made anew from the samples at the
+    /// flush.
     void rebuild(int type, int64_t source, int64_t start, int64_t duration);
     /// Writes everything down, before the commit.
     void flush(VSStoreProvenances& provenances);
     /// Forgets what was not flushed (a transaction that is rolled back).
     void clear();
 
-   private:
-    struct Entry { VSDayRollup rollup; };
+ private:
+    struct Entry {
+        VSDayRollup rollup;
+    };
     Entry& entry(int64_t slot);
     void write(int64_t slot, const VSDayRollup& rollup);
     void writeEntries();
@@ -88,7 +95,8 @@ class VSRollupWriter {
 };
 
 /// The rollup of a day made anew from its samples: what `rollups` must hold, bit for bit.
-VSDayRollup VSRollupFromSamples(VSDatabase& database, VSStoreProvenances& provenances, int type, int64_t source, int64_t day);
+VSDayRollup VSRollupFromSamples(VSDatabase& database, VSStoreProvenances& provenances, int type,
+                                int64_t source, int64_t day);
 
 [[noreturn]] void VSThrowCorruptRollup();
 

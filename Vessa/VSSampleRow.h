@@ -17,5 +17,6 @@ struct VSSampleRow {
 #define VS_SAMPLE_COLUMNS "start, id, duration, value, provenance, created, metadata"
 
 inline VSSampleRow VSReadSampleRow(const VSStatement& row) {
-    return {row.integer(0), row.integer(1), row.integer(2), row.real(3), row.integer(4), row.integer(5), row.integer(6)};
+    return {row.integer(0), row.integer(1), row.integer(2), row.real(3),
+            row.integer(4), row.integer(5), row.integer(6)};
 }

@@ -26,9 +26,10 @@ void VSStatisticsEngine::Gathered::addShare(double share) {
 
 /// Walks over the days of one source's rollups.
 class VSStatisticsEngine::RollupCursor {
-   public:
+ public:
     RollupCursor(VSDatabase& database, size_t sourceRank, int64_t first, int64_t last)
-        : rank(sourceRank), rows_(database.use("SELECT slot, quarters FROM rollups WHERE slot BETWEEN ? AND ? ORDER BY slot")) {
+        : rank(sourceRank),
+          rows_(database.use("SELECT slot, quarters FROM rollups WHERE slot BETWEEN ? AND ? ORDER BY slot")) {
         rows_.bind(1, first).bind(2, last);
         next();
     }
@@ -39,13 +40,13 @@ class VSStatisticsEngine::RollupCursor {
     const size_t rank;
     bool valid = false;
 
-   private:
+ private:
     VSStatement rows_;
 };
 
 /// Moments that samples of earlier sources cover, as separate spans in ascending order.
 class VSStatisticsEngine::Cover {
-   public:
+ public:
     bool contains(int64_t moment) const {
         const auto next = after(moment);
         return next != spans_.begin() && moment < std::prev(next)->second;
@@ -66,20 +67,24 @@ class VSStatisticsEngine::Cover {
         std::sort(spans_.begin(), spans_.end());
         size_t kept = 0;
         for (const auto& span : spans_) {
-            if (kept && span.first <= spans_[kept - 1].second) spans_[kept - 1].second = std::max(spans_[kept - 1].second, span.second);
-            else spans_[kept++] = span;
+            if (kept && span.first <= spans_[kept - 1].second)
+                spans_[kept - 1].second = std::max(spans_[kept - 1].second, span.second);
+            else
+                spans_[kept++] = span;
         }
         spans_.resize(kept);
     }
 
-   private:
+ private:
     std::vector<std::pair<int64_t, int64_t>>::const_iterator after(int64_t moment) const {
-        return std::upper_bound(spans_.begin(), spans_.end(), moment, [](int64_t value, const auto& span) { return value < span.first; });
+        return std::upper_bound(spans_.begin(), spans_.end(), moment,
+                                [](int64_t value, const auto& span) { return value < span.first; });
     }
     std::vector<std::pair<int64_t, int64_t>> spans_;
 };
 
-VSStatisticsEngine::VSStatisticsEngine(VSStoreReader& reader, const VSObjectType* type, const VSPredicate& predicate, int options)
+VSStatisticsEngine::VSStatisticsEngine(VSStoreReader& reader, const VSObjectType* type,
+                                       const VSPredicate& predicate, int options)
     : reader_(reader),
       type_(type),
       predicate_(predicate),
@@ -112,11 +117,13 @@ VSStatistics VSStatisticsEngine::statistics() {
     return finished(0);
 }
 
-std::vector<VSStatistics> VSStatisticsEngine::buckets(VSDate anchor, const VSDateComponents& interval, const VSCalendar& calendar) {
+std::vector<VSStatistics> VSStatisticsEngine::buckets(VSDate anchor, const VSDateComponents& interval,
+                                                      const VSCalendar& calendar) {
     std::vector<VSStatistics> result;
     if (!findRange()) return result;
     std::vector<int64_t> borders;
-    for (VSDate border : calendar.bucketBoundaries(anchor, interval, VSDate::fromMicroseconds(from_), VSDate::fromMicroseconds(to_)))
+    for (VSDate border : calendar.bucketBoundaries(anchor, interval, VSDate::fromMicroseconds(from_),
+                                                   VSDate::fromMicroseconds(to_)))
         borders.push_back(border.microseconds());
     gather(std::move(borders));
     const bool countsOnly = (options_ & ~VSStatisticsOptionSeparateBySource) == 0;
@@ -133,8 +140,10 @@ void VSStatisticsEngine::gather(std::vector<int64_t> borders) {
     gathered_.resize(borders_.size() - 1);
     if (separate_) ofSource_.assign(gathered_.size(), std::vector<Gathered>(sources_.size()));
     for (const Segment& segment : segments()) {
-        if (segment.rolledUp) gatherRollups(segment);
-        else gatherSamples(segment, All);
+        if (segment.rolledUp)
+            gatherRollups(segment);
+        else
+            gatherSamples(segment, All);
     }
 }
 
@@ -152,10 +161,13 @@ std::vector<VSStatisticsEngine::Segment> VSStatisticsEngine::segments() const {
         if (!rolledUp) ++partial;
     };
     const int64_t end = borders_.back();
-    for (size_t bucket = 0; fromRollups_ && bucket + 1 < borders_.size() && partial <= partialSegmentsAtMost; ++bucket) {
+    for (size_t bucket = 0; fromRollups_ && bucket + 1 < borders_.size() && partial <= partialSegmentsAtMost;
+         ++bucket) {
         // Nothing lies before or after the data: there its border may as well be the quarter's.
-        int64_t from = std::max(borders_[bucket], predicate_.startDate ? predicate_.startDate->microseconds() : INT64_MIN);
-        int64_t to = std::min(borders_[bucket + 1], predicate_.endDate ? predicate_.endDate->microseconds() : INT64_MAX);
+        int64_t from = std::max(borders_[bucket],
+                                predicate_.startDate ? predicate_.startDate->microseconds() : INT64_MIN);
+        int64_t to = std::min(borders_[bucket + 1],
+                              predicate_.endDate ? predicate_.endDate->microseconds() : INT64_MAX);
         if (from < from_) from = VSFloorDivide(from_, VSQuarterMicroseconds) * VSQuarterMicroseconds;
         if (to > to_) to = VSCeilingDivide(to_, VSQuarterMicroseconds) * VSQuarterMicroseconds;
         const int64_t wholeFrom = VSCeilingDivide(from, VSQuarterMicroseconds) * VSQuarterMicroseconds;
@@ -175,11 +187,13 @@ std::vector<VSStatisticsEngine::Segment> VSStatisticsEngine::segments() const {
 void VSStatisticsEngine::gatherRollups(const Segment& segment) {
     std::vector<Segment> conflicts;
     gatherLongSpans(segment, conflicts);
-    const int64_t firstDay = VSFloorDivide(segment.from, VSDayMicroseconds), lastDay = VSFloorDivide(segment.to - 1, VSDayMicroseconds);
+    const int64_t firstDay = VSFloorDivide(segment.from, VSDayMicroseconds),
+                  lastDay = VSFloorDivide(segment.to - 1, VSDayMicroseconds);
     const int type = VSTypeCodeValue(type_->code());
     std::vector<std::unique_ptr<RollupCursor>> cursors;
     for (size_t rank = 0; rank < sources_.size(); ++rank) {
-        cursors.push_back(std::make_unique<RollupCursor>(reader_.database(), rank, VSRollupSlot(type, sources_[rank], firstDay),
+        cursors.push_back(std::make_unique<RollupCursor>(reader_.database(), rank,
+                                                         VSRollupSlot(type, sources_[rank], firstDay),
                                                          VSRollupSlot(type, sources_[rank], lastDay)));
     }
     std::vector<RollupCursor*> today;
@@ -197,7 +211,8 @@ void VSStatisticsEngine::gatherRollups(const Segment& segment) {
         for (RollupCursor* cursor : today) cursor->next();
     }
     cursors.clear();
-    std::sort(conflicts.begin(), conflicts.end(), [](const Segment& a, const Segment& b) { return a.from < b.from; });
+    std::sort(conflicts.begin(), conflicts.end(),
+              [](const Segment& a, const Segment& b) { return a.from < b.from; });
     Segment pending{INT64_MIN, INT64_MIN, false};
     for (const Segment& conflict : conflicts) {
         if (conflict.from > pending.to) {
@@ -209,7 +224,8 @@ void VSStatisticsEngine::gatherRollups(const Segment& segment) {
     if (pending.from < pending.to) gatherSamples(pending, Merged);
 }
 
-void VSStatisticsEngine::gatherDay(int64_t day, std::vector<RollupCursor*>& cursors, const Segment& segment, std::vector<Segment>& conflicts) {
+void VSStatisticsEngine::gatherDay(int64_t day, std::vector<RollupCursor*>& cursors, const Segment& segment,
+                                   std::vector<Segment>& conflicts) {
     const int64_t dayStart = day * VSDayMicroseconds;
     std::array<uint8_t, VSQuartersPerDay> sourcesIn{};
     if (merging_) {
@@ -227,8 +243,10 @@ void VSStatisticsEngine::gatherDay(int64_t day, std::vector<RollupCursor*>& curs
             const int64_t start = dayStart + index * VSQuarterMicroseconds;
             if (start < segment.from || start >= segment.to) continue;
             if (count > 1) {
-                if (conflicts.size() > longSpans && conflicts.back().to == start) conflicts.back().to += VSQuarterMicroseconds;
-                else conflicts.push_back({start, start + VSQuarterMicroseconds, false});
+                if (conflicts.size() > longSpans && conflicts.back().to == start)
+                    conflicts.back().to += VSQuarterMicroseconds;
+                else
+                    conflicts.push_back({start, start + VSQuarterMicroseconds, false});
             }
         }
     }
@@ -238,11 +256,14 @@ void VSStatisticsEngine::gatherDay(int64_t day, std::vector<RollupCursor*>& curs
             if (start < segment.from || start >= segment.to) return;
             const size_t bucket = bucketOf(start);
             Gathered& gathered = gathered_[bucket];
-            if (quarter.starting) gathered.addStarting(quarter.starting, quarter.startingSum, quarter.minimum, quarter.maximum);
-            if (!merging_ || (sourcesIn[static_cast<size_t>(index)] < 2 && !isLongConflict(start))) gathered.addShare(quarter.share);
+            if (quarter.starting)
+                gathered.addStarting(quarter.starting, quarter.startingSum, quarter.minimum, quarter.maximum);
+            if (!merging_ || (sourcesIn[static_cast<size_t>(index)] < 2 && !isLongConflict(start)))
+                gathered.addShare(quarter.share);
             if (!separate_) return;
             Gathered& own = ofSource_[bucket][cursor->rank];
-            if (quarter.starting) own.addStarting(quarter.starting, quarter.startingSum, quarter.minimum, quarter.maximum);
+            if (quarter.starting)
+                own.addStarting(quarter.starting, quarter.startingSum, quarter.minimum, quarter.maximum);
             own.addShare(quarter.share);
         });
     }
@@ -250,7 +271,8 @@ void VSStatisticsEngine::gatherDay(int64_t day, std::vector<RollupCursor*>& curs
 
 /// Spans over 48 hours, which no rollup holds.
 void VSStatisticsEngine::gatherLongSpans(const Segment& segment, std::vector<Segment>& conflicts) {
-    auto rows = reader_.database().use("SELECT " VS_SAMPLE_COLUMNS " FROM samples INDEXED BY samples_long WHERE type = ? AND start < ?"
+    auto rows = reader_.database().use("SELECT " VS_SAMPLE_COLUMNS
+                                       " FROM samples INDEXED BY samples_long WHERE type = ? AND start < ?"
                                        " AND duration > " VS_LONG_SPAN_SQL);
     rows.bind(1, VSTypeCodeValue(type_->code())).bind(2, segment.to);
     longConflicts_.clear();
@@ -287,8 +309,11 @@ void VSStatisticsEngine::gatherSamples(const Segment& segment, int parts) {
         if ((parts & Starting) && row.start >= segment.from && row.start < segment.to)
             addStarting(row.start, rank, 1, row.value, row.value, row.value);
         if (shareParts) {
-            if (row.duration == 0) addShare(row.start, row.start, 0, row.value, rank, shareParts);
-            else addShare(std::max(row.start, segment.from), std::min(row.end(), segment.to), row.duration, row.value, rank, shareParts);
+            if (row.duration == 0)
+                addShare(row.start, row.start, 0, row.value, rank, shareParts);
+            else
+                addShare(std::max(row.start, segment.from), std::min(row.end(), segment.to), row.duration,
+                         row.value, rank, shareParts);
         }
         if (merging_ && (parts & Merged)) merged.push_back({rank, row});
         return true;
@@ -299,7 +324,8 @@ void VSStatisticsEngine::gatherSamples(const Segment& segment, int parts) {
 void VSStatisticsEngine::gatherMerged(const std::vector<RankedRow>& rows, const Segment& segment) {
     std::vector<size_t> order(rows.size());
     for (size_t index = 0; index < order.size(); ++index) order[index] = index;
-    std::stable_sort(order.begin(), order.end(), [&](size_t a, size_t b) { return rows[a].rank < rows[b].rank; });
+    std::stable_sort(order.begin(), order.end(),
+                     [&](size_t a, size_t b) { return rows[a].rank < rows[b].rank; });
     Cover cover;
     std::vector<std::pair<int64_t, int64_t>> ofThisSource;
     for (size_t place = 0; place < order.size(); ++place) {
@@ -312,22 +338,26 @@ void VSStatisticsEngine::gatherMerged(const std::vector<RankedRow>& rows, const 
             continue;
         }
         const int64_t from = std::max(row.start, segment.from), to = std::min(row.end(), segment.to);
-        cover.forEachGap(from, to, [&](int64_t a, int64_t b) { addShare(a, b, row.duration, row.value, rank, Merged); });
+        cover.forEachGap(
+            from, to, [&](int64_t a, int64_t b) { addShare(a, b, row.duration, row.value, rank, Merged); });
         ofThisSource.emplace_back(from, to);
     }
 }
 
-void VSStatisticsEngine::addStarting(int64_t moment, size_t rank, int64_t count, double sum, double low, double high) {
+void VSStatisticsEngine::addStarting(int64_t moment, size_t rank, int64_t count, double sum, double low,
+                                     double high) {
     const size_t bucket = bucketOf(moment);
     gathered_[bucket].addStarting(count, sum, low, high);
     if (separate_) ofSource_[bucket][rank].addStarting(count, sum, low, high);
 }
 
-void VSStatisticsEngine::addShare(int64_t from, int64_t to, int64_t duration, double value, size_t rank, int parts) {
+void VSStatisticsEngine::addShare(int64_t from, int64_t to, int64_t duration, double value, size_t rank,
+                                  int parts) {
     size_t bucket = bucketOf(from);
     do {
         const int64_t end = std::min(to, borders_[bucket + 1]);
-        const double share = duration == 0 ? value : value * (static_cast<double>(end - from) / static_cast<double>(duration));
+        const double share =
+            duration == 0 ? value : value * (static_cast<double>(end - from) / static_cast<double>(duration));
         if (parts & Merged) gathered_[bucket].addShare(share);
         if ((parts & Own) && separate_) ofSource_[bucket][rank].addShare(share);
         from = end;
@@ -346,7 +376,8 @@ size_t VSStatisticsEngine::bucketOf(int64_t moment) {
 size_t VSStatisticsEngine::rankOf(int64_t provenance) {
     const int64_t source = reader_.provenances().sourceOfProvenance(provenance);
     const auto found = std::find(sources_.begin(), sources_.end(), source);
-    if (found == sources_.end()) throw VSDatabaseFailure({VSErrorCode::Corrupt, "the store lacks a summary of a source"});
+    if (found == sources_.end())
+        throw VSDatabaseFailure({VSErrorCode::Corrupt, "the store lacks a summary of a source"});
     return static_cast<size_t>(found - sources_.begin());
 }
 
@@ -355,7 +386,8 @@ VSStatistics VSStatisticsEngine::finished(size_t bucket) const {
         target.count = gathered.count;
         if (gathered.touched && (options_ & VSStatisticsOptionCumulativeSum)) target.sum = gathered.sum;
         if (!gathered.count) return;
-        if (options_ & VSStatisticsOptionDiscreteAverage) target.average = gathered.startingSum / static_cast<double>(gathered.count);
+        if (options_ & VSStatisticsOptionDiscreteAverage)
+            target.average = gathered.startingSum / static_cast<double>(gathered.count);
         if (options_ & VSStatisticsOptionDiscreteMin) target.minimum = gathered.minimum;
         if (options_ & VSStatisticsOptionDiscreteMax) target.maximum = gathered.maximum;
     };
@@ -367,7 +399,8 @@ VSStatistics VSStatisticsEngine::finished(size_t bucket) const {
     if (!separate_ || ofSource_.empty()) return statistics;
     for (size_t rank = 0; rank < sources_.size(); ++rank) {
         const Gathered& own = ofSource_[bucket][rank];
-        if (own.touched || own.count) fill(statistics.bySource[reader_.provenances().source(sources_[rank])], own);
+        if (own.touched || own.count)
+            fill(statistics.bySource[reader_.provenances().source(sources_[rank])], own);
     }
     return statistics;
 }

@@ -19,13 +19,15 @@ struct VSStoreCore::Writer {
     VSStoreWriter writer;
 };
 
-VSResult<std::shared_ptr<VSStoreCore>> VSStoreCore::open(const std::filesystem::path& folder, const VSHealthStore::Options& options) {
+VSResult<std::shared_ptr<VSStoreCore>> VSStoreCore::open(const std::filesystem::path& folder,
+                                                         const VSHealthStore::Options& options) {
     try {
         std::unique_ptr<VSDatabase> database;
         if (options.readOnly) {
             VSStoreSchema::openForReading(folder, patienceToOpen);  // says now what is wrong with it
         } else {
-            database = VSStoreSchema::openForWriting(folder, options.createIfMissing, options.survivesPowerLoss, patienceToOpen);
+            database = VSStoreSchema::openForWriting(folder, options.createIfMissing,
+                                                     options.survivesPowerLoss, patienceToOpen);
             database->setPatience(patienceToWrite);
         }
         std::shared_ptr<VSStoreCore> core(new VSStoreCore(folder, options, std::move(database)));
@@ -66,7 +68,8 @@ void VSStoreCore::close() {
 void VSStoreCore::write(Change change, VSHealthStore::Completion completion) {
     if (!writer_) {
         readingThreads.enqueue([completion = std::move(completion)] {
-            if (completion) completion(VSError{VSErrorCode::NotAccessible, "the store was opened for reading only"});
+            if (completion)
+                completion(VSError{VSErrorCode::NotAccessible, "the store was opened for reading only"});
         });
         return;
     }

@@ -11,29 +11,35 @@
 #include "Vessa/VSStoreWriter.h"
 #include "Vessa/VSWorkQueue.h"
 
-/// The threads and connections behind a store: one writer with the only connection that writes (imports aside, which
-/// bring their own), three readers, one notifier. Lives until the last of its threads has ended. Any thread.
+/// The threads and connections behind a store: one writer with the only connection that writes (imports
+/// aside, which bring their own), three readers, one notifier. Lives until the last of its threads has ended.
+/// Any thread.
 class VSStoreCore : public std::enable_shared_from_this<VSStoreCore> {
-   public:
-    static VSResult<std::shared_ptr<VSStoreCore>> open(const std::filesystem::path& folder, const VSHealthStore::Options& options);
+ public:
+    static VSResult<std::shared_ptr<VSStoreCore>> open(const std::filesystem::path& folder,
+                                                       const VSHealthStore::Options& options);
     ~VSStoreCore();
 
-    /// Ends queries, writes what was accepted, ends the threads. Once; on a thread of the core it does not wait for that one.
+    /// Ends queries, writes what was accepted, ends the threads. Once; on a thread of the core it does not
+    /// wait for that one.
     void close();
 
     using Change = std::function<VSStatus(VSStoreWriter&)>;
     /// A transaction on the writer's thread, rolled back when the change fails; then the completion there.
     void write(Change change, VSHealthStore::Completion completion);
     VSStatus writeAndWait(Change change);
-    /// A question, and its answer's handler on a reading thread, after the writes that were accepted before it.
+    /// A question, and its answer's handler on a reading thread, after the writes that were accepted before
+    /// it.
     template <typename Block, typename Handler>
     void readLater(Block block, Handler handler) {
         auto ask = [this, block = std::move(block), handler = std::move(handler)] {
             const auto answer = readers.read(block);
             if (handler) handler(answer);
         };
-        if (writing_.isIdle()) readingThreads.enqueue(std::move(ask));
-        else writing_.enqueue([this, ask = std::move(ask)] { readingThreads.enqueue(ask); });
+        if (writing_.isIdle())
+            readingThreads.enqueue(std::move(ask));
+        else
+            writing_.enqueue([this, ask = std::move(ask)] { readingThreads.enqueue(ask); });
     }
     /// Tells the queries of all processes.
     void committed() { notifier.announce(); }
@@ -45,9 +51,10 @@ class VSStoreCore : public std::enable_shared_from_this<VSStoreCore> {
     VSQueryRunner queries;
     VSChangeNotifier notifier;
 
-   private:
+ private:
     struct Writer;
-    VSStoreCore(const std::filesystem::path& storeFolder, const VSHealthStore::Options& storeOptions, std::unique_ptr<VSDatabase> database);
+    VSStoreCore(const std::filesystem::path& storeFolder, const VSHealthStore::Options& storeOptions,
+                std::unique_ptr<VSDatabase> database);
     VSStatus apply(const Change& change);
 
     VSWorkQueue writing_;

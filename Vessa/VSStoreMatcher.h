@@ -13,12 +13,16 @@ double VSStoredValue(const VSSample& sample);
 bool VSSameStoredValue(double a, double b);
 
 /// A member of a saved correlation, by its key.
-struct VSMemberKey { const VSObjectType* type; int64_t start, id; };
+struct VSMemberKey {
+    const VSObjectType* type;
+    int64_t start, id;
+};
 
 /// Finds rows that say the same as a sample: type, span, value, source with version, device, metadata and
-/// content (workout totals and events; members). Creation date and time-zone offset count where the sample has them.
+/// content (workout totals and events; members). Creation date and time-zone offset count where the sample
+/// has them.
 class VSStoreMatcher {
-   public:
+ public:
     VSStoreMatcher(VSDatabase& database, VSStoreProvenances& provenances, VSStoreMetadata& metadata)
         : database_(database), provenances_(provenances), metadata_(metadata) {}
 
@@ -27,7 +31,7 @@ class VSStoreMatcher {
     std::vector<VSMemberKey> members(int64_t parent);
     bool row(const VSMemberKey& key, VSSampleRow& row);
 
-   private:
+ private:
     bool sameRow(const VSSample& sample, int64_t metadata, const VSSampleRow& row);
     bool sameWorkout(const VSWorkout& workout, int64_t id);
     bool sameMembers(const VSCorrelation& correlation, int64_t id);

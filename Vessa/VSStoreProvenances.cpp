@@ -5,12 +5,14 @@ namespace {
 constexpr size_t metadataKept = 4096;
 
 [[noreturn]] void corrupt(const char* what, int64_t id) {
-    throw VSDatabaseFailure({VSErrorCode::Corrupt, std::string("the store lacks its ") + what + " " + std::to_string(id)});
+    throw VSDatabaseFailure(
+        {VSErrorCode::Corrupt, std::string("the store lacks its ") + what + " " + std::to_string(id)});
 }
 
 VSDevice readDevice(const VSStatement& row, int column) {
-    return {row.optionalText(column),     row.optionalText(column + 1), row.optionalText(column + 2), row.optionalText(column + 3),
-            row.optionalText(column + 4), row.optionalText(column + 5), row.optionalText(column + 6), row.optionalText(column + 7)};
+    return {row.optionalText(column),     row.optionalText(column + 1), row.optionalText(column + 2),
+            row.optionalText(column + 3), row.optionalText(column + 4), row.optionalText(column + 5),
+            row.optionalText(column + 6), row.optionalText(column + 7)};
 }
 
 }  // namespace
@@ -23,7 +25,8 @@ const VSStoreProvenances::Entry& VSStoreProvenances::provenance(int64_t id) {
     if (!row.step()) corrupt("provenance", id);
     auto made = std::make_unique<Entry>();
     made->source = row.integer(0);
-    made->revision = std::make_shared<const VSSourceRevision>(VSSourceRevision{source(row.integer(0)), row.text(1)});
+    made->revision =
+        std::make_shared<const VSSourceRevision>(VSSourceRevision{source(row.integer(0)), row.text(1)});
     if (!row.isNull(2)) made->device = device(row.integer(2));
     if (!row.isNull(3)) made->timeZoneOffset = static_cast<int>(row.integer(3));
     entry = std::move(made);
@@ -44,7 +47,8 @@ std::shared_ptr<const VSDevice> VSStoreProvenances::device(int64_t id) {
     auto& entry = devices_[id];
     if (entry) return entry;
     auto row = database_.use(
-        "SELECT name, manufacturer, model, hardware, firmware, software, local, udi FROM devices WHERE device = ?");
+        "SELECT name, manufacturer, model, hardware, firmware, software, local, udi FROM devices WHERE "
+        "device = ?");
     row.bind(1, id);
     if (!row.step()) corrupt("device", id);
     entry = std::make_shared<const VSDevice>(readDevice(row, 0));
@@ -62,7 +66,8 @@ void VSStoreProvenances::loadNumbers() {
     if (numbersLoaded_) return;
     auto sources = database_.use("SELECT source, name, bundle FROM sources");
     while (sources.step()) sourceNumbers_[{sources.text(1), sources.text(2)}] = sources.integer(0);
-    auto devices = database_.use("SELECT device, name, manufacturer, model, hardware, firmware, software, local, udi FROM devices");
+    auto devices = database_.use(
+        "SELECT device, name, manufacturer, model, hardware, firmware, software, local, udi FROM devices");
     while (devices.step()) deviceNumbers_[readDevice(devices, 1)] = devices.integer(0);
     auto rows = database_.use("SELECT provenance, source, version, device, zone FROM provenances");
     while (rows.step()) {
@@ -117,14 +122,14 @@ int64_t VSStoreProvenances::deviceFor(const VSDevice& device) {
 }
 
 int64_t VSStoreProvenances::provenanceFor(const VSProvenance& provenance) {
-    if (recent_.provenance && recent_.revision == provenance.sourceRevision && recent_.device == provenance.device &&
-        recent_.zone == provenance.timeZoneOffset)
+    if (recent_.provenance && recent_.revision == provenance.sourceRevision &&
+        recent_.device == provenance.device && recent_.zone == provenance.timeZoneOffset)
         return recent_.provenance;
     loadNumbers();
     const VSSourceRevision own{VSSource::application(), ""};
     const VSSourceRevision& revision = provenance.sourceRevision ? *provenance.sourceRevision : own;
-    const Key key{sourceFor(revision.source), revision.version, provenance.device ? deviceFor(*provenance.device) : 0,
-                  provenance.timeZoneOffset};
+    const Key key{sourceFor(revision.source), revision.version,
+                  provenance.device ? deviceFor(*provenance.device) : 0, provenance.timeZoneOffset};
     auto [place, isNew] = provenanceNumbers_.try_emplace(key, 0);
     if (isNew) {
         place->second = database_.integer("SELECT coalesce(max(provenance), 0) + 1 FROM provenances");

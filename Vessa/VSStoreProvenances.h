@@ -15,7 +15,7 @@
 /// connection's database. Their rows never change and their numbers are never reused, so what was read once
 /// stays true. Used by the connection's thread. Throws VSDatabaseFailure.
 class VSStoreProvenances {
-   public:
+ public:
     explicit VSStoreProvenances(VSDatabase& database) : database_(database) {}
 
     struct Entry {
@@ -38,7 +38,7 @@ class VSStoreProvenances {
     /// Forgets the numbers given in a transaction that was rolled back, and what others may have added.
     void forgetNumbers();
 
-   private:
+ private:
     void loadNumbers();
     std::shared_ptr<const VSDevice> device(int64_t id);
     int64_t deviceFor(const VSDevice& device);
@@ -72,7 +72,7 @@ class VSStoreProvenances {
 
 /// The metadata dictionaries of one connection's database, each kept once with the number of its users.
 class VSStoreMetadata {
-   public:
+ public:
     explicit VSStoreMetadata(VSDatabase& database) : database_(database) {}
     /// The dictionary of a number; 0 is none (null). Throws Corrupt where it is missing.
     std::shared_ptr<const VSMetadata> metadata(int64_t id);
@@ -86,7 +86,7 @@ class VSStoreMetadata {
     void flush();
     void forgetNumbers();
 
-   private:
+ private:
     VSDatabase& database_;
     std::unordered_map<int64_t, std::shared_ptr<const VSMetadata>> read_;
     std::unordered_map<std::string, int64_t> numbers_;  // by content

@@ -8,13 +8,17 @@
 
 namespace {
 
-int codeOf(const VSObjectType* type) { return VSTypeCodeValue(type->code()); }
+int codeOf(const VSObjectType* type) {
+    return VSTypeCodeValue(type->code());
+}
 
-int64_t lowerSum(int64_t a, int64_t b) { return a < INT64_MIN / 2 ? INT64_MIN : a - b; }
+int64_t lowerSum(int64_t a, int64_t b) {
+    return a < INT64_MIN / 2 ? INT64_MIN : a - b;
+}
 
 /// Whether a stands before b in the order asked for; ties fall by number, in the direction of the first key.
 class RowOrder {
-   public:
+ public:
     explicit RowOrder(const std::vector<VSSortDescriptor>& sort) : sort_(sort) {}
     bool operator()(const VSSampleRow& a, const VSSampleRow& b) const {
         for (const VSSortDescriptor& key : sort_) {
@@ -24,7 +28,7 @@ class RowOrder {
         return sort_.empty() || sort_.front().ascending ? a.id < b.id : a.id > b.id;
     }
 
-   private:
+ private:
     static int64_t valueOf(const VSSampleRow& row, const VSSortDescriptor& key) {
         if (key.key == VSSampleSortIdentifierStartDate) return row.start;
         if (key.key == VSSampleSortIdentifierEndDate) return row.end();
@@ -35,7 +39,8 @@ class RowOrder {
 
 void refuseUnknownKeys(const std::vector<VSSortDescriptor>& sort) {
     for (const VSSortDescriptor& key : sort) {
-        if (key.key != VSSampleSortIdentifierStartDate && key.key != VSSampleSortIdentifierEndDate && key.key != VSObjectSortIdentifierDataID)
+        if (key.key != VSSampleSortIdentifierStartDate && key.key != VSSampleSortIdentifierEndDate &&
+            key.key != VSObjectSortIdentifierDataID)
             throw VSDatabaseFailure({VSErrorCode::Invalid, "nothing sorts by " + key.key});
     }
 }
@@ -43,17 +48,19 @@ void refuseUnknownKeys(const std::vector<VSSortDescriptor>& sort) {
 }  // namespace
 
 VSDateFilter::VSDateFilter(const VSPredicate& predicate)
-    : strictStart_(predicate.dateOptions & VSQueryOptionStrictStartDate), strictEnd_(predicate.dateOptions & VSQueryOptionStrictEndDate) {
+    : strictStart_(predicate.dateOptions & VSQueryOptionStrictStartDate),
+      strictEnd_(predicate.dateOptions & VSQueryOptionStrictEndDate) {
     if (predicate.startDate) start_ = predicate.startDate->microseconds();
     if (predicate.endDate) {
         end_ = predicate.endDate->microseconds();
         startsBefore_ = end_;
     }
-    if (predicate.startsBefore) startsBefore_ = std::min(startsBefore_, predicate.startsBefore->microseconds());
+    if (predicate.startsBefore)
+        startsBefore_ = std::min(startsBefore_, predicate.startsBefore->microseconds());
 }
 
 class VSStoreReader::Conditions {
-   public:
+ public:
     Conditions(VSStoreReader& reader, const VSPredicate& predicate)
         : reader_(reader),
           predicate_(predicate),
@@ -67,12 +74,13 @@ class VSStoreReader::Conditions {
         return !predicate_.noCorrelation || !isMember(row.id);
     }
 
-   private:
+ private:
     bool matchesProvenance(int64_t id) {
         if (auto known = provenances_.find(id); known != provenances_.end()) return known->second;
         const auto& entry = reader_.provenances_.provenance(id);
-        bool matches = predicate_.sources.empty() ||
-                       std::find(predicate_.sources.begin(), predicate_.sources.end(), entry.revision->source) != predicate_.sources.end();
+        bool matches =
+            predicate_.sources.empty() || std::find(predicate_.sources.begin(), predicate_.sources.end(),
+                                                    entry.revision->source) != predicate_.sources.end();
         if (predicate_.device) matches = matches && entry.device && *entry.device == *predicate_.device;
         return provenances_[id] = matches;
     }
@@ -81,16 +89,18 @@ class VSStoreReader::Conditions {
         if (auto known = metadata_.find(id); known != metadata_.end()) return known->second;
         const auto metadata = reader_.metadata_.metadata(id);
         const auto has = [&](const std::string& key) { return metadata->find(key) != metadata->end(); };
-        const bool matches = std::all_of(predicate_.metadataKeys.begin(), predicate_.metadataKeys.end(), has) &&
-                             std::all_of(predicate_.metadata.begin(), predicate_.metadata.end(), [&](const auto& entry) {
-                                 const auto found = metadata->find(entry.first);
-                                 return found != metadata->end() && found->second == entry.second;
-                             });
+        const bool matches =
+            std::all_of(predicate_.metadataKeys.begin(), predicate_.metadataKeys.end(), has) &&
+            std::all_of(predicate_.metadata.begin(), predicate_.metadata.end(), [&](const auto& entry) {
+                const auto found = metadata->find(entry.first);
+                return found != metadata->end() && found->second == entry.second;
+            });
         return metadata_[id] = matches;
     }
     bool isMember(int64_t id) {
         auto row = reader_.database_.use(
-            "SELECT 1 FROM members WHERE member = ? AND parent NOT IN (SELECT workout FROM workouts) LIMIT 1");
+            "SELECT 1 FROM members WHERE member = ? AND parent NOT IN (SELECT workout FROM workouts) LIMIT "
+            "1");
         return row.bind(1, id).step();
     }
 
@@ -101,7 +111,10 @@ class VSStoreReader::Conditions {
 };
 
 VSStoreReader::VSStoreReader(VSDatabase& database)
-    : database_(database), provenances_(database), metadata_(database), matcher_(database, provenances_, metadata_) {}
+    : database_(database),
+      provenances_(database),
+      metadata_(database),
+      matcher_(database, provenances_, metadata_) {}
 
 int64_t VSStoreReader::longest(const VSObjectType* type) {
     auto row = database_.use("SELECT longest FROM types WHERE type = ?");
@@ -127,17 +140,23 @@ void VSStoreReader::scan(const VSObjectType* type, const VSPredicate& predicate,
     const int64_t from = filter.strictStart() ? filter.start() : lowerSum(filter.start(), longest(type));
     const auto scanLong = [&] {
         if (filter.strictStart() || from == INT64_MIN) return true;
-        auto rows = database_.use(ascending ? "SELECT " VS_SAMPLE_COLUMNS " FROM samples INDEXED BY samples_long WHERE type = ? AND start < ?"
-                                              " AND duration > " VS_LONG_SPAN_SQL " ORDER BY start, id"
-                                            : "SELECT " VS_SAMPLE_COLUMNS " FROM samples INDEXED BY samples_long WHERE type = ? AND start < ?"
-                                              " AND duration > " VS_LONG_SPAN_SQL " ORDER BY start DESC, id DESC");
+        auto rows =
+            database_.use(ascending ? "SELECT " VS_SAMPLE_COLUMNS
+                                      " FROM samples INDEXED BY samples_long WHERE type = ? AND start < ?"
+                                      " AND duration > " VS_LONG_SPAN_SQL " ORDER BY start, id"
+                                    : "SELECT " VS_SAMPLE_COLUMNS
+                                      " FROM samples INDEXED BY samples_long WHERE type = ? AND start < ?"
+                                      " AND duration > " VS_LONG_SPAN_SQL " ORDER BY start DESC, id DESC");
         rows.bind(1, codeOf(type)).bind(2, std::min(from, filter.startsBefore()));
         return scanRows(rows, accept);
     };
     const auto scanRange = [&] {
-        auto rows = database_.use(ascending ? "SELECT " VS_SAMPLE_COLUMNS " FROM samples WHERE type = ? AND start >= ? AND start < ? ORDER BY start, id"
-                                            : "SELECT " VS_SAMPLE_COLUMNS
-                                              " FROM samples WHERE type = ? AND start >= ? AND start < ? ORDER BY start DESC, id DESC");
+        auto rows = database_.use(
+            ascending
+                ? "SELECT " VS_SAMPLE_COLUMNS
+                  " FROM samples WHERE type = ? AND start >= ? AND start < ? ORDER BY start, id"
+                : "SELECT " VS_SAMPLE_COLUMNS
+                  " FROM samples WHERE type = ? AND start >= ? AND start < ? ORDER BY start DESC, id DESC");
         rows.bind(1, codeOf(type)).bind(2, from).bind(3, filter.startsBefore());
         return scanRows(rows, accept);
     };
@@ -149,8 +168,8 @@ void VSStoreReader::scan(const VSObjectType* type, const VSPredicate& predicate,
 }
 
 /// The first `limit` rows by start or end date, reading no more of the table than needed.
-std::vector<VSSampleRow> VSStoreReader::firstRows(const VSObjectType* type, const VSPredicate& predicate, int limit,
-                                                  const VSSortDescriptor& key) {
+std::vector<VSSampleRow> VSStoreReader::firstRows(const VSObjectType* type, const VSPredicate& predicate,
+                                                  int limit, const VSSortDescriptor& key) {
     const bool byEnd = key.key == VSSampleSortIdentifierEndDate;
     const int64_t reach = byEnd && !key.ascending ? longest(type) : 0;
     std::vector<VSSampleRow> rows;
@@ -175,8 +194,9 @@ std::vector<VSSampleRow> VSStoreReader::firstRows(const VSObjectType* type, cons
         // A long span may end last and start early.
         const VSDateFilter filter(predicate);
         Conditions conditions(*this, predicate);
-        auto longRows = database_.use("SELECT " VS_SAMPLE_COLUMNS
-                                      " FROM samples INDEXED BY samples_long WHERE type = ? AND duration > " VS_LONG_SPAN_SQL);
+        auto longRows = database_.use(
+            "SELECT " VS_SAMPLE_COLUMNS
+            " FROM samples INDEXED BY samples_long WHERE type = ? AND duration > " VS_LONG_SPAN_SQL);
         longRows.bind(1, codeOf(type));
         scanRows(longRows, [&](const VSSampleRow& row) {
             return !filter.matches(row.start, row.duration) || !conditions.match(row) || consider(row, false);
@@ -190,12 +210,16 @@ std::vector<VSSampleRow> VSStoreReader::firstRows(const VSObjectType* type, cons
     return rows;
 }
 
-std::vector<VSSampleRow> VSStoreReader::rowsByNumber(const VSObjectType* type, const VSPredicate& predicate, int limit, bool ascending) {
+std::vector<VSSampleRow> VSStoreReader::rowsByNumber(const VSObjectType* type, const VSPredicate& predicate,
+                                                     int limit, bool ascending) {
     const VSDateFilter filter(predicate);
     Conditions conditions(*this, predicate);
     std::vector<VSSampleRow> rows;
-    auto statement = database_.use(ascending ? "SELECT " VS_SAMPLE_COLUMNS " FROM samples INDEXED BY samples_by_id WHERE type = ? ORDER BY id"
-                                             : "SELECT " VS_SAMPLE_COLUMNS " FROM samples INDEXED BY samples_by_id WHERE type = ? ORDER BY id DESC");
+    auto statement =
+        database_.use(ascending ? "SELECT " VS_SAMPLE_COLUMNS
+                                  " FROM samples INDEXED BY samples_by_id WHERE type = ? ORDER BY id"
+                                : "SELECT " VS_SAMPLE_COLUMNS
+                                  " FROM samples INDEXED BY samples_by_id WHERE type = ? ORDER BY id DESC");
     statement.bind(1, codeOf(type));
     scanRows(statement, [&](const VSSampleRow& row) {
         if (filter.matches(row.start, row.duration) && conditions.match(row)) rows.push_back(row);
@@ -204,8 +228,8 @@ std::vector<VSSampleRow> VSStoreReader::rowsByNumber(const VSObjectType* type, c
     return rows;
 }
 
-std::vector<VSSamplePtr> VSStoreReader::samples(const VSObjectType* type, const VSPredicate& predicate, int limit,
-                                                const std::vector<VSSortDescriptor>& sort) {
+std::vector<VSSamplePtr> VSStoreReader::samples(const VSObjectType* type, const VSPredicate& predicate,
+                                                int limit, const std::vector<VSSortDescriptor>& sort) {
     refuseUnknownKeys(sort);
     const bool byNumber = sort.empty() || sort.front().key == VSObjectSortIdentifierDataID;
     const bool hasDates = predicate.startDate || predicate.endDate;
@@ -213,7 +237,8 @@ std::vector<VSSamplePtr> VSStoreReader::samples(const VSObjectType* type, const 
     if (byNumber && !hasDates) {
         rows = rowsByNumber(type, predicate, limit, sort.empty() || sort.front().ascending);
     } else {
-        rows = firstRows(type, predicate, byNumber ? 0 : limit, byNumber ? VSSortDescriptor{VSSampleSortIdentifierStartDate, true} : sort.front());
+        rows = firstRows(type, predicate, byNumber ? 0 : limit,
+                         byNumber ? VSSortDescriptor{VSSampleSortIdentifierStartDate, true} : sort.front());
     }
     std::sort(rows.begin(), rows.end(), RowOrder(sort));
     if (limit > 0 && rows.size() > static_cast<size_t>(limit)) rows.resize(static_cast<size_t>(limit));
@@ -231,43 +256,54 @@ VSSamplePtr VSStoreReader::object(const VSObjectType* type, const VSSampleRow& r
     const VSObjectID id{row.id};
     switch (type->kind()) {
         case VSTypeKind::Quantity:
-            return std::make_shared<VSQuantitySample>(type, VSQuantity(type->canonicalUnit(), row.value), start, end, std::move(provenance), id);
+            return std::make_shared<VSQuantitySample>(type, VSQuantity(type->canonicalUnit(), row.value),
+                                                      start, end, std::move(provenance), id);
         case VSTypeKind::Category:
-            return std::make_shared<VSCategorySample>(type, static_cast<int>(row.value), start, end, std::move(provenance), id);
+            return std::make_shared<VSCategorySample>(type, static_cast<int>(row.value), start, end,
+                                                      std::move(provenance), id);
         case VSTypeKind::Workout: {
             static const VSUnit metre = VSUnit::fromString("m");
             auto details = database_.use("SELECT duration, energy, distance FROM workouts WHERE workout = ?");
             details.bind(1, row.id);
-            if (!details.step()) throw VSDatabaseFailure({VSErrorCode::Corrupt, "a workout of the store has lost its details"});
+            if (!details.step())
+                throw VSDatabaseFailure(
+                    {VSErrorCode::Corrupt, "a workout of the store has lost its details"});
             std::optional<VSQuantity> energy, distance;
             if (!details.isNull(1)) energy = VSQuantity(VSUnit::kilocalorieUnit(), details.real(1));
             if (!details.isNull(2)) distance = VSQuantity(metre, details.real(2));
             std::vector<VSWorkoutEvent> events;
-            auto rows = database_.use("SELECT type, date FROM workout_events WHERE workout = ? ORDER BY position");
+            auto rows =
+                database_.use("SELECT type, date FROM workout_events WHERE workout = ? ORDER BY position");
             rows.bind(1, row.id);
             while (rows.step()) {
                 VSWorkoutEvent event{static_cast<int>(rows.integer(0)), std::nullopt};
                 if (!rows.isNull(1)) event.date = VSDate::fromMicroseconds(rows.integer(1));
                 events.push_back(event);
             }
-            return std::make_shared<VSWorkout>(static_cast<int>(row.value), start, end, VSDuration(details.integer(0)), energy, distance,
+            return std::make_shared<VSWorkout>(static_cast<int>(row.value), start, end,
+                                               VSDuration(details.integer(0)), energy, distance,
                                                std::move(events), std::move(provenance), id);
         }
         case VSTypeKind::Correlation: {
             std::vector<VSSamplePtr> members;
             for (const VSMemberKey& key : matcher_.members(row.id)) {
                 VSSampleRow member;
-                if (!matcher_.row(key, member)) throw VSDatabaseFailure({VSErrorCode::Corrupt, "a correlation of the store has lost a member"});
+                if (!matcher_.row(key, member))
+                    throw VSDatabaseFailure(
+                        {VSErrorCode::Corrupt, "a correlation of the store has lost a member"});
                 members.push_back(object(key.type, member));
             }
-            return std::make_shared<VSCorrelation>(type, start, end, std::move(members), std::move(provenance), id);
+            return std::make_shared<VSCorrelation>(type, start, end, std::move(members),
+                                                   std::move(provenance), id);
         }
-        case VSTypeKind::Characteristic: break;
+        case VSTypeKind::Characteristic:
+            break;
     }
     throw VSDatabaseFailure({VSErrorCode::Corrupt, "the store has samples of a type that has none"});
 }
 
-VSAnchoredObjectQuery::Answer VSStoreReader::changes(const VSObjectType* type, const VSPredicate& predicate, VSQueryAnchor anchor, int limit) {
+VSAnchoredObjectQuery::Answer VSStoreReader::changes(const VSObjectType* type, const VSPredicate& predicate,
+                                                     VSQueryAnchor anchor, int limit) {
     VSAnchoredObjectQuery::Answer answer;
     const int64_t last = lastNumber();
     if (anchor.value >= last) {  // an anchor beyond all objects means now
@@ -277,7 +313,9 @@ VSAnchoredObjectQuery::Answer VSStoreReader::changes(const VSObjectType* type, c
     const VSDateFilter filter(predicate);
     Conditions conditions(*this, predicate);
     int64_t reached = last;
-    auto added = database_.use("SELECT " VS_SAMPLE_COLUMNS " FROM samples INDEXED BY samples_by_id WHERE type = ? AND id > ? ORDER BY id");
+    auto added =
+        database_.use("SELECT " VS_SAMPLE_COLUMNS
+                      " FROM samples INDEXED BY samples_by_id WHERE type = ? AND id > ? ORDER BY id");
     added.bind(1, codeOf(type)).bind(2, anchor.value);
     scanRows(added, [&](const VSSampleRow& row) {
         if (!filter.matches(row.start, row.duration) || !conditions.match(row)) return true;
@@ -287,7 +325,9 @@ VSAnchoredObjectQuery::Answer VSStoreReader::changes(const VSObjectType* type, c
         return false;
     });
     // Of objects that came and went since the anchor nothing is told.
-    auto deleted = database_.use("SELECT id FROM deleted WHERE type = ?1 AND change > ?2 AND change <= ?3 AND id <= ?2 ORDER BY change");
+    auto deleted = database_.use(
+        "SELECT id FROM deleted WHERE type = ?1 AND change > ?2 AND change <= ?3 AND id <= ?2 ORDER BY "
+        "change");
     deleted.bind(1, codeOf(type)).bind(2, anchor.value).bind(3, reached);
     while (deleted.step()) answer.deleted.push_back({VSObjectID{deleted.integer(0)}, type});
     answer.anchor = {reached};
@@ -303,7 +343,8 @@ std::vector<VSSource> VSStoreReader::sources(const VSObjectType* type, const VSP
         if (!found) {
             VSPredicate ofSource = predicate;
             ofSource.sources = {candidate};
-            if (!predicate.sources.empty() && std::find(predicate.sources.begin(), predicate.sources.end(), candidate) == predicate.sources.end())
+            if (!predicate.sources.empty() && std::find(predicate.sources.begin(), predicate.sources.end(),
+                                                        candidate) == predicate.sources.end())
                 continue;
             scan(type, ofSource, true, [&](const VSSampleRow&) {
                 found = true;
@@ -318,7 +359,8 @@ std::vector<VSSource> VSStoreReader::sources(const VSObjectType* type, const VSP
 std::vector<int64_t> VSStoreReader::orderedSources(const VSObjectType* type) {
     std::vector<int64_t> order;
     auto chosen = database_.use(
-        "SELECT source FROM source_order WHERE type = ?1 AND source IN (SELECT source FROM type_sources WHERE type = ?1) ORDER BY position");
+        "SELECT source FROM source_order WHERE type = ?1 AND source IN (SELECT source FROM type_sources "
+        "WHERE type = ?1) ORDER BY position");
     chosen.bind(1, codeOf(type));
     while (chosen.step()) order.push_back(chosen.integer(0));
     const bool userChose = !order.empty();
@@ -326,22 +368,26 @@ std::vector<int64_t> VSStoreReader::orderedSources(const VSObjectType* type) {
     auto rest = database_.use("SELECT source FROM type_sources WHERE type = ? ORDER BY first_start, source");
     rest.bind(1, codeOf(type));
     while (rest.step()) {
-        if (std::find(order.begin(), order.end(), rest.integer(0)) == order.end()) others.push_back(rest.integer(0));
+        if (std::find(order.begin(), order.end(), rest.integer(0)) == order.end())
+            others.push_back(rest.integer(0));
     }
     if (!userChose)
-        std::stable_partition(others.begin(), others.end(), [&](int64_t id) { return provenances_.source(id).isApplication(); });
+        std::stable_partition(others.begin(), others.end(),
+                              [&](int64_t id) { return provenances_.source(id).isApplication(); });
     order.insert(order.end(), others.begin(), others.end());
     return order;
 }
 
 VSStoreReader::Extent VSStoreReader::extent(const VSObjectType* type, int64_t source) {
-    auto row = database_.use("SELECT count, first_start, last_end FROM type_sources WHERE type = ? AND source = ?");
+    auto row =
+        database_.use("SELECT count, first_start, last_end FROM type_sources WHERE type = ? AND source = ?");
     if (!row.bind(1, codeOf(type)).bind(2, source).step()) return {};
     return {row.integer(0), row.integer(1), row.integer(2)};
 }
 
 VSStoreReader::Extent VSStoreReader::extent(const VSObjectType* type) {
-    auto row = database_.use("SELECT sum(count), min(first_start), max(last_end) FROM type_sources WHERE type = ?");
+    auto row =
+        database_.use("SELECT sum(count), min(first_start), max(last_end) FROM type_sources WHERE type = ?");
     if (!row.bind(1, codeOf(type)).step() || row.isNull(0)) return {};
     return {row.integer(0), row.integer(1), row.integer(2)};
 }

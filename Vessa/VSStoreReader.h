@@ -15,7 +15,7 @@
 
 /// The date part of a predicate in microseconds.
 class VSDateFilter {
-   public:
+ public:
     explicit VSDateFilter(const VSPredicate& predicate);
     bool matches(int64_t start, int64_t duration) const {
         if (start >= startsBefore_ || (strictEnd_ && start + duration > end_)) return false;
@@ -28,7 +28,7 @@ class VSDateFilter {
     /// No sample that starts here or later matches.
     int64_t startsBefore() const { return startsBefore_; }
 
-   private:
+ private:
     int64_t start_ = INT64_MIN, end_ = INT64_MAX, startsBefore_ = INT64_MAX;
     bool strictStart_ = false, strictEnd_ = false;
 };
@@ -36,24 +36,28 @@ class VSDateFilter {
 /// Answers from one connection. Every public operation is one snapshot when called inside a read transaction.
 /// Used by one thread at a time. Throws VSDatabaseFailure.
 class VSStoreReader {
-   public:
+ public:
     explicit VSStoreReader(VSDatabase& database);
 
     std::vector<VSSamplePtr> samples(const VSObjectType* type, const VSPredicate& predicate, int limit,
                                      const std::vector<VSSortDescriptor>& sort);
-    VSAnchoredObjectQuery::Answer changes(const VSObjectType* type, const VSPredicate& predicate, VSQueryAnchor anchor, int limit);
+    VSAnchoredObjectQuery::Answer changes(const VSObjectType* type, const VSPredicate& predicate,
+                                          VSQueryAnchor anchor, int limit);
     std::vector<VSSource> sources(const VSObjectType* type, const VSPredicate& predicate);
     /// The numbers of the sources of a type, in the order in which they count.
     std::vector<int64_t> orderedSources(const VSObjectType* type);
 
-    struct Extent { int64_t count = 0, firstStart = INT64_MAX, lastEnd = INT64_MIN; };
+    struct Extent {
+        int64_t count = 0, firstStart = INT64_MAX, lastEnd = INT64_MIN;
+    };
     /// Of one source of a type; a count of 0: it has none.
     Extent extent(const VSObjectType* type, int64_t source);
     Extent extent(const VSObjectType* type);
 
-    /// Calls block(row) for every sample that matches, in ascending or descending order of its start (and number),
-    /// until it returns false.
-    void scan(const VSObjectType* type, const VSPredicate& predicate, bool ascending, const std::function<bool(const VSSampleRow&)>& block);
+    /// Calls block(row) for every sample that matches, in ascending or descending order of its start (and
+    /// number), until it returns false.
+    void scan(const VSObjectType* type, const VSPredicate& predicate, bool ascending,
+              const std::function<bool(const VSSampleRow&)>& block);
     VSSamplePtr object(const VSObjectType* type, const VSSampleRow& row);
     int64_t longest(const VSObjectType* type);
     /// The number of the last change of each type.
@@ -64,13 +68,15 @@ class VSStoreReader {
     VSDatabase& database() { return database_; }
     VSStoreProvenances& provenances() { return provenances_; }
 
-   private:
+ private:
     /// All but the dates of a predicate, answered once per provenance and metadata.
     class Conditions;
     template <typename Accept>
     bool scanRows(VSStatement& rows, Accept accept);
-    std::vector<VSSampleRow> firstRows(const VSObjectType* type, const VSPredicate& predicate, int limit, const VSSortDescriptor& key);
-    std::vector<VSSampleRow> rowsByNumber(const VSObjectType* type, const VSPredicate& predicate, int limit, bool ascending);
+    std::vector<VSSampleRow> firstRows(const VSObjectType* type, const VSPredicate& predicate, int limit,
+                                       const VSSortDescriptor& key);
+    std::vector<VSSampleRow> rowsByNumber(const VSObjectType* type, const VSPredicate& predicate, int limit,
+                                          bool ascending);
 
     VSDatabase& database_;
     VSStoreProvenances provenances_;

@@ -125,18 +125,22 @@ CREATE TABLE medical_id(
     picture BLOB);
 )sql";
 
-constexpr const char* tableNames[] = {"state", "types", "sources", "devices", "provenances", "metadata", "samples", "members",
-                                      "workouts", "workout_events", "deleted", "type_sources", "rollups", "source_order",
-                                      "batches", "defaults", "characteristics", "medical_id"};
+constexpr const char* tableNames[] = {
+    "state",   "types",        "sources",  "devices",        "provenances",     "metadata",
+    "samples", "members",      "workouts", "workout_events", "deleted",         "type_sources",
+    "rollups", "source_order", "batches",  "defaults",       "characteristics", "medical_id"};
 
-[[noreturn]] void refuse(VSErrorCode code, std::string message) { throw VSDatabaseFailure({code, std::move(message)}); }
+[[noreturn]] void refuse(VSErrorCode code, std::string message) {
+    throw VSDatabaseFailure({code, std::move(message)});
+}
 
 void makeFolder(const std::filesystem::path& folder) {
     std::error_code error;
     if (std::filesystem::is_directory(folder, error)) return;
     if (folder.has_parent_path()) std::filesystem::create_directories(folder.parent_path(), error);
     if (::mkdir(folder.c_str(), 0700) != 0 && errno != EEXIST)
-        refuse(VSErrorCode::NotAccessible, "the folder " + folder.string() + " cannot be made: " + std::strerror(errno));
+        refuse(VSErrorCode::NotAccessible,
+               "the folder " + folder.string() + " cannot be made: " + std::strerror(errno));
 }
 
 /// SQLite gives its other files the rights of this one.
@@ -165,7 +169,8 @@ int versionOf(VSDatabase& database, const std::filesystem::path& file) {
     if (identity != VSStoreSchema::applicationID)
         refuse(VSErrorCode::Refused, file.string() + " is a database of another program");
     if (version > VSStoreSchema::currentVersion)
-        refuse(VSErrorCode::Refused, file.string() + " was written by a newer version of this program (its format is " +
+        refuse(VSErrorCode::Refused, file.string() +
+                                         " was written by a newer version of this program (its format is " +
                                          std::to_string(version) + ", this program knows " +
                                          std::to_string(VSStoreSchema::currentVersion) + ")");
     if (version < 1) refuse(VSErrorCode::Corrupt, file.string() + " has no valid format number");
@@ -188,8 +193,10 @@ void createTables(VSDatabase& database, const std::filesystem::path& file) {
     try {
         if (versionOf(database, file) == 0) {  // else another process was faster
             database.execute(tables);
-            database.execute(("PRAGMA application_id = " + std::to_string(VSStoreSchema::applicationID)).c_str());
-            database.execute(("PRAGMA user_version = " + std::to_string(VSStoreSchema::currentVersion)).c_str());
+            database.execute(
+                ("PRAGMA application_id = " + std::to_string(VSStoreSchema::applicationID)).c_str());
+            database.execute(
+                ("PRAGMA user_version = " + std::to_string(VSStoreSchema::currentVersion)).c_str());
         }
         database.execute("COMMIT");
     } catch (const VSDatabaseFailure&) {
@@ -204,10 +211,13 @@ void createTables(VSDatabase& database, const std::filesystem::path& file) {
 
 /// Migrations to come stand here: step n brings version n to n + 1.
 void migrate(VSDatabase&, const std::filesystem::path& file, int version) {
-    refuse(VSErrorCode::Refused, file.string() + " has the format " + std::to_string(version) + ", which nothing migrates");
+    refuse(VSErrorCode::Refused,
+           file.string() + " has the format " + std::to_string(version) + ", which nothing migrates");
 }
 
-void configure(VSDatabase& database) { database.execute("PRAGMA cache_size = -16384; PRAGMA temp_store = MEMORY;"); }
+void configure(VSDatabase& database) {
+    database.execute("PRAGMA cache_size = -16384; PRAGMA temp_store = MEMORY;");
+}
 
 void configureForWriting(VSDatabase& database, bool survivesPowerLoss) {
     // Full: a commit is on the disk before it is acknowledged.
@@ -217,8 +227,9 @@ void configureForWriting(VSDatabase& database, bool survivesPowerLoss) {
 
 }  // namespace
 
-std::unique_ptr<VSDatabase> VSStoreSchema::openForWriting(const std::filesystem::path& folder, bool createIfMissing,
-                                                          bool survivesPowerLoss, VSDuration patience) {
+std::unique_ptr<VSDatabase> VSStoreSchema::openForWriting(const std::filesystem::path& folder,
+                                                          bool createIfMissing, bool survivesPowerLoss,
+                                                          VSDuration patience) {
     const auto file = folder / fileName;
     if (!fileExists(file)) {
         if (!createIfMissing) refuse(VSErrorCode::NotAccessible, "there is no store in " + folder.string());
@@ -226,7 +237,8 @@ std::unique_ptr<VSDatabase> VSStoreSchema::openForWriting(const std::filesystem:
         makeFile(file);
     }
     auto database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::Write, patience);
-    if (database->isReadOnly()) refuse(VSErrorCode::NotAccessible, "the store " + file.string() + " cannot be written to");
+    if (database->isReadOnly())
+        refuse(VSErrorCode::NotAccessible, "the store " + file.string() + " cannot be written to");
     int version = versionOf(*database, file);
     if (version == 0) {
         createTables(*database, file);
@@ -238,14 +250,18 @@ std::unique_ptr<VSDatabase> VSStoreSchema::openForWriting(const std::filesystem:
         mode.reset();
         auto change = database->use("PRAGMA journal_mode = WAL");
         if (!change.step() || change.text(0) != "wal")
-            refuse(VSErrorCode::NotAccessible, "the store " + file.string() + " cannot use a write-ahead log where it lies");
+            refuse(VSErrorCode::NotAccessible,
+                   "the store " + file.string() + " cannot use a write-ahead log where it lies");
     }
     configure(*database);
     configureForWriting(*database, survivesPowerLoss);
+    // A connection that has not used the log would not move it into the file when it closes last.
+    database->integer("SELECT last FROM state");
     return database;
 }
 
-std::unique_ptr<VSDatabase> VSStoreSchema::openForReading(const std::filesystem::path& folder, VSDuration patience) {
+std::unique_ptr<VSDatabase> VSStoreSchema::openForReading(const std::filesystem::path& folder,
+                                                          VSDuration patience) {
     const auto file = folder / fileName;
     if (!fileExists(file)) refuse(VSErrorCode::NotAccessible, "there is no store in " + folder.string());
     auto database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::Read, patience);
@@ -253,11 +269,14 @@ std::unique_ptr<VSDatabase> VSStoreSchema::openForReading(const std::filesystem:
     try {
         version = versionOf(*database, file);
     } catch (const VSDatabaseFailure& failure) {
-        // A write-ahead log needs its index file. Where the folder cannot be written to and no log is left, the
-        // file alone is complete and nobody can change it.
+        // A write-ahead log needs its index file. Where the folder cannot be written to and no log is left,
+        // the file alone is complete and nobody can change it.
         std::error_code ignored;
-        const bool emptyLog = !fileExists(file.string() + "-wal") || std::filesystem::file_size(file.string() + "-wal", ignored) == 0;
-        if (failure.error().code != VSErrorCode::NotAccessible || ::access(folder.c_str(), W_OK) == 0 || !emptyLog) throw;
+        const bool emptyLog = !fileExists(file.string() + "-wal") ||
+                              std::filesystem::file_size(file.string() + "-wal", ignored) == 0;
+        if (failure.error().code != VSErrorCode::NotAccessible || ::access(folder.c_str(), W_OK) == 0 ||
+            !emptyLog)
+            throw;
         database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::ReadImmutable, patience);
         version = versionOf(*database, file);
     }

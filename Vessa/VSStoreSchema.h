@@ -6,7 +6,8 @@
 #include "Vessa/Base/VSError.h"
 #include "Vessa/VSDatabase.h"
 
-/// The tables of the store, described in docs/store-format.md. Numbers here are on disk: never change or reuse them.
+/// The tables of the store, described in docs/store-format.md. Numbers here are on disk: never change or
+/// reuse them.
 namespace VSStoreSchema {
 
 inline constexpr int32_t applicationID = 0x56455353;  // "VESS"
@@ -24,11 +25,12 @@ static_assert(longSpan.count() == 172800000000);
 inline constexpr VSDate earliestDate = VSDate::fromSeconds(-62'135'596'800);
 inline constexpr VSDate latestDate = VSDate::fromSeconds(253'402'300'799);
 
-/// Makes the folder and the empty database file (readable by the user only) where they are missing, then opens the
-/// file, makes the tables of a new one, migrates an older one. Throws VSDatabaseFailure: Refused for another program's
-/// or a newer database, Corrupt for a damaged file, NotAccessible where it cannot be opened for writing.
-std::unique_ptr<VSDatabase> openForWriting(const std::filesystem::path& folder, bool createIfMissing, bool survivesPowerLoss,
-                                           VSDuration patience);
+/// Makes the folder and the empty database file (readable by the user only) where they are missing, then
+/// opens the file, makes the tables of a new one, migrates an older one. Throws VSDatabaseFailure: Refused
+/// for another program's or a newer database, Corrupt for a damaged file, NotAccessible where it cannot be
+/// opened for writing.
+std::unique_ptr<VSDatabase> openForWriting(const std::filesystem::path& folder, bool createIfMissing,
+                                           bool survivesPowerLoss, VSDuration patience);
 /// The same without any change to the disk.
 std::unique_ptr<VSDatabase> openForReading(const std::filesystem::path& folder, VSDuration patience);
 

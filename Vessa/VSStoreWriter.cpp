@@ -7,28 +7,36 @@
 
 namespace {
 
-int codeOf(const VSObjectType* type) { return VSTypeCodeValue(type->code()); }
+int codeOf(const VSObjectType* type) {
+    return VSTypeCodeValue(type->code());
+}
 
 std::optional<VSError> objectionToTotals(const VSWorkout& workout) {
     static const VSUnit metre = VSUnit::fromString("m");
     const auto bad = [](const std::optional<VSQuantity>& total, const VSUnit& unit) {
         return total && (!total->isCompatibleWith(unit) || !std::isfinite(total->doubleValueForUnit(unit)));
     };
-    if (bad(workout.totalEnergyBurned(), VSUnit::kilocalorieUnit())) return VSError{VSErrorCode::Invalid, "a workout's energy is no amount of energy"};
-    if (bad(workout.totalDistance(), metre)) return VSError{VSErrorCode::Invalid, "a workout's distance is no length"};
-    if (workout.duration() < VSDuration(0)) return VSError{VSErrorCode::Invalid, "a workout's duration is negative"};
+    if (bad(workout.totalEnergyBurned(), VSUnit::kilocalorieUnit()))
+        return VSError{VSErrorCode::Invalid, "a workout's energy is no amount of energy"};
+    if (bad(workout.totalDistance(), metre))
+        return VSError{VSErrorCode::Invalid, "a workout's distance is no length"};
+    if (workout.duration() < VSDuration(0))
+        return VSError{VSErrorCode::Invalid, "a workout's duration is negative"};
     return std::nullopt;
 }
 
 /// What the values and the kind of object say against it.
 std::optional<VSError> objectionToContent(const VSSample& sample) {
     const VSObjectType& type = *sample.sampleType();
-    const auto invalid = [&](const std::string& why) { return VSError{VSErrorCode::Invalid, type.identifier() + ": " + why}; };
+    const auto invalid = [&](const std::string& why) {
+        return VSError{VSErrorCode::Invalid, type.identifier() + ": " + why};
+    };
     if (type.isQuantityType()) {
         const auto* object = dynamic_cast<const VSQuantitySample*>(&sample);
         if (!object) return invalid("needs a quantity sample");
         if (!object->quantity().isCompatibleWith(type.canonicalUnit()))
-            return invalid("the unit " + object->quantity().unit().unitString() + " does not convert to " + type.canonicalUnit().unitString());
+            return invalid("the unit " + object->quantity().unit().unitString() + " does not convert to " +
+                           type.canonicalUnit().unitString());
         if (!std::isfinite(VSStoredValue(sample))) return invalid("the value is not a finite number");
         return std::nullopt;
     }
@@ -62,8 +70,9 @@ VSStoreWriter::VSStoreWriter(VSDatabase& database)
       metadata_(database),
       matcher_(database, provenances_, metadata_),
       rollups_(database),
-      insert_(database.use("INSERT INTO samples(type, start, id, duration, value, provenance, created, metadata)"
-                           " VALUES (?, ?, ?, ?, ?, ?, ?, ?)")) {}
+      insert_(
+          database.use("INSERT INTO samples(type, start, id, duration, value, provenance, created, metadata)"
+                       " VALUES (?, ?, ?, ?, ?, ?, ?, ?)")) {}
 
 void VSStoreWriter::begin() {
     if (database_.othersHaveCommitted()) {
@@ -97,8 +106,11 @@ void VSStoreWriter::finish() {
 
 std::optional<VSError> VSStoreWriter::objection(const VSSample& sample) {
     const VSObjectType* type = sample.sampleType();
-    if (!type || !type->isSampleType()) return VSError{VSErrorCode::Invalid, "an object has no type of which samples are kept"};
-    const auto invalid = [&](const char* why) { return VSError{VSErrorCode::Invalid, type->identifier() + ": " + why}; };
+    if (!type || !type->isSampleType())
+        return VSError{VSErrorCode::Invalid, "an object has no type of which samples are kept"};
+    const auto invalid = [&](const char* why) {
+        return VSError{VSErrorCode::Invalid, type->identifier() + ": " + why};
+    };
     if (sample.startDate() > sample.endDate()) return invalid("ends before it starts");
     if (sample.startDate() < VSStoreSchema::earliestDate || sample.endDate() > VSStoreSchema::latestDate)
         return invalid("lies outside of the years 1 to 9999");
@@ -116,10 +128,17 @@ int64_t VSStoreWriter::insertAlone(const VSSample& sample, VSDate now) {
     const int64_t provenance = provenances_.provenanceFor(sample.provenance());
     const int64_t metadata = metadata_.retain(sample.provenance().metadata);
     const int64_t id = ++last_;
-    insert_.bind(1, type).bind(2, start).bind(3, id).bind(4, duration).bindNumber(5, value).bind(6, provenance);
+    insert_.bind(1, type)
+        .bind(2, start)
+        .bind(3, id)
+        .bind(4, duration)
+        .bindNumber(5, value)
+        .bind(6, provenance);
     insert_.bind(7, sample.creationDate().value_or(now).microseconds() - start);
-    if (metadata) insert_.bind(8, metadata);
-    else insert_.bindNull(8);
+    if (metadata)
+        insert_.bind(8, metadata);
+    else
+        insert_.bindNull(8);
     insert_.run();
 
     TypeState& state = types_[static_cast<size_t>(type)];
@@ -145,7 +164,8 @@ int64_t VSStoreWriter::insert(const VSSample& sample, VSDate now) {
         members.push_back({object->sampleType(), object->startDate().microseconds(), id});
     }
     const int64_t id = insertAlone(sample, now);
-    for (size_t index = 0; index < members.size(); ++index) insertMember(id, static_cast<int>(index), members[index]);
+    for (size_t index = 0; index < members.size(); ++index)
+        insertMember(id, static_cast<int>(index), members[index]);
     return id;
 }
 
@@ -161,14 +181,17 @@ void VSStoreWriter::insertMember(int64_t parent, int position, const VSMemberKey
 
 void VSStoreWriter::insertWorkout(int64_t id, const VSWorkout& workout) {
     static const VSUnit metre = VSUnit::fromString("m");
-    auto insert = database_.use("INSERT INTO workouts(workout, duration, energy, distance) VALUES (?, ?, ?, ?)");
+    auto insert =
+        database_.use("INSERT INTO workouts(workout, duration, energy, distance) VALUES (?, ?, ?, ?)");
     insert.bind(1, id).bind(2, workout.duration().count());
-    if (workout.totalEnergyBurned()) insert.bindNumber(3, workout.totalEnergyBurned()->doubleValueForUnit(VSUnit::kilocalorieUnit()));
+    if (workout.totalEnergyBurned())
+        insert.bindNumber(3, workout.totalEnergyBurned()->doubleValueForUnit(VSUnit::kilocalorieUnit()));
     if (workout.totalDistance()) insert.bindNumber(4, workout.totalDistance()->doubleValueForUnit(metre));
     insert.run();
     int position = 0;
     for (const VSWorkoutEvent& event : workout.workoutEvents()) {
-        auto row = database_.use("INSERT INTO workout_events(workout, position, type, date) VALUES (?, ?, ?, ?)");
+        auto row =
+            database_.use("INSERT INTO workout_events(workout, position, type, date) VALUES (?, ?, ?, ?)");
         row.bind(1, id).bind(2, position++).bind(3, event.type);
         if (event.date) row.bind(4, event.date->microseconds());
         row.run();
@@ -192,11 +215,19 @@ int64_t VSStoreWriter::find(const VSSample& sample) {
 bool VSStoreWriter::remove(const VSObjectType* type, int64_t start, int64_t id) {
     VSSampleRow row;
     if (!matcher_.row({type, start, id}, row)) return false;
-    database_.use("DELETE FROM samples WHERE type = ? AND start = ? AND id = ?").bind(1, codeOf(type)).bind(2, start).bind(3, id).run();
+    database_.use("DELETE FROM samples WHERE type = ? AND start = ? AND id = ?")
+        .bind(1, codeOf(type))
+        .bind(2, start)
+        .bind(3, id)
+        .run();
     removeDetails(id);
     metadata_.release(row.metadata);
     const int64_t change = ++last_;
-    database_.use("INSERT INTO deleted(change, type, id) VALUES (?, ?, ?)").bind(1, change).bind(2, codeOf(type)).bind(3, id).run();
+    database_.use("INSERT INTO deleted(change, type, id) VALUES (?, ?, ?)")
+        .bind(1, change)
+        .bind(2, codeOf(type))
+        .bind(3, id)
+        .run();
     types_[static_cast<size_t>(codeOf(type))].change = change;
     const int64_t source = provenances_.sourceOfProvenance(row.provenance);
     SourceChange& summary = sourceChange(codeOf(type), source);
@@ -216,13 +247,17 @@ void VSStoreWriter::removeDetails(int64_t id) {
 }
 
 int64_t VSStoreWriter::removeAll(const VSObjectType* type, std::optional<std::string> bundleIdentifier) {
-    struct Key { int64_t start, id; };
+    struct Key {
+        int64_t start, id;
+    };
     std::vector<Key> keys;
     {
         auto rows = database_.use("SELECT start, id, provenance FROM samples WHERE type = ?");
         rows.bind(1, codeOf(type));
         while (rows.step()) {
-            if (bundleIdentifier && provenances_.provenance(rows.integer(2)).revision->source.bundleIdentifier != *bundleIdentifier)
+            if (bundleIdentifier &&
+                provenances_.provenance(rows.integer(2)).revision->source.bundleIdentifier !=
+                    *bundleIdentifier)
                 continue;
             keys.push_back({rows.integer(0), rows.integer(1)});
         }
@@ -239,7 +274,9 @@ void VSStoreWriter::addToWorkout(int64_t workout, const VSMemberKey& sample) {
     insertMember(workout, static_cast<int>(next.integer(0)), sample);
 }
 
-void VSStoreWriter::touch(const VSObjectType* type) { types_[static_cast<size_t>(codeOf(type))].change = ++last_; }
+void VSStoreWriter::touch(const VSObjectType* type) {
+    types_[static_cast<size_t>(codeOf(type))].change = ++last_;
+}
 
 VSStoreWriter::SourceChange& VSStoreWriter::sourceChange(int type, int64_t source) {
     const std::pair key{type, source};
@@ -253,7 +290,10 @@ VSStoreWriter::SourceChange& VSStoreWriter::sourceChange(int type, int64_t sourc
 void VSStoreWriter::writeTypes() {
     for (size_t type = 0; type < types_.size(); ++type) {
         if (!types_[type].change) continue;
-        database_.use("INSERT INTO types VALUES (?1, ?2, ?3) ON CONFLICT(type) DO UPDATE SET change = ?2, longest = ?3")
+        database_
+            .use(
+                "INSERT INTO types VALUES (?1, ?2, ?3) ON CONFLICT(type) DO UPDATE SET change = ?2, longest "
+                "= ?3")
             .bind(1, static_cast<int64_t>(type))
             .bind(2, types_[type].change)
             .bind(3, types_[type].longest)
@@ -266,7 +306,12 @@ void VSStoreWriter::writeTypeSources() {
         auto upsert = database_.use(
             "INSERT INTO type_sources VALUES (?1, ?2, ?3, ?4, ?5) ON CONFLICT(type, source) DO UPDATE SET"
             " count = count + ?3, first_start = min(first_start, ?4), last_end = max(last_end, ?5)");
-        upsert.bind(1, key.first).bind(2, key.second).bind(3, change.count).bind(4, change.firstStart).bind(5, change.lastEnd).run();
+        upsert.bind(1, key.first)
+            .bind(2, key.second)
+            .bind(3, change.count)
+            .bind(4, change.firstStart)
+            .bind(5, change.lastEnd)
+            .run();
         if (change.removed) measureAgain(key.first, key.second);
     }
     sourceChanges_.clear();
@@ -274,7 +319,8 @@ void VSStoreWriter::writeTypeSources() {
     database_.use("DELETE FROM type_sources WHERE count <= 0").run();
 }
 
-/// Finds the first start and last end of a source anew, from the first and last day of its rollups and from its long spans.
+/// Finds the first start and last end of a source anew, from the first and last day of its rollups and from
+/// its long spans.
 void VSStoreWriter::measureAgain(int type, int64_t source) {
     int64_t firstStart = INT64_MAX, lastEnd = INT64_MIN;
     const auto consider = [&](VSStatement& rows) {
@@ -291,13 +337,16 @@ void VSStoreWriter::measureAgain(int type, int64_t source) {
         const int64_t longest = types_[static_cast<size_t>(type)].longest;
         for (int column : {0, 1}) {
             const int64_t dayStart = VSRollupDayOfSlot(days.integer(column)) * VSDayMicroseconds;
-            auto rows = database_.use("SELECT start, duration, provenance FROM samples WHERE type = ? AND start >= ? AND start < ?");
+            auto rows = database_.use(
+                "SELECT start, duration, provenance FROM samples WHERE type = ? AND start >= ? AND start < "
+                "?");
             rows.bind(1, type).bind(2, dayStart - longest).bind(3, dayStart + VSDayMicroseconds);
             consider(rows);
         }
     }
     auto longSpans = database_.use(
-        "SELECT start, duration, provenance FROM samples INDEXED BY samples_long WHERE type = ? AND duration > " VS_LONG_SPAN_SQL);
+        "SELECT start, duration, provenance FROM samples INDEXED BY samples_long WHERE type = ? AND duration "
+        "> " VS_LONG_SPAN_SQL);
     longSpans.bind(1, type);
     consider(longSpans);
     if (firstStart == INT64_MAX) return;  // none left: the count says so

@@ -14,10 +14,10 @@
 #include "Vessa/VSStoreProvenances.h"
 
 /// Changes samples and everything that follows from them (order, summaries, rollups) inside one writing
-/// transaction after another: begin, changes, finish, and then the commit; or abandon after a rollback. Used by the
-/// thread of its connection. Throws VSDatabaseFailure.
+/// transaction after another: begin, changes, finish, and then the commit; or abandon after a rollback. Used
+/// by the thread of its connection. Throws VSDatabaseFailure.
 class VSStoreWriter {
-   public:
+ public:
     explicit VSStoreWriter(VSDatabase& database);
 
     /// REQUIRES: the transaction has begun.
@@ -28,12 +28,14 @@ class VSStoreWriter {
 
     /// Why a sample cannot be saved; none: it can.
     static std::optional<VSError> objection(const VSSample& sample);
-    /// Saves a sample without objection; a correlation with those members that are not in the store yet. Returns its number.
+    /// Saves a sample without objection; a correlation with those members that are not in the store yet.
+    /// Returns its number.
     int64_t insert(const VSSample& sample, VSDate now);
     /// A sample of any kind without its members.
     int64_t insertAlone(const VSSample& sample, VSDate now);
     void insertMember(int64_t parent, int position, const VSMemberKey& member);
-    /// The saved object that is meant: the one of its number, or without a number the newest equal one. 0: none.
+    /// The saved object that is meant: the one of its number, or without a number the newest equal one. 0:
+    /// none.
     int64_t find(const VSSample& sample);
     /// False: there is no such object.
     bool remove(const VSObjectType* type, int64_t start, int64_t id);
@@ -50,10 +52,15 @@ class VSStoreWriter {
     VSStoreMatcher& matcher() { return matcher_; }
     VSDatabase& database() { return database_; }
 
-   private:
+ private:
     static constexpr size_t typeCodes = 128;
-    struct TypeState { int64_t change = 0, longest = 0; };
-    struct SourceChange { int64_t count = 0, firstStart = INT64_MAX, lastEnd = INT64_MIN; bool removed = false; };
+    struct TypeState {
+        int64_t change = 0, longest = 0;
+    };
+    struct SourceChange {
+        int64_t count = 0, firstStart = INT64_MAX, lastEnd = INT64_MIN;
+        bool removed = false;
+    };
 
     SourceChange& sourceChange(int type, int64_t source);
     void insertWorkout(int64_t id, const VSWorkout& workout);

@@ -58,7 +58,9 @@ void VSWorkQueue::finish() {
     }
     condition_.notify_all();
     for (std::thread& thread : threads) {
-        if (thread.get_id() == std::this_thread::get_id()) thread.detach();
-        else thread.join();
+        if (thread.get_id() == std::this_thread::get_id())
+            thread.detach();
+        else
+            thread.join();
     }
 }

@@ -10,7 +10,7 @@
 
 /// Jobs in order on a few threads of their own. Any thread.
 class VSWorkQueue {
-   public:
+ public:
     using Job = std::function<void()>;
 
     VSWorkQueue() = default;
@@ -24,11 +24,11 @@ class VSWorkQueue {
     /// No job waits or runs.
     bool isIdle() const;
     bool isOnThread() const;
-    /// Runs what is queued and ends the threads. Called on one of them it does not wait for that one, which goes
-    /// on by itself. Once.
+    /// Runs what is queued and ends the threads. Called on one of them it does not wait for that one, which
+    /// goes on by itself. Once.
     void finish();
 
-   private:
+ private:
     void run();
 
     mutable std::mutex mutex_;

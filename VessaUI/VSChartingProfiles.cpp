@@ -3,8 +3,8 @@
 // How display types are charted, scope by scope (hour, day, week, month, year). The hour scope has no span
 // and no bucket; its style and sizes are those of the day.
 //
-// Sizes: a bucket of the day is about 12 points wide on a phone, of the week 45, of the month 10, of the year
-// 25; markers and ranges stay narrower than that.
+// Sizes: a bucket of the day is about 12 points wide on a phone, of the week 45, of the month 10, of the
+// year 25; markers and ranges stay narrower than that.
 
 namespace {
 
@@ -39,8 +39,8 @@ constexpr VSChartingProfile profile(VSChartStyle style, const std::array<VSChart
             .pointLineWidth = markerLineWidth};
 }
 
-// A day's spans lie in one row or in rows by value: no average of their heights means anything, and the flag
-// holds for all scopes of a display type.
+// A day's spans lie in one row or in rows by value: no average of their heights means anything, and the
+// flag holds for all scopes of a display type.
 constexpr VSChartingProfile withoutAverageLine(VSChartingProfile profile) {
     profile.hideAverageLine = true;
     return profile;

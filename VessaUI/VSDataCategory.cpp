@@ -16,18 +16,19 @@ struct CategoryRow {
     QRgb top, bottom;
 };
 
-// Cards are written on in white: on every gradient white has a contrast of at least 4.5:1 at its lighter end.
+// Cards are written on in white: on every gradient white has a contrast of at least 4.5:1 at its lighter
+// end. The darker end stays near it: bars are overlaid on it, and an overlay lightens a dark colour little.
 constexpr CategoryRow categoryRows[] = {
     {VSCategoryID::BodyMeasurements, "DATA_CATEGORY_BODY_MEASUREMENTS", "category_body_measurements",
-     0xFF96650A, 0xFF6B4306},
-    {VSCategoryID::Fitness, "DATA_CATEGORY_FITNESS", "category_fitness", 0xFFC4460D, 0xFF8E2C0A},
-    {VSCategoryID::Vitals, "DATA_CATEGORY_VITALS", "category_vitals", 0xFFCB2149, 0xFF8E0F35},
-    {VSCategoryID::Nutrition, "DATA_CATEGORY_NUTRITION", "category_nutrition", 0xFF3B7F1D, 0xFF22560F},
-    {VSCategoryID::Results, "DATA_CATEGORY_RESULTS", "category_results", 0xFF8A45C4, 0xFF592A8C},
-    {VSCategoryID::Sleep, "DATA_CATEGORY_SLEEP", "category_sleep", 0xFF4A5BC8, 0xFF293489},
+     0xFF96650A, 0xFF855708},
+    {VSCategoryID::Fitness, "DATA_CATEGORY_FITNESS", "category_fitness", 0xFFC4460D, 0xFFAE3C0C},
+    {VSCategoryID::Vitals, "DATA_CATEGORY_VITALS", "category_vitals", 0xFFCB2149, 0xFFB31A41},
+    {VSCategoryID::Nutrition, "DATA_CATEGORY_NUTRITION", "category_nutrition", 0xFF3B7F1D, 0xFF316F17},
+    {VSCategoryID::Results, "DATA_CATEGORY_RESULTS", "category_results", 0xFF8A45C4, 0xFF763AAE},
+    {VSCategoryID::Sleep, "DATA_CATEGORY_SLEEP", "category_sleep", 0xFF4A5BC8, 0xFF3D4BAF},
     {VSCategoryID::ReproductiveHealth, "DATA_CATEGORY_REPRODUCTIVE_HEALTH", "category_reproductive_health",
-     0xFFB32D96, 0xFF761663},
-    {VSCategoryID::Me, "DATA_CATEGORY_ME", "category_me", 0xFF4B7080, 0xFF2C4855},
+     0xFFB32D96, 0xFF9B2482},
+    {VSCategoryID::Me, "DATA_CATEGORY_ME", "category_me", 0xFF4B7080, 0xFF3F606F},
 };
 
 }  // namespace

@@ -67,7 +67,7 @@ class VSDataUnitGroupController {
     static const VSDataUnitGroupController& shared();
     const std::vector<const VSDataUnitGroup*>& allDataUnitGroups() const;
     const VSDataUnitGroup* dataUnitGroupWithID(int id) const;  // null: unknown
-    /// The display type that shows a data type, or null.
+    /// The display type that shows a data type; null for a meal, which is shown through its nutrients.
     const VSDataUnitGroup* dataUnitGroupForType(const VSObjectType* type) const;
     std::vector<const VSDataUnitGroup*> dataUnitGroupsInCategory(int categoryID) const;
     /// The colour of what can be touched.

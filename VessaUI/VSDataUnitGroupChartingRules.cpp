@@ -56,8 +56,8 @@ double multipleNotBelow(const RoundStep& step, double value) {
 constexpr double stepsInSpan = 6;
 // The share of the span that stays free above and below a line, for its markers.
 constexpr double room = 0.04;
-// A line through data that hardly differ would be drawn as a mountain range: it spans at least this share of
-// the value, and this many of the last digits shown.
+// A line through data that hardly differ would be drawn as a mountain range: it spans at least this share
+// of the value, and this many of the last digits shown.
 constexpr double leastRelativeSpan = 0.02;
 constexpr double leastSpanInLastDigits = 4;
 // What lies nearer to zero is zero, in every unit on offer.

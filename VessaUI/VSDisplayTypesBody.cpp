@@ -20,8 +20,8 @@ std::span<const VSDataUnitGroupRow> VSBodyMeasurementDisplayTypes() {
                     .confirmRange = {11, 60}}},
          .charting = &VSChartingProfiles::Line},
 
-        // Essential fat is about 3 % in men and 12 % in women; above 60 % is seen in the rarest obesity only
-        // (American Council on Exercise, body composition table).
+        // Essential fat is about 3 % in men and 12 % in women; above 60 % is seen in the rarest obesity
+        // only (American Council on Exercise, body composition table).
         {.id = 2,
          .category = VSCategoryID::BodyMeasurements,
          .nameKey = "DISPLAY_TYPE_BODY_FAT_PERCENTAGE",
@@ -33,8 +33,8 @@ std::span<const VSDataUnitGroupRow> VSBodyMeasurementDisplayTypes() {
                     .confirmRange = {3, 60}}},
          .charting = &VSChartingProfiles::Line},
 
-        // Robert Wadlow stood 272 cm tall and Chandra Dangi 54.6 cm; the smallest babies that lived measured
-        // some 25 cm, the usual ones 45 to 55 cm.
+        // Robert Wadlow stood 272 cm tall and Chandra Dangi 54.6 cm; the smallest babies that lived
+        // measured some 25 cm, the usual ones 45 to 55 cm.
         {.id = VSGroupID::Height,
          .category = VSCategoryID::BodyMeasurements,
          .nameKey = "DISPLAY_TYPE_HEIGHT",
@@ -45,9 +45,8 @@ std::span<const VSDataUnitGroupRow> VSBodyMeasurementDisplayTypes() {
                     .confirmRange = {45, 230}}},
          .charting = &VSChartingProfiles::Line},
 
-        // Jon Brower Minnoch weighed about 635 kg; a girl born with 212 g lived (Singapore, 2020). Confirmed
-        // is
-        // what only infants and a few hundred adults weigh.
+        // Jon Brower Minnoch weighed about 635 kg; a girl born with 212 g lived (Singapore, 2020).
+        // Confirmed is what only infants and a few hundred adults weigh.
         {.id = 4,
          .category = VSCategoryID::BodyMeasurements,
          .nameKey = "DISPLAY_TYPE_BODY_MASS",
@@ -59,8 +58,7 @@ std::span<const VSDataUnitGroupRow> VSBodyMeasurementDisplayTypes() {
          .charting = &VSChartingProfiles::Line},
 
         // Weight without fat: 121 kg was the most among sumo wrestlers (Kondo et al., "Upper limit of
-        // fat-free mass in
-        // humans", 1994); the very heaviest people carry more.
+        // fat-free mass in humans", 1994); the very heaviest people carry more.
         {.id = 5,
          .category = VSCategoryID::BodyMeasurements,
          .nameKey = "DISPLAY_TYPE_LEAN_BODY_MASS",
@@ -71,9 +69,8 @@ std::span<const VSDataUnitGroupRow> VSBodyMeasurementDisplayTypes() {
                     .confirmRange = {8, 150}}},
          .charting = &VSChartingProfiles::Line},
 
-        // Walter Hudson measured 302 cm. Beyond 102 cm in men and 88 cm in women the risk of disease is high
-        // (WHO
-        // 2008); a child of one year has about 45 cm.
+        // Walter Hudson measured 302 cm. Beyond 102 cm in men and 88 cm in women the risk of disease is
+        // high (WHO 2008); a child of one year has about 45 cm.
         {.id = 65,
          .category = VSCategoryID::BodyMeasurements,
          .nameKey = "DISPLAY_TYPE_WAIST_CIRCUMFERENCE",

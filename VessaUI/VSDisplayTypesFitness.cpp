@@ -15,8 +15,7 @@ constexpr int stood = 0;  // of the values of stand hours
 std::span<const VSDataUnitGroupRow> VSFitnessDisplayTypes() {
     static const VSDataUnitGroupRow rows[] = {
         // The record over 24 hours, 319.6 km (Aleksandr Sorokin, 2022), is some 300,000 steps; a marathon
-        // about
-        // 42,000 run or 60,000 walked.
+        // about 42,000 run or 60,000 walked.
         {.id = VSGroupID::Steps,
          .category = VSCategoryID::Fitness,
          .nameKey = "DISPLAY_TYPE_STEPS",
@@ -55,9 +54,9 @@ std::span<const VSDataUnitGroupRow> VSFitnessDisplayTypes() {
          .hierarchical = true,
          .unitOnYAxis = true},
 
-        // Mountain stages and polar marches cost 8,000 to 10,000 kcal a day, the hardest races of 24 hours up
-        // to twice
-        // that (see Thurber et al. 2019 on what can be kept up). 5,000 is beyond what amateurs reach.
+        // Mountain stages and polar marches cost 8,000 to 10,000 kcal a day, the hardest races of 24 hours
+        // up to twice that (see Thurber et al. 2019 on what can be kept up). 5,000 is beyond what amateurs
+        // reach.
         {.id = VSGroupID::ActiveEnergy,
          .category = VSCategoryID::Fitness,
          .nameKey = "DISPLAY_TYPE_ACTIVE_ENERGY",
@@ -69,9 +68,8 @@ std::span<const VSDataUnitGroupRow> VSFitnessDisplayTypes() {
          .charting = &VSChartingProfiles::Bars,
          .hierarchical = true},
 
-        // A body of 200 kg rests at about 3,000 kcal a day and one of 635 kg below 8,000 by the equations of
-        // Mifflin
-        // and St Jeor; an entry may cover an hour, so there is no lower limit.
+        // A body of 200 kg rests at about 3,000 kcal a day and one of 635 kg below 8,000 by the equations
+        // of Mifflin and St Jeor; an entry may cover an hour, so there is no lower limit.
         {.id = 9,
          .category = VSCategoryID::Fitness,
          .nameKey = "DISPLAY_TYPE_RESTING_ENERGY",
@@ -84,8 +82,7 @@ std::span<const VSDataUnitGroupRow> VSFitnessDisplayTypes() {
          .hierarchical = true},
 
         // A floor is 3 m. 24 hours of stair climbing brings up to 20,000 m, 7,000 floors; the tallest
-        // building
-        // has 163, and 300 is the climb of a mountain.
+        // building has 163, and 300 is the climb of a mountain.
         {.id = VSGroupID::FlightsClimbed,
          .category = VSCategoryID::Fitness,
          .nameKey = "DISPLAY_TYPE_FLIGHTS_CLIMBED",
@@ -109,8 +106,7 @@ std::span<const VSDataUnitGroupRow> VSFitnessDisplayTypes() {
          .groupIcon = "nikefuel"},
 
         // Hours of the day in which the person stood for a while, told by a watch. The day shows both rows,
-        // stood and
-        // idle; every total counts the hours stood.
+        // stood and idle; every total counts the hours stood.
         {.id = VSGroupID::StandHours,
          .category = VSCategoryID::Fitness,
          .nameKey = "DISPLAY_TYPE_STAND_HOURS",

@@ -3,10 +3,10 @@
 // Display types of the category of nutrition. IDs are kept on disk and never reused.
 //
 // The ranges are of one entry. Where the comment names no other source, the daily need (RDA, or AI where
-// there is none) and the tolerable upper intake (UL) of adults are those of the Dietary Reference Intakes of
-// the US National Academies. An entry is asked about when it is several times a whole day's upper intake or
-// more than the strongest single dose in use; it is refused when no body could take it up: then a unit was
-// mistaken (milligrams typed for micrograms).
+// there is none) and the tolerable upper intake (UL) of adults are those of the Dietary Reference Intakes
+// of the US National Academies. An entry is asked about when it is several times a whole day's upper intake
+// or more than the strongest single dose in use; it is refused when no body could take it up: then a unit
+// was mistaken (milligrams typed for micrograms).
 
 namespace {
 using namespace VSUnitChoices;
@@ -46,9 +46,8 @@ std::span<const VSDataUnitGroupRow> VSNutritionDisplayTypes() {
         // 0.8 g per kilogram a day; a kilogram of meat holds 250 g.
         nutrient(28, "DISPLAY_TYPE_PROTEIN", "DietaryProtein", Grams, 250, 2500),
 
-        // Retinol equivalents. RDA 900, UL 3,000; 100 g of beef liver hold 5,000 to 10,000, the prophylactic
-        // dose of
-        // the WHO 60,000.
+        // Retinol equivalents. RDA 900, UL 3,000; 100 g of beef liver hold 5,000 to 10,000, the
+        // prophylactic dose of the WHO 60,000.
         nutrient(29, "DISPLAY_TYPE_VITAMIN_A", "DietaryVitaminA", Micrograms, 15000, 1000000),
         // RDA 1.2; tablets of 300.
         nutrient(39, "DISPLAY_TYPE_THIAMIN", "DietaryThiamin", FineMilligrams, 500, 10000),
@@ -84,8 +83,7 @@ std::span<const VSDataUnitGroupRow> VSNutritionDisplayTypes() {
         // RDA 0.9, UL 10.
         nutrient(48, "DISPLAY_TYPE_COPPER", "DietaryCopper", FineMilligrams, 20, 1000),
         // RDA 150, UL 1,100; seaweed of several thousand; tablets of 100,000 protect the thyroid after a
-        // reactor
-        // accident (WHO).
+        // reactor accident (WHO).
         nutrient(46, "DISPLAY_TYPE_IODINE", "DietaryIodine", Micrograms, 3000, 500000),
         // RDA 8 to 18, UL 45; 200 are prescribed, 60 mg per kilogram of body weight kill.
         nutrient(37, "DISPLAY_TYPE_IRON", "DietaryIron", FineMilligrams, 200, 10000),
@@ -108,8 +106,8 @@ std::span<const VSDataUnitGroupRow> VSNutritionDisplayTypes() {
 
         // 200 mg at once and 400 a day are held to be safe (EFSA 2015); 10 g kill.
         nutrient(55, "DISPLAY_TYPE_CAFFEINE", "DietaryCaffeine", Milligrams, 600, 10000),
-        // A healthy kidney passes 800 to 1,000 mL an hour; more than that kept up for hours thins the blood's
-        // salt.
+        // A healthy kidney passes 800 to 1,000 mL an hour; more than that kept up for hours thins the
+        // blood's salt.
         nutrient(VSGroupID::Water, "DISPLAY_TYPE_WATER", "DietaryWater", Drink, 3000, 20000),
     };
     return rows;

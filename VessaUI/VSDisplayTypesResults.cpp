@@ -10,8 +10,7 @@ constexpr double open = VSRowRange::open;
 std::span<const VSDataUnitGroupRow> VSResultsDisplayTypes() {
     static const VSDataUnitGroupRow rows[] = {
         // 2,656 mg/dL (147.6 mmol/L) was survived (M. P. Buonocore, 2008). Meters at home read 20 to 600;
-        // below 40 and
-        // above 500 a person is as a rule too ill to type.
+        // below 40 and above 500 a person is as a rule too ill to type.
         {.id = 14,
          .category = VSCategoryID::Results,
          .nameKey = "DISPLAY_TYPE_BLOOD_GLUCOSE",
@@ -24,8 +23,7 @@ std::span<const VSDataUnitGroupRow> VSResultsDisplayTypes() {
          .confirmUnitChange = true},
 
         // In per cent, grams in a decilitre. 0.4 kills half of those who reach it; 1.48 was measured in a
-        // driver
-        // (Poland, 1995), who died of injuries.
+        // driver (Poland, 1995), who died of injuries.
         {.id = 15,
          .category = VSCategoryID::Results,
          .nameKey = "DISPLAY_TYPE_BLOOD_ALCOHOL_CONTENT",
@@ -49,9 +47,8 @@ std::span<const VSDataUnitGroupRow> VSResultsDisplayTypes() {
                     .confirmRange = {0, 20}}},
          .charting = &VSChartingProfiles::Line},
 
-        // The largest lungs measured held 11.7 litres (P. Reed, rower); a tall man of 20 is expected to blow
-        // about
-        // 6.5 (Global Lung Function Initiative 2012), a child of five about 1.
+        // The largest lungs measured held 11.7 litres (P. Reed, rower); a tall man of 20 is expected to
+        // blow about 6.5 (Global Lung Function Initiative 2012), a child of five about 1.
         {.id = 62,
          .category = VSCategoryID::Results,
          .nameKey = "DISPLAY_TYPE_FORCED_VITAL_CAPACITY",
@@ -74,9 +71,8 @@ std::span<const VSDataUnitGroupRow> VSResultsDisplayTypes() {
                     .confirmRange = {0.4, 7}}},
          .charting = &VSChartingProfiles::Line},
 
-        // The scale of peak-flow meters runs from 60 to 880 litres a minute (EN ISO 23747); laboratories have
-        // seen a
-        // little over 1,000.
+        // The scale of peak-flow meters runs from 60 to 880 litres a minute (EN ISO 23747); laboratories
+        // have seen a little over 1,000.
         {.id = 64,
          .category = VSCategoryID::Results,
          .nameKey = "DISPLAY_TYPE_PEAK_EXPIRATORY_FLOW_RATE",
@@ -87,7 +83,8 @@ std::span<const VSDataUnitGroupRow> VSResultsDisplayTypes() {
                     .confirmRange = {60, 880}}},
          .charting = &VSChartingProfiles::Line},
 
-        // A canister holds 200 puffs; an attack is treated with ten at a time (Global Initiative for Asthma).
+        // A canister holds 200 puffs; an attack is treated with ten at a time (Global Initiative for
+        // Asthma).
         {.id = 61,
          .category = VSCategoryID::Results,
          .nameKey = "DISPLAY_TYPE_INHALER_USAGE",
@@ -110,8 +107,7 @@ std::span<const VSDataUnitGroupRow> VSResultsDisplayTypes() {
          .charting = &VSChartingProfiles::Bars},
 
         // 43.3 was measured once, on Licancabur (Cabrol et al. 2014); inhabited highlands see 20 and more,
-        // the rest of
-        // the world up to 16.
+        // the rest of the world up to 16.
         {.id = VSGroupID::UVExposure,
          .category = VSCategoryID::Results,
          .nameKey = "DISPLAY_TYPE_UV_EXPOSURE",

@@ -8,10 +8,9 @@ using namespace VSUnitChoices;
 
 std::span<const VSDataUnitGroupRow> VSVitalsDisplayTypes() {
     static const VSDataUnitGroupRow rows[] = {
-        // The fastest pulse measured was 480 (Chhabra et al. 2012), the slowest at rest 26 to 28 in endurance
-        // athletes;
-        // people cooled to 14 degrees had a few. The oldest rule of thumb for the greatest effort is 220 less
-        // age.
+        // The fastest pulse measured was 480 (Chhabra et al. 2012), the slowest at rest 26 to 28 in
+        // endurance athletes; people cooled to 14 degrees had a few. The oldest rule of thumb for the
+        // greatest effort is 220 less age.
         {.id = VSGroupID::HeartRate,
          .category = VSCategoryID::Vitals,
          .nameKey = "DISPLAY_TYPE_HEART_RATE",
@@ -23,8 +22,7 @@ std::span<const VSDataUnitGroupRow> VSVitalsDisplayTypes() {
          .charting = &VSChartingProfiles::MinMax},
 
         // 480/350 was measured inside an artery under the heaviest lift (MacDougall et al. 1985). A crisis
-        // begins at
-        // 180/120 (ACC/AHA 2017), shock below about 90 systolic; a cuff cannot read below 40.
+        // begins at 180/120 (ACC/AHA 2017), shock below about 90 systolic; a cuff cannot read below 40.
         {.id = VSGroupID::BloodPressure,
          .category = VSCategoryID::Vitals,
          .nameKey = "DISPLAY_TYPE_BLOOD_PRESSURE",
@@ -54,9 +52,8 @@ std::span<const VSDataUnitGroupRow> VSVitalsDisplayTypes() {
                     .confirmRange = {6, 60}}},
          .charting = &VSChartingProfiles::MinMax},
 
-        // A child lived through 11.8 degrees (Poland, 2014) and a man through 46.5 (W. Jones, Atlanta, 1980).
-        // Below 34
-        // is moderate cold injury, above 42 proteins break.
+        // A child lived through 11.8 degrees (Poland, 2014) and a man through 46.5 (W. Jones, Atlanta,
+        // 1980). Below 34 is moderate cold injury, above 42 proteins break.
         {.id = 57,
          .category = VSCategoryID::Vitals,
          .nameKey = "DISPLAY_TYPE_BODY_TEMPERATURE",

@@ -104,7 +104,8 @@ void VSUnitController::preferencesLoaded(const VSValue::Dictionary& stored) {
 }
 
 void VSUnitController::save() {
-    // The dictionary holds the choices of all types: written before it was read it would wipe out the others.
+    // The dictionary holds the choices of all types: written before it was read it would wipe out the
+    // others.
     if (loadState_ != LoadState::Loaded) {
         saveWhenLoaded_ = true;
         if (loadState_ == LoadState::Failed) load();

@@ -27,7 +27,8 @@ struct Filled {
     int64_t samples = 0;
 
     Filled() {
-        VSEnvironment::install(std::make_shared<VSFixedEnvironment>(VSDate::fromSeconds(1'672'531'200), "Etc/UTC", "en_US"));
+        VSEnvironment::install(
+            std::make_shared<VSFixedEnvironment>(VSDate::fromSeconds(1'672'531'200), "Etc/UTC", "en_US"));
         store = benchStore(folder.path() / "store");
         bare = std::make_unique<BareDatabase>(folder.path());
         for (int year = lastYear - years + 1; year <= lastYear; ++year) {
@@ -47,7 +48,9 @@ Filled& filled() {
     return instance;
 }
 
-const VSObjectType* heartRate() { return VSObjectType::dataTypeWithCode(VSCode::HeartRate); }
+const VSObjectType* heartRate() {
+    return VSObjectType::dataTypeWithCode(VSCode::HeartRate);
+}
 
 /// A ratio over 1: the store is faster than the bare database.
 void compare(benchmark::State& state, const std::function<void()>& ours, const std::function<void()>& bares) {
@@ -72,26 +75,34 @@ void daily(benchmark::State& state, int numberOfYears) {
     compare(
         state,
         [&] {
-            const auto result = data.store->statisticsCollection(heartRate(), VSPredicate::samplesWithStartDate(from, to, 0),
-                                                                 VSStatisticsOptionDiscreteAverage | VSStatisticsOptionDiscreteMin | VSStatisticsOptionDiscreteMax,
-                                                                 from, {0, 0, 1, 0, 0, 0});
+            const auto result = data.store->statisticsCollection(
+                heartRate(), VSPredicate::samplesWithStartDate(from, to, 0),
+                VSStatisticsOptionDiscreteAverage | VSStatisticsOptionDiscreteMin |
+                    VSStatisticsOptionDiscreteMax,
+                from, {0, 0, 1, 0, 0, 0});
             if ((*result)->statistics().size() != static_cast<size_t>(365 * numberOfYears)) std::abort();
         },
         [&] {
-            if (data.bare->dailyAggregates(from.microseconds(), to.microseconds()) != 365 * numberOfYears) std::abort();
+            if (data.bare->dailyAggregates(from.microseconds(), to.microseconds()) != 365 * numberOfYears)
+                std::abort();
         });
 }
 
-void BM_DailyOverOneYear(benchmark::State& state) { daily(state, 1); }
-void BM_DailyOverSixYears(benchmark::State& state) { daily(state, years); }
+void BM_DailyOverOneYear(benchmark::State& state) {
+    daily(state, 1);
+}
+void BM_DailyOverSixYears(benchmark::State& state) {
+    daily(state, years);
+}
 
 void BM_MostRecentSample(benchmark::State& state) {
     Filled& data = filled();
     compare(
         state,
         [&] {
-            const auto result = data.store->samples(heartRate(), VSPredicate::samplesStartingBefore(VSDate::fromSeconds(1'700'000'000)), 1,
-                                                    {{VSSampleSortIdentifierEndDate, false}, {VSObjectSortIdentifierDataID, false}});
+            const auto result = data.store->samples(
+                heartRate(), VSPredicate::samplesStartingBefore(VSDate::fromSeconds(1'700'000'000)), 1,
+                {{VSSampleSortIdentifierEndDate, false}, {VSObjectSortIdentifierDataID, false}});
             if (result->size() != 1) std::abort();
         },
         [&] { benchmark::DoNotOptimize(data.bare->mostRecent()); });
@@ -104,7 +115,9 @@ void BM_BulkSave(benchmark::State& state) {
     state.counters["ours_s"] = data.storeSeconds;
     state.counters["bare_s"] = data.bareSeconds;
     state.counters["ratio"] = data.bareSeconds / data.storeSeconds;
-    state.counters["bytes_per_sample"] = static_cast<double>(std::filesystem::file_size(data.folder.path() / "store" / "vessa.sqlite")) / static_cast<double>(data.samples);
+    state.counters["bytes_per_sample"] =
+        static_cast<double>(std::filesystem::file_size(data.folder.path() / "store" / "vessa.sqlite")) /
+        static_cast<double>(data.samples);
 }
 
 void BM_Open(benchmark::State& state) {

@@ -30,13 +30,15 @@ std::vector<BenchReading> benchYear(int year) {
 std::vector<VSSamplePtr> benchSamples(const std::vector<BenchReading>& readings) {
     const auto* type = VSObjectType::dataTypeWithCode(VSCode::HeartRate);
     VSProvenance provenance;
-    provenance.sourceRevision = std::make_shared<VSSourceRevision>(VSSourceRevision{VSSource::forImportedName("Wrist tracker"), "1"});
+    provenance.sourceRevision =
+        std::make_shared<VSSourceRevision>(VSSourceRevision{VSSource::forImportedName("Wrist tracker"), "1"});
     std::vector<VSSamplePtr> samples;
     samples.reserve(readings.size());
     for (const BenchReading& reading : readings) {
         const VSDate start = VSDate::fromMicroseconds(reading.start);
         provenance.creationDate = start;
-        samples.push_back(std::make_shared<VSQuantitySample>(type, VSQuantity(type->canonicalUnit(), reading.value), start, start, provenance));
+        samples.push_back(std::make_shared<VSQuantitySample>(
+            type, VSQuantity(type->canonicalUnit(), reading.value), start, start, provenance));
     }
     return samples;
 }
@@ -54,14 +56,19 @@ BenchFolder::~BenchFolder() {
 
 BareDatabase::BareDatabase(const std::filesystem::path& folder) {
     if (sqlite3_open((folder / "bare.sqlite").c_str(), &handle_)) stop("no bare database");
-    execute("PRAGMA journal_mode = WAL; PRAGMA synchronous = FULL; PRAGMA cache_size = -16384;"
-            "CREATE TABLE samples(type INTEGER NOT NULL, start INTEGER NOT NULL, id INTEGER NOT NULL, duration INTEGER NOT NULL, value,"
-            " provenance INTEGER NOT NULL, created INTEGER NOT NULL, metadata INTEGER, PRIMARY KEY (type, start, id)) WITHOUT ROWID;"
-            "CREATE INDEX samples_by_id ON samples(type, id);"
-            "CREATE INDEX samples_long ON samples(type, start) WHERE duration > 172800000000;");
+    execute(
+        "PRAGMA journal_mode = WAL; PRAGMA synchronous = FULL; PRAGMA cache_size = -16384;"
+        "CREATE TABLE samples(type INTEGER NOT NULL, start INTEGER NOT NULL, id INTEGER NOT NULL, duration "
+        "INTEGER NOT NULL, value,"
+        " provenance INTEGER NOT NULL, created INTEGER NOT NULL, metadata INTEGER, PRIMARY KEY (type, start, "
+        "id)) WITHOUT ROWID;"
+        "CREATE INDEX samples_by_id ON samples(type, id);"
+        "CREATE INDEX samples_long ON samples(type, start) WHERE duration > 172800000000;");
 }
 
-BareDatabase::~BareDatabase() { sqlite3_close(handle_); }
+BareDatabase::~BareDatabase() {
+    sqlite3_close(handle_);
+}
 
 void BareDatabase::execute(const char* sql) {
     if (sqlite3_exec(handle_, sql, nullptr, nullptr, nullptr)) stop(sqlite3_errmsg(handle_));
@@ -69,7 +76,9 @@ void BareDatabase::execute(const char* sql) {
 
 void BareDatabase::insert(const std::vector<BenchReading>& readings) {
     sqlite3_stmt* statement = nullptr;
-    if (sqlite3_prepare_v2(handle_, "INSERT INTO samples VALUES (5, ?, ?, 0, ?, 1, 0, NULL)", -1, &statement, nullptr)) stop(sqlite3_errmsg(handle_));
+    if (sqlite3_prepare_v2(handle_, "INSERT INTO samples VALUES (5, ?, ?, 0, ?, 1, 0, NULL)", -1, &statement,
+                           nullptr))
+        stop(sqlite3_errmsg(handle_));
     execute("BEGIN");
     for (const BenchReading& reading : readings) {
         sqlite3_bind_int64(statement, 1, reading.start);
@@ -84,7 +93,9 @@ void BareDatabase::insert(const std::vector<BenchReading>& readings) {
 
 int BareDatabase::dailyAggregates(int64_t from, int64_t to) {
     sqlite3_stmt* statement = nullptr;
-    const char* sql = "SELECT start / 86400000000, avg(value), min(value), max(value) FROM samples WHERE type = 5 AND start >= ? AND start < ? GROUP BY 1";
+    const char* sql =
+        "SELECT start / 86400000000, avg(value), min(value), max(value) FROM samples WHERE type = 5 AND "
+        "start >= ? AND start < ? GROUP BY 1";
     if (sqlite3_prepare_v2(handle_, sql, -1, &statement, nullptr)) stop(sqlite3_errmsg(handle_));
     sqlite3_bind_int64(statement, 1, from);
     sqlite3_bind_int64(statement, 2, to);

@@ -21,10 +21,9 @@ void QVBarSeries::prepareForRendering(QSizeF size, std::optional<VSDate> minXVal
 
 void QVBarSeries::renderFill(QPainter& painter) const {
     const double base = imageSize().height() - bottomPadding_;
-    QPainterPath path;
-    path.setFillRule(Qt::WindingFill);
-    for (const QPointF& point : dataPoints_)
-        QVAddSegment(path, {point.x(), base}, {point.x(), std::min(point.y(), base)}, barWidth_,
-                     lineCapStyle_);
-    painter.fillPath(path, fillColor_);
+    QVPaintLayer(painter, imageSize(), fillColor_.alphaF(), [&](QPainter& layer) {
+        for (const QPointF& point : dataPoints_)
+            QVFillSegment(layer, {point.x(), base}, {point.x(), std::min(point.y(), base)}, barWidth_,
+                          lineCapStyle_, QVOpaque(fillColor_));
+    });
 }

@@ -18,22 +18,19 @@ std::vector<QPointF> QVCenteredHorizontalLineSeries::pointsOfValue(int value) co
 
 void QVCenteredHorizontalLineSeries::renderFill(QPainter& painter) const {
     const std::vector<QPointF> points = pointsOfValue(0);
-    QPainterPath path;
-    path.setFillRule(Qt::WindingFill);
-    for (size_t i = 0; i + 1 < points.size(); i += 2)
-        QVAddSegment(path, points[i], points[i + 1], lineWidth_, QVLineCapStyle::Round);
-    painter.fillPath(path, fillColor_);
+    QVPaintLayer(painter, imageSize(), fillColor_.alphaF(), [&](QPainter& layer) {
+        for (size_t i = 0; i + 1 < points.size(); i += 2)
+            QVFillSegment(layer, points[i], points[i + 1], lineWidth_, QVLineCapStyle::Round,
+                          QVOpaque(fillColor_));
+    });
 }
 
 void QVCenteredHorizontalLineSeries::renderChart(QPainter& painter) const {
     if (!accentColor_.isValid()) return;
-    QPainterPath dots, holes;
-    dots.setFillRule(Qt::WindingFill);
-    holes.setFillRule(Qt::WindingFill);
-    for (const QPointF& point : pointsOfValue(1)) {
-        QVAddSegment(dots, point, point, lineWidth_, QVLineCapStyle::Round);
-        QVAddSegment(holes, point, point, lineWidth_ / 2, QVLineCapStyle::Round);
-    }
-    QVPaintWithHoles(painter, imageSize(), holes,
-                     [&](QPainter& layer) { layer.fillPath(dots, accentColor_); });
+    const std::vector<QPointF> points = pointsOfValue(1);
+    QVPaintLayer(painter, imageSize(), accentColor_.alphaF(), [&](QPainter& layer) {
+        for (const QPointF& point : points)
+            QVFillSegment(layer, point, point, lineWidth_, QVLineCapStyle::Round, QVOpaque(accentColor_));
+        QVEraseCircles(layer, points, lineWidth_ / 4);
+    });
 }

@@ -1,21 +1,10 @@
 #include "Qelvar/Charts/QVChartDrawing.h"
 
 #include <QFontMetricsF>
+#include <QPainterPath>
 #include <cmath>
 
-void QVAddSegment(QPainterPath& path, QPointF a, QPointF b, double width, QVLineCapStyle cap) {
-    const double half = width / 2;
-    const QRectF core = QRectF(a, b).normalized();
-    const bool vertical = a.x() == b.x();
-    const double reach = cap == QVLineCapStyle::Butt ? 0 : half;
-    const QRectF outline =
-        vertical ? core.adjusted(-half, -reach, half, reach) : core.adjusted(-reach, -half, reach, half);
-    if (outline.isEmpty()) return;
-    if (cap == QVLineCapStyle::Round)
-        path.addRoundedRect(outline, half, half);
-    else
-        path.addRect(outline);
-}
+#include "Qelvar/Charts/QVChartSeriesPointMarker.h"
 
 QImage QVTransparentImage(QSizeF size, double scale) {
     QImage image(static_cast<int>(std::ceil(size.width() * scale)),
@@ -25,21 +14,50 @@ QImage QVTransparentImage(QSizeF size, double scale) {
     return image;
 }
 
-void QVPaintWithHoles(QPainter& painter, QSizeF imageSize, const QPainterPath& holes,
-                      const std::function<void(QPainter&)>& draw) {
-    if (holes.isEmpty()) {
-        draw(painter);
-        return;
-    }
+void QVPaintLayer(QPainter& painter, QSizeF imageSize, double opacity,
+                  const std::function<void(QPainter&)>& draw) {
     QImage layer = QVTransparentImage(imageSize, painter.device()->devicePixelRatio());
     QPainter layerPainter(&layer);
     layerPainter.setRenderHints(painter.renderHints());
     draw(layerPainter);
-    layerPainter.setCompositionMode(QPainter::CompositionMode_DestinationOut);
-    layerPainter.setClipping(false);
-    layerPainter.fillPath(holes, Qt::black);
     layerPainter.end();
+    painter.save();
+    painter.setOpacity(painter.opacity() * opacity);
     painter.drawImage(QPointF(0, 0), layer);
+    painter.restore();
+}
+
+void QVFillSegment(QPainter& painter, QPointF a, QPointF b, double width, QVLineCapStyle cap,
+                   const QColor& color) {
+    const double half = width / 2;
+    const double reach = cap == QVLineCapStyle::Butt ? 0 : half;
+    const QRectF core = QRectF(a, b).normalized();
+    const QRectF outline = a.x() == b.x() ? core.adjusted(-half, -reach, half, reach)
+                                          : core.adjusted(-reach, -half, reach, half);
+    if (outline.isEmpty()) return;
+    if (cap != QVLineCapStyle::Round) {
+        painter.fillRect(outline, color);
+        return;
+    }
+    QPainterPath path;
+    path.addRoundedRect(outline, half, half);
+    painter.fillPath(path, color);
+}
+
+void QVEraseCircles(QPainter& painter, const std::vector<QPointF>& centers, double radius) {
+    if (centers.empty()) return;
+    const QImage disc = QVChartSeriesPointMarker::chartPointWithColor(
+        Qt::black, radius, 0, QVPointStyle::Disc, painter.device()->devicePixelRatio());
+    painter.save();
+    painter.setClipping(false);
+    painter.setCompositionMode(QPainter::CompositionMode_DestinationOut);
+    for (const QPointF& center : centers) QVDrawCentered(painter, disc, center);
+    painter.restore();
+}
+
+QColor QVOpaque(QColor color) {
+    color.setAlpha(255);
+    return color;
 }
 
 void QVDrawText(QPainter& painter, QPointF topLeft, const QString& text) {

@@ -1,24 +1,34 @@
 #pragma once
 
 #include <QPainter>
-#include <QPainterPath>
 #include <functional>
+#include <vector>
 
 #include "Qelvar/Charts/QVChartSeries.h"
 
 // Drawing that several series share. Any thread.
 
-/// Adds the outline of a horizontal or vertical stroke from a to b. Outlines that overlap are filled once
-/// when the path's fill rule is winding. A stroke of no length with a round cap is a dot.
-void QVAddSegment(QPainterPath& path, QPointF a, QPointF b, double width, QVLineCapStyle cap);
+// The outline of a path is slow to fill when many of its parts lie side by side. So what belongs together but
+// may overlap is drawn piece by piece, opaque, on a layer of its own, and the layer is laid over the image
+// once.
 
 /// A transparent image of that size in points, at `scale` pixels a point.
 QImage QVTransparentImage(QSizeF size, double scale);
 
-/// Runs `draw` so that nothing of what it draws shows inside the path `holes`; what was there before stays.
-/// `imageSize`: of the image being painted, in points.
-void QVPaintWithHoles(QPainter& painter, QSizeF imageSize, const QPainterPath& holes,
-                      const std::function<void(QPainter&)>& draw);
+/// Runs `draw` on a transparent layer of the image's size in points, and lays the layer over the image.
+void QVPaintLayer(QPainter& painter, QSizeF imageSize, double opacity,
+                  const std::function<void(QPainter&)>& draw);
+
+/// Fills the outline of a horizontal or vertical stroke from a to b. One of no length with a round cap is a
+/// dot.
+void QVFillSegment(QPainter& painter, QPointF a, QPointF b, double width, QVLineCapStyle cap,
+                   const QColor& color);
+
+/// Clears circles, so that nothing drawn before shows inside them.
+void QVEraseCircles(QPainter& painter, const std::vector<QPointF>& centers, double radius);
+
+/// The colour without its transparency: for a layer that is laid over the image with that.
+QColor QVOpaque(QColor color);
 
 /// Draws one line of text in the painter's font and pen with its top left there. Its baseline is that of the
 /// font, whatever other fonts its characters come from, so that labels side by side stand on one line.

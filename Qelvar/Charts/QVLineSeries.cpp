@@ -1,5 +1,6 @@
 #include "Qelvar/Charts/QVLineSeries.h"
 
+#include <algorithm>
 #include <cmath>
 
 #include "Qelvar/Charts/QVChartDrawing.h"
@@ -14,11 +15,9 @@ bool hasYValue(const QVChartPoint& point) {
     return !point.allYValues().empty();
 }
 
-QPainterPath regionPath(const std::vector<QRectF>& regions) {
-    QPainterPath path;
-    path.setFillRule(Qt::WindingFill);
-    for (const QRectF& region : regions) path.addRect(region);
-    return path;
+/// Whether anything between two x lies in the region.
+bool touches(const QRectF& region, double x1, double x2) {
+    return std::max(x1, x2) >= region.left() && std::min(x1, x2) <= region.right();
 }
 
 void addSquareWave(QPainterPath& path, const std::vector<QPointF>& points) {
@@ -90,62 +89,40 @@ QVLineSeries::Regions QVLineSeries::findRegions() const {
     return regions;
 }
 
-QPainterPath QVLineSeries::linePath(bool closed) const {
+/// The way through all points. A saw tooth is drawn segment by segment instead.
+QPainterPath QVLineSeries::wavePath() const {
     QPainterPath path;
-    path.setFillRule(Qt::WindingFill);
     if (dataPoints_.empty()) return path;
-    switch (waveForm_) {
-        case WaveForm::Sine:
-            addSineWave(path, dataPoints_, sineWaveSmoothingFactor_);
-            break;
-        case WaveForm::SawTooth:
-            path.moveTo(dataPoints_.front());
-            for (size_t i = 1; i < dataPoints_.size(); ++i) {
-                // Each segment of the line starts anew, so that dashes start at every point.
-                if (!closed) path.moveTo(dataPoints_[i - 1]);
-                path.lineTo(dataPoints_[i]);
-            }
-            break;
-        case WaveForm::Square:
-            addSquareWave(path, dataPoints_);
-            break;
-    }
+    if (waveForm_ == WaveForm::Sine) addSineWave(path, dataPoints_, sineWaveSmoothingFactor_);
+    if (waveForm_ == WaveForm::Square) addSquareWave(path, dataPoints_);
     return path;
 }
 
-QPainterPath QVLineSeries::fillPath() const {
-    QPainterPath path = linePath(true);
-    if (path.isEmpty()) return path;
-    path.lineTo(dataPoints_.back().x(), imageSize().height());
-    path.lineTo(dataPoints_.front().x(), imageSize().height());
-    path.closeSubpath();
-    return path;
-}
-
-QPainterPath QVLineSeries::markerHoles() const {
-    QPainterPath path;
-    path.setFillRule(Qt::OddEvenFill);
-    if (pointRadius_ > 0)
-        for (const QPointF& point : dataPoints_) path.addEllipse(point, pointRadius_, pointRadius_);
-    return path;
-}
-
-void QVLineSeries::strokeLine(QPainter& painter, const std::vector<QRectF>& regions, bool dashed) const {
-    if (regions.empty() || lineWidth_ <= 0) return;
-    QPen pen(lineColor_, lineWidth_, Qt::SolidLine, Qt::FlatCap, Qt::SvgMiterJoin);
+void QVLineSeries::strokeLine(QPainter& layer, const std::vector<QRectF>& regions, bool dashed) const {
+    QPen pen(QVOpaque(lineColor_), lineWidth_, Qt::SolidLine, Qt::FlatCap, Qt::SvgMiterJoin);
     pen.setMiterLimit(10);
     if (dashed) pen.setDashPattern({kDashOn / lineWidth_, kDashOff / lineWidth_});
-    painter.save();
-    painter.setClipPath(regionPath(regions), Qt::IntersectClip);
-    painter.strokePath(linePath(false), pen);
-    painter.restore();
+    const QPainterPath wave = wavePath();
+    layer.save();
+    layer.setPen(pen);
+    for (const QRectF& region : regions) {
+        layer.setClipRect(region);
+        layer.strokePath(wave, pen);
+        if (waveForm_ != WaveForm::SawTooth) continue;
+        // Each segment starts anew, so that dashes start at every point.
+        for (size_t i = 1; i < dataPoints_.size(); ++i)
+            if (touches(region, dataPoints_[i - 1].x(), dataPoints_[i].x()))
+                layer.drawLine(dataPoints_[i - 1], dataPoints_[i]);
+    }
+    layer.restore();
 }
 
 void QVLineSeries::renderChart(QPainter& painter) const {
-    if (lineColor_.isValid() && (!regions_.connected.empty() || !regions_.gaps.empty())) {
-        QVPaintWithHoles(painter, imageSize(), markerHoles(), [this](QPainter& layer) {
+    if (lineColor_.isValid() && lineWidth_ > 0 && (!regions_.connected.empty() || !regions_.gaps.empty())) {
+        QVPaintLayer(painter, imageSize(), lineColor_.alphaF(), [this](QPainter& layer) {
             strokeLine(layer, regions_.connected, false);
             strokeLine(layer, regions_.gaps, true);
+            QVEraseCircles(layer, dataPoints_, pointRadius_);
         });
     }
     if (pointStyle_ == QVPointStyle::None || dataPoints_.empty()) return;
@@ -154,14 +131,40 @@ void QVLineSeries::renderChart(QPainter& painter) const {
     for (const QPointF& point : dataPoints_) QVDrawCentered(painter, marker, point);
 }
 
+void QVLineSeries::fillBeneath(QPainter& layer, const QRectF& region, const QBrush& brush) const {
+    const double bottom = imageSize().height();
+    if (waveForm_ != WaveForm::SawTooth) {
+        QPainterPath path = wavePath();
+        path.setFillRule(Qt::WindingFill);
+        path.lineTo(dataPoints_.back().x(), bottom);
+        path.lineTo(dataPoints_.front().x(), bottom);
+        path.closeSubpath();
+        layer.fillPath(path, brush);
+        return;
+    }
+    // Pieces side by side: where they share a pixel their parts of it add up.
+    layer.setCompositionMode(QPainter::CompositionMode_Plus);
+    layer.setPen(Qt::NoPen);
+    layer.setBrush(brush);
+    for (size_t i = 1; i < dataPoints_.size(); ++i) {
+        const QPointF from = dataPoints_[i - 1], to = dataPoints_[i];
+        if (from.x() != to.x() && touches(region, from.x(), to.x()))
+            layer.drawPolygon(QPolygonF{from, to, QPointF(to.x(), bottom), QPointF(from.x(), bottom)});
+    }
+}
+
 void QVLineSeries::renderGradient(QPainter& painter, const QVGradientObject& gradient,
                                   const std::vector<QRectF>& regions) const {
     if (dataPoints_.size() < 2 || !gradient.isValid() || regions.empty()) return;
-    QVPaintWithHoles(painter, imageSize(), markerHoles(), [&](QPainter& layer) {
-        layer.save();
-        layer.setClipPath(regionPath(regions), Qt::IntersectClip);
-        layer.fillPath(fillPath(), gradient.verticalGradient(0, imageSize().height()));
-        layer.restore();
+    QVPaintLayer(painter, imageSize(), 1, [&](QPainter& layer) {
+        const QBrush brush(gradient.verticalGradient(0, imageSize().height()));
+        for (const QRectF& region : regions) {
+            layer.save();
+            layer.setClipRect(region);
+            fillBeneath(layer, region, brush);
+            layer.restore();
+        }
+        QVEraseCircles(layer, dataPoints_, pointRadius_);
     });
 }
 

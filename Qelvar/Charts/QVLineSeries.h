@@ -58,13 +58,12 @@ class QVLineSeries : public QVChartSeries {
     void discardPreparation() override;
 
  private:
-    QPainterPath linePath(bool closed) const;
-    QPainterPath fillPath() const;
-    QPainterPath markerHoles() const;
+    QPainterPath wavePath() const;
+    void fillBeneath(QPainter& layer, const QRectF& region, const QBrush& brush) const;
     Regions findRegions() const;
     void renderGradient(QPainter& painter, const QVGradientObject& gradient,
                         const std::vector<QRectF>& regions) const;
-    void strokeLine(QPainter& painter, const std::vector<QRectF>& regions, bool dashed) const;
+    void strokeLine(QPainter& layer, const std::vector<QRectF>& regions, bool dashed) const;
 
     WaveForm waveForm_ = WaveForm::SawTooth;
     double lineWidth_ = 2.0;

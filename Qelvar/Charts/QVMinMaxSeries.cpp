@@ -43,60 +43,61 @@ bool QVMinMaxSeries::isCenterPoint(const ChartPoint& point) const {
     return std::abs(point.absoluteMaxPoint.y() - point.absoluteMinPoint.y()) < 2 * pointRadius_;
 }
 
-/// The shape of a marker at the lower end of a bar (`minimumSide`) or at its upper end.
-void QVMinMaxSeries::addMarkerShape(QPainterPath& path, QPointF position, QVPointStyle style,
-                                    bool minimumSide) const {
-    if (style == QVPointStyle::None) return;
-    if (!isChevron(style)) {
-        path.addEllipse(position, pointRadius_, pointRadius_);
-        return;
-    }
+namespace {
+
+/// The shape of a chevron at the lower end of a bar (`minimumSide`) or at its upper end.
+QPolygonF chevronShape(QPointF position, QVPointStyle style, double radius, bool minimumSide) {
     const double x = position.x();
-    const double side = std::round(pointRadius_);
+    const double side = std::round(radius);
     const double base = minimumSide ? position.y() + kChevronGap : position.y() - kChevronGap;
     const double far = minimumSide ? base - side : base + side;
     const bool triangle = (style == QVPointStyle::DownwardChevron) != minimumSide;
-    path.moveTo(x - side, base);
-    path.lineTo(x + side, base);
-    if (triangle) {
-        path.lineTo(x, far);
-    } else {
-        path.lineTo(x + side, far);
-        path.lineTo(x, base);
-        path.lineTo(x - side, far);
-    }
-    path.closeSubpath();
+    if (triangle) return {QPointF(x - side, base), QPointF(x + side, base), QPointF(x, far)};
+    return {QPointF(x - side, base), QPointF(x + side, base), QPointF(x + side, far), QPointF(x, base),
+            QPointF(x - side, far)};
 }
 
-QPainterPath QVMinMaxSeries::markerShapes() const {
-    QPainterPath path;
-    path.setFillRule(Qt::WindingFill);
-    if (minPointStyle_ == QVPointStyle::None || maxPointStyle_ == QVPointStyle::None) return path;
+}  // namespace
+
+/// Clears the places of the markers.
+void QVMinMaxSeries::eraseMarkerShapes(QPainter& layer) const {
+    std::vector<QPointF> circles;
+    std::vector<QPolygonF> chevrons;
+    const auto add = [&](QPointF position, QVPointStyle style, bool minimumSide) {
+        if (isChevron(style))
+            chevrons.push_back(chevronShape(position, style, pointRadius_, minimumSide));
+        else
+            circles.push_back(position);
+    };
     for (const ChartPoint& point : chartPoints_) {
         if (isCenterPoint(point)) {
-            addMarkerShape(path, (point.absoluteMinPoint + point.absoluteMaxPoint) / 2, maxPointStyle_, true);
+            add((point.absoluteMinPoint + point.absoluteMaxPoint) / 2, maxPointStyle_, true);
             continue;
         }
-        if (!point.minIsClamped) addMarkerShape(path, point.absoluteMinPoint, minPointStyle_, true);
-        if (!point.maxIsClamped) addMarkerShape(path, point.absoluteMaxPoint, maxPointStyle_, false);
+        if (!point.minIsClamped) add(point.absoluteMinPoint, minPointStyle_, true);
+        if (!point.maxIsClamped) add(point.absoluteMaxPoint, maxPointStyle_, false);
     }
-    return path;
+    QVEraseCircles(layer, circles, pointRadius_);
+    layer.setCompositionMode(QPainter::CompositionMode_DestinationOut);
+    layer.setPen(Qt::NoPen);
+    layer.setBrush(Qt::black);
+    for (const QPolygonF& chevron : chevrons) layer.drawPolygon(chevron, Qt::WindingFill);
 }
 
 void QVMinMaxSeries::renderFill(QPainter& painter) const {
     const bool roundCaps = minPointStyle_ == QVPointStyle::None || maxPointStyle_ == QVPointStyle::None;
     const double minGap = isChevron(minPointStyle_) ? kChevronGap : 0;
     const double maxGap = isChevron(maxPointStyle_) ? kChevronGap : 0;
-    QPainterPath bars;
-    bars.setFillRule(Qt::WindingFill);
-    for (const ChartPoint& point : chartPoints_) {
-        if (isCenterPoint(point)) continue;
-        QVAddSegment(bars, point.absoluteMinPoint + QPointF(0, minGap),
-                     point.absoluteMaxPoint - QPointF(0, maxGap), 2 * pointRadius_,
-                     roundCaps ? QVLineCapStyle::Round : QVLineCapStyle::Butt);
-    }
-    QVPaintWithHoles(painter, imageSize(), markerShapes(),
-                     [&](QPainter& layer) { layer.fillPath(bars, fillColor_); });
+    QVPaintLayer(painter, imageSize(), fillColor_.alphaF(), [&](QPainter& layer) {
+        for (const ChartPoint& point : chartPoints_) {
+            if (isCenterPoint(point)) continue;
+            QVFillSegment(layer, point.absoluteMinPoint + QPointF(0, minGap),
+                          point.absoluteMaxPoint - QPointF(0, maxGap), 2 * pointRadius_,
+                          roundCaps ? QVLineCapStyle::Round : QVLineCapStyle::Butt, QVOpaque(fillColor_));
+        }
+        // Round ends are where a style has no marker: nothing is kept free then.
+        if (!roundCaps) eraseMarkerShapes(layer);
+    });
 }
 
 void QVMinMaxSeries::renderChart(QPainter& painter) const {

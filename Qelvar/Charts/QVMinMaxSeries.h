@@ -1,7 +1,6 @@
 #pragma once
 
 #include <QColor>
-#include <QPainterPath>
 
 #include "Qelvar/Charts/QVChartSeries.h"
 #include "Qelvar/Charts/QVChartSeriesPointMarker.h"
@@ -42,9 +41,7 @@ class QVMinMaxSeries : public QVChartSeries {
         bool maxIsClamped = false;
     };
     bool isCenterPoint(const ChartPoint& point) const;
-    /// What is kept free of bars: the places of the markers.
-    QPainterPath markerShapes() const;
-    void addMarkerShape(QPainterPath& path, QPointF position, QVPointStyle style, bool minimumSide) const;
+    void eraseMarkerShapes(QPainter& layer) const;
 
     QVPointStyle maxPointStyle_ = QVPointStyle::Disc;
     QVPointStyle minPointStyle_ = QVPointStyle::Disc;

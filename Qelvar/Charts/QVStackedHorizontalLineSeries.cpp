@@ -22,13 +22,13 @@ void QVStackedHorizontalLineSeries::prepareForRendering(QSizeF size, std::option
 }
 
 void QVStackedHorizontalLineSeries::renderFill(QPainter& painter) const {
-    for (size_t row = 0; row < enumeratedValueOrder().size(); ++row) {
-        const std::vector<double>& points = pointsOfRow(row);
-        const double y = yForRow(row);
-        QPainterPath path;
-        path.setFillRule(Qt::WindingFill);
-        for (size_t i = 0; i + 1 < points.size(); i += 2)
-            QVAddSegment(path, {points[i], y}, {points[i + 1], y}, lineWidth_, QVLineCapStyle::Round);
-        painter.fillPath(path, fillColor_);
-    }
+    QVPaintLayer(painter, imageSize(), fillColor_.alphaF(), [&](QPainter& layer) {
+        for (size_t row = 0; row < enumeratedValueOrder().size(); ++row) {
+            const std::vector<double>& points = pointsOfRow(row);
+            const double y = yForRow(row);
+            for (size_t i = 0; i + 1 < points.size(); i += 2)
+                QVFillSegment(layer, {points[i], y}, {points[i + 1], y}, lineWidth_, QVLineCapStyle::Round,
+                              QVOpaque(fillColor_));
+        }
+    });
 }

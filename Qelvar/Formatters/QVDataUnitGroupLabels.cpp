@@ -1,6 +1,7 @@
 #include "Qelvar/Formatters/QVDataUnitGroupLabels.h"
 
 #include <algorithm>
+#include <cmath>
 #include <utility>
 
 #include "Platform/Localization.h"
@@ -41,6 +42,14 @@ std::map<int, QString> qv_enumeratedValueLabels(const VSDataUnitGroup* group) {
     if (const auto* known = enumeratedGroup(group))
         for (const auto& [value, key] : known->labelKeys) labels.emplace(value, platform::localized(key));
     return labels;
+}
+
+const QString* qv_labelForNumber(const std::map<int, QString>& labels, double number) {
+    // Compared as doubles: a number may be too large for an integer, or none at all.
+    const auto found =
+        std::find_if(labels.begin(), labels.end(),
+                     [whole = std::trunc(number)](const auto& entry) { return entry.first == whole; });
+    return found == labels.end() ? nullptr : &found->second;
 }
 
 std::optional<QString> qv_displayNameForEnumValue(const VSDataUnitGroup* group, int value) {

@@ -10,6 +10,8 @@
 
 /// Labels of a display type's enumerated values, in the user's language; empty for types without. Any thread.
 std::map<int, QString> qv_enumeratedValueLabels(const VSDataUnitGroup* group);
+/// The label of a number without its fraction; null when there is none.
+const QString* qv_labelForNumber(const std::map<int, QString>& labels, double number);
 /// The name of one value, or none; for workouts the name of the activity.
 std::optional<QString> qv_displayNameForEnumValue(const VSDataUnitGroup* group, int value);
 /// The values from the bottom of a stacked chart to its top.

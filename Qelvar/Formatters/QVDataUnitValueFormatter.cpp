@@ -128,8 +128,8 @@ StyledText QVEnumeratedDataUnitValueFormatter::attributedStringFromValue(double 
                                                                          const QFont& valueFont,
                                                                          const QFont&) const {
     const auto labels = qv_enumeratedValueLabels(dataUnitGroup);
-    const auto found = labels.find(static_cast<int>(value));
-    return StyledText(found == labels.end() ? QVNoDataString() : found->second, valueFont);
+    const QString* label = qv_labelForNumber(labels, value);
+    return StyledText(label ? *label : QVNoDataString(), valueFont);
 }
 
 QVValueFormatterClass qv_valueFormatterClass(const VSObjectType* type) {

@@ -98,9 +98,9 @@ QVEnumeratedDataUnitNumberFormatter::QVEnumeratedDataUnitNumberFormatter(const V
 
 std::optional<QString> QVEnumeratedDataUnitNumberFormatter::stringFromNumber(double number, const VSDataUnit*,
                                                                              const VSUnitController&) const {
-    const auto found = valueLabels_.find(static_cast<int>(number));
-    if (found == valueLabels_.end()) return std::nullopt;
-    return found->second;
+    const QString* label = qv_labelForNumber(valueLabels_, number);
+    if (!label) return std::nullopt;
+    return *label;
 }
 
 std::shared_ptr<const VSNumberFormatter> qv_numberFormatterForUnit(const VSObjectType* type, const VSUnit&) {

@@ -11,10 +11,10 @@
 
 namespace {
 
-// A real document shrinks to a twentieth or a fortieth. More than three hundred times an archive's size is a
-// trap and not a record of anything; small archives may be as repetitive as they like.
+// A real document shrinks to a twentieth or a fortieth. More than a hundred times an archive's size is a trap
+// and not a record of anything; small archives may be as repetitive as they like.
 constexpr uint64_t kAlwaysAllowedBytes = 100'000'000;
-constexpr uint64_t kGreatestExpansion = 300;
+constexpr uint64_t kGreatestExpansion = 100;
 constexpr size_t kBlockSize = 256 * 1024;
 constexpr size_t kSniffedBytes = 1024;
 constexpr size_t kListedNotes = 100;
@@ -24,9 +24,10 @@ struct ArchiveCloser {
 };
 using ArchivePointer = std::unique_ptr<archive, ArchiveCloser>;
 
-/// Names of entries are wanted as UTF-8 whatever the locale of the process: this thread's is another one meanwhile.
+/// Names of entries are wanted as UTF-8 whatever the locale of the process: this thread's is another one
+/// meanwhile.
 class Utf8Locale {
-   public:
+ public:
     Utf8Locale() : locale_(newlocale(LC_CTYPE_MASK, "C.UTF-8", nullptr)), previous_(uselocale(locale_)) {}
     ~Utf8Locale() {
         uselocale(previous_);
@@ -35,7 +36,7 @@ class Utf8Locale {
     Utf8Locale(const Utf8Locale&) = delete;
     Utf8Locale& operator=(const Utf8Locale&) = delete;
 
-   private:
+ private:
     const locale_t locale_;
     const locale_t previous_;
 };

@@ -146,8 +146,15 @@ class QVRecordsReader::Parser {
 
     std::string parserMessage() const {
         const xmlError* error = context_ ? xmlCtxtGetLastError(context_.get()) : nullptr;
-        if (!error || !error->message) return "not a complete XML document in a known encoding";
-        std::string message = error->message;
+        return error && error->message ? errorMessage(*error)
+                                       : "not a complete XML document in a known encoding";
+    }
+
+    static std::string errorMessage(const xmlError& error) {
+        // The parser's limit of 10 MB for what it must see at once: a comment, a name, a processing
+        // instruction.
+        if (error.code == XML_ERR_INTERNAL_ERROR) return "a part of it is longer than 10 MB";
+        std::string message = error.message ? error.message : "error";
         std::replace(message.begin(), message.end(), '\n', ' ');
         while (!message.empty() && message.back() == ' ') message.pop_back();
         return "not a well-formed XML document: " + message;
@@ -155,10 +162,7 @@ class QVRecordsReader::Parser {
 
     void parserError(const xmlError& error) {
         if (error.level < XML_ERR_ERROR || problem_ || stopped_) return;
-        std::string message = error.message ? error.message : "error";
-        std::replace(message.begin(), message.end(), '\n', ' ');
-        while (!message.empty() && message.back() == ' ') message.pop_back();
-        stop("not a well-formed XML document: " + message, error.line);
+        stop(errorMessage(error), error.line);
     }
 
     void documentType(const xmlChar* name, const xmlChar* publicId, const xmlChar* systemId) {

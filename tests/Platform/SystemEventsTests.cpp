@@ -62,6 +62,33 @@ TEST_F(SystemEventsTest, ZoneChangeOnTheSameDayIsAnEvent) {
     EXPECT_EQ(changes_, 2);
 }
 
+TEST_F(SystemEventsTest, WhatTheBusTellsIsCheckedAgainstTheClock) {
+    test::FixedEnvironment environment("2020-03-28T12:00", "Europe/Copenhagen");
+    auto* events = &SystemEvents::shared();
+    events->start();
+    // By the names that the bus is given.
+    const auto resume = [&](bool goingToSleep) {
+        return QMetaObject::invokeMethod(events, "busPrepareForSleep", Q_ARG(bool, goingToSleep));
+    };
+    const auto timeDateChange = [&] {
+        return QMetaObject::invokeMethod(events, "busTimeDateChanged",
+                                         Q_ARG(QString, "org.freedesktop.timedate1"), Q_ARG(QVariantMap, {}),
+                                         Q_ARG(QStringList, {}));
+    };
+    EXPECT_TRUE(resume(false));
+    EXPECT_TRUE(timeDateChange());
+    EXPECT_EQ(changes_, 0);
+    environment->setNow(test::date("2020-03-29T08:00"));
+    resume(true);
+    EXPECT_EQ(changes_, 0);
+    resume(false);
+    EXPECT_EQ(changes_, 1);
+    environment->setTimeZone("America/New_York");
+    timeDateChange();
+    timeDateChange();
+    EXPECT_EQ(changes_, 2);
+}
+
 TEST_F(SystemEventsTest, LocaleChangeLoadsTheTextsFirst) {
     test::FixedEnvironment environment("2020-03-28T12:00", "Europe/Copenhagen", "en_US");
     QString seen;

@@ -14,12 +14,14 @@ struct StoreBasics : testing::Test {
     std::shared_ptr<VSHealthStore> store = openStore(folder.path() / "store");
 };
 
-VSSamplePtr bloodPressure(double systolic, double diastolic, const std::string& when, VSProvenance provenance = {}) {
+VSSamplePtr bloodPressure(double systolic, double diastolic, const std::string& when,
+                          VSProvenance provenance = {}) {
     const VSDate moment = date(when);
     return std::make_shared<VSCorrelation>(
         type(VSCode::BloodPressure), moment, moment,
-        std::vector<VSSamplePtr>{quantity(type(VSCode::BloodPressureSystolic), systolic, moment, moment, provenance),
-                                 quantity(type(VSCode::BloodPressureDiastolic), diastolic, moment, moment, provenance)},
+        std::vector<VSSamplePtr>{
+            quantity(type(VSCode::BloodPressureSystolic), systolic, moment, moment, provenance),
+            quantity(type(VSCode::BloodPressureDiastolic), diastolic, moment, moment, provenance)},
         provenance);
 }
 
@@ -31,21 +33,28 @@ TEST_F(StoreBasics, EveryKindOfSampleComesBackAsItWasSaved) {
     device.name = "Wrist: \"tracker\"";
     device.hardwareVersion = "1";
     provenance.device = std::make_shared<VSDevice>(device);
-    provenance.metadata = std::make_shared<VSMetadata>(
-        VSMetadata{{"note", "snø ☃"}, {"VSMetadataKeyWasUserEntered", true}, {"at", date("2020-01-01")}, {"n", 3}, {"x", 0.1}});
+    provenance.metadata = std::make_shared<VSMetadata>(VSMetadata{{"note", "snø ☃"},
+                                                                  {"VSMetadataKeyWasUserEntered", true},
+                                                                  {"at", date("2020-01-01")},
+                                                                  {"n", 3},
+                                                                  {"x", 0.1}});
     provenance.creationDate = date("2020-03-02T10:00:00.123456");
     provenance.timeZoneOffset = 20700;
 
     const auto start = date("1969-12-31T23:59:59.999999Z"), end = date("2020-03-01T08:00");
-    const double awkward[] = {0.1 + 0.2, -0.0, 1e-300, 123456789012345680.0, 75.0, -3.0, 5e-324, 140737488355328.0};
+    const double awkward[] = {0.1 + 0.2, -0.0, 1e-300, 123456789012345680.0,
+                              75.0,      -3.0, 5e-324, 140737488355328.0};
     std::vector<VSSamplePtr> objects;
     for (double value : awkward) objects.push_back(quantity(heartRate(), value, start, end, provenance));
-    objects.push_back(std::make_shared<VSCategorySample>(type(VSCode::SleepAnalysis), 1, start, end, provenance));
+    objects.push_back(
+        std::make_shared<VSCategorySample>(type(VSCode::SleepAnalysis), 1, start, end, provenance));
     objects.push_back(bloodPressure(120, 80, "2020-03-01T08:00", provenance));
     objects.push_back(std::make_shared<VSWorkout>(
-        37, date("2020-03-01T08:00"), date("2020-03-01T09:00"), std::chrono::minutes(50), VSQuantity(VSUnit::fromString("kJ"), 418.4),
-        VSQuantity(VSUnit::fromString("km"), 10.5),
-        std::vector<VSWorkoutEvent>{{1, date("2020-03-01T08:20")}, {2, date("2020-03-01T08:30")}, {7, std::nullopt}}, provenance));
+        37, date("2020-03-01T08:00"), date("2020-03-01T09:00"), std::chrono::minutes(50),
+        VSQuantity(VSUnit::fromString("kJ"), 418.4), VSQuantity(VSUnit::fromString("km"), 10.5),
+        std::vector<VSWorkoutEvent>{
+            {1, date("2020-03-01T08:20")}, {2, date("2020-03-01T08:30")}, {7, std::nullopt}},
+        provenance));
     EXPECT_OK(store->saveObjectsAndWait(objects));
     store.reset();
     store = openStore(folder.path() / "store");
@@ -101,7 +110,8 @@ TEST_F(StoreBasics, WhatHasNoProvenanceIsTheApplicationsOwnAndOfNow) {
 TEST_F(StoreBasics, OneBadObjectKeepsAllOut) {
     const auto good = quantity(heartRate(), 60, "2020-03-01T08:00", "2020-03-01T08:00");
     const std::vector<VSSamplePtr> bad = {
-        std::make_shared<VSCategorySample>(type(VSCode::SleepAnalysis), 77, date("2020-03-01T08:00"), date("2020-03-01T08:00")),
+        std::make_shared<VSCategorySample>(type(VSCode::SleepAnalysis), 77, date("2020-03-01T08:00"),
+                                           date("2020-03-01T08:00")),
         quantity(heartRate(), 60, VSDate::distantPast(), date("2020-03-01T08:00")),
         quantity(heartRate(), 60, date("2020-03-01T08:00"), VSDate::distantFuture()),
     };
@@ -109,14 +119,16 @@ TEST_F(StoreBasics, OneBadObjectKeepsAllOut) {
         const VSStatus status = store->saveObjectsAndWait({good, object});
         ASSERT_FALSE(status.ok());
         EXPECT_EQ(status.error().code, VSErrorCode::Invalid);
-        EXPECT_NE(status.error().message.find(object->sampleType()->name()), std::string::npos) << status.error().message;
+        EXPECT_NE(status.error().message.find(object->sampleType()->name()), std::string::npos)
+            << status.error().message;
     }
     EXPECT_TRUE(allSamples(*store, heartRate()).empty());
     expectSound(*store);
 }
 
 TEST_F(StoreBasics, DeletionTakesTheObjectAndLeavesMembers) {
-    EXPECT_OK(store->saveObjectsAndWait({bloodPressure(120, 80, "2020-03-01T08:00"), bloodPressure(130, 85, "2020-03-02T08:00")}));
+    EXPECT_OK(store->saveObjectsAndWait(
+        {bloodPressure(120, 80, "2020-03-01T08:00"), bloodPressure(130, 85, "2020-03-02T08:00")}));
     const auto pressures = allSamples(*store, type(VSCode::BloodPressure));
     VSPredicate alone;
     alone.noCorrelation = true;
@@ -134,7 +146,9 @@ TEST_F(StoreBasics, DeletionTakesTheObjectAndLeavesMembers) {
 
     // A reading goes with its values: members first, then the correlation.
     const auto& reading = dynamic_cast<const VSCorrelation&>(*pressures[1]);
-    EXPECT_OK(wait([&](auto done) { store->deleteObjects({reading.objects()[0], reading.objects()[1], pressures[1]}, done); }));
+    EXPECT_OK(wait([&](auto done) {
+        store->deleteObjects({reading.objects()[0], reading.objects()[1], pressures[1]}, done);
+    }));
     EXPECT_EQ(allSamples(*store, type(VSCode::BloodPressureSystolic)).size(), 1u);
     expectSound(*store);
 }
@@ -143,11 +157,14 @@ TEST_F(StoreBasics, DeletesByTypeAndSource) {
     std::vector<VSSamplePtr> objects;
     for (int i = 0; i < 40; ++i) {
         const VSDate start = date("2020-03-01") + std::chrono::hours(7 * i);
-        objects.push_back(quantity(steps(), i, start, start + std::chrono::hours(3), from(i % 2 ? "Phone" : "Watch")));
+        objects.push_back(
+            quantity(steps(), i, start, start + std::chrono::hours(3), from(i % 2 ? "Phone" : "Watch")));
         objects.push_back(quantity(heartRate(), i, start, start, from("Watch")));
     }
     EXPECT_OK(store->saveObjectsAndWait(objects));
-    EXPECT_OK(wait([&](auto done) { store->deleteAllSamples({steps()}, VSSource::forImportedName("Phone").bundleIdentifier, done); }));
+    EXPECT_OK(wait([&](auto done) {
+        store->deleteAllSamples({steps()}, VSSource::forImportedName("Phone").bundleIdentifier, done);
+    }));
     EXPECT_EQ(allSamples(*store, steps()).size(), 20u);
     expectSound(*store);
     EXPECT_OK(wait([&](auto done) { store->deleteAllSamples({steps(), heartRate()}, std::nullopt, done); }));
@@ -157,9 +174,11 @@ TEST_F(StoreBasics, DeletesByTypeAndSource) {
 }
 
 TEST_F(StoreBasics, RelatesSamplesToAWorkoutOnce) {
-    const VSSamplePtr workout = std::make_shared<VSWorkout>(37, date("2020-03-01T08:00"), date("2020-03-01T09:00"), VSDuration(0),
-                                                            std::nullopt, std::nullopt, std::vector<VSWorkoutEvent>{});
-    const auto distance = quantity(type(VSCode::DistanceWalkingRunning), 5000, "2020-03-01T08:00", "2020-03-01T09:00");
+    const VSSamplePtr workout =
+        std::make_shared<VSWorkout>(37, date("2020-03-01T08:00"), date("2020-03-01T09:00"), VSDuration(0),
+                                    std::nullopt, std::nullopt, std::vector<VSWorkoutEvent>{});
+    const auto distance =
+        quantity(type(VSCode::DistanceWalkingRunning), 5000, "2020-03-01T08:00", "2020-03-01T09:00");
     const VSStatus early = wait([&](auto done) { store->addSamplesToWorkout({distance}, workout, done); });
     ASSERT_FALSE(early.ok());
     EXPECT_EQ(early.error().code, VSErrorCode::NotFound);
@@ -174,17 +193,21 @@ TEST_F(StoreBasics, KeepsDefaultsCharacteristicsAndMedicalID) {
     const VSValue value(VSValue::Dictionary{{"list", VSValue::Array{1, 2.5, "three"}}, {"yes", true}});
     EXPECT_OK(wait([&](auto done) { store->setDefaultValue(value, "key", done); }));
     Promise<std::optional<VSValue>> read;
-    store->getDefaultValue("key", [&](const auto& result) { read.set(result.ok() ? *result : std::nullopt); });
+    store->getDefaultValue("key",
+                           [&](const auto& result) { read.set(result.ok() ? *result : std::nullopt); });
     EXPECT_EQ(read.wait(), std::optional(std::optional(value)));
     // What was accepted before the question is in the answer.
     Promise<std::optional<VSValue>> overtaking;
     store->setDefaultValue(7, "key", nullptr);
-    store->getDefaultValue("key", [&](const auto& result) { overtaking.set(result.ok() ? *result : std::nullopt); });
+    store->getDefaultValue("key",
+                           [&](const auto& result) { overtaking.set(result.ok() ? *result : std::nullopt); });
     EXPECT_EQ(overtaking.wait(), std::optional(std::optional(VSValue(7))));
     VSHealthStore::Options other;
     other.applicationIdentifier = "org.example.other";
     Promise<std::optional<VSValue>> foreign;
-    openStore(store->folder(), other)->getDefaultValue("key", [&](const auto& result) { foreign.set(result.ok() ? *result : VSValue("failed")); });
+    openStore(store->folder(), other)->getDefaultValue("key", [&](const auto& result) {
+        foreign.set(result.ok() ? *result : VSValue("failed"));
+    });
     const auto foreignValue = foreign.wait();
     ASSERT_TRUE(foreignValue);
     EXPECT_FALSE(*foreignValue) << "another application has its own";

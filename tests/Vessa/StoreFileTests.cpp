@@ -29,10 +29,13 @@ struct StoreFile : testing::Test {
         const auto store = openStore(folder.path());
         std::vector<VSSamplePtr> objects;
         for (int i = 0; i < samples; ++i)
-            objects.push_back(quantity(heartRate(), i, date("2020-03-01") + std::chrono::seconds(i), date("2020-03-01") + std::chrono::seconds(i)));
+            objects.push_back(quantity(heartRate(), i, date("2020-03-01") + std::chrono::seconds(i),
+                                       date("2020-03-01") + std::chrono::seconds(i)));
         EXPECT_OK(store->saveObjectsAndWait(objects));
     }
-    void change(const char* sql) const { VSDatabase(file, VSDatabase::Mode::Write, VSDuration(0)).execute(sql); }
+    void change(const char* sql) const {
+        VSDatabase(file, VSDatabase::Mode::Write, VSDuration(0)).execute(sql);
+    }
     VSErrorCode refusal(VSHealthStore::Options options = {}) const {
         const auto store = VSHealthStore::open(folder.path(), options);
         EXPECT_FALSE(store.ok());
@@ -42,12 +45,13 @@ struct StoreFile : testing::Test {
     }
 };
 
-/// Another process that runs the block and ends; it shares nothing with this one but the pipes. No other thread
-/// runs in a test that makes one.
+/// Another process that runs the block and ends; it shares nothing with this one but the pipes. No other
+/// thread runs in a test that makes one.
 class Child {
-   public:
+ public:
     /// The block gets a function that says a line to the parent and one that waits for the parent's word.
-    using Block = std::function<void(const std::function<void(char)>& say, const std::function<bool()>& listen)>;
+    using Block =
+        std::function<void(const std::function<void(char)>& say, const std::function<bool()>& listen)>;
     explicit Child(const Block& block) {
         int up[2], down[2];
         if (pipe2(up, O_CLOEXEC) || pipe2(down, O_CLOEXEC)) std::abort();
@@ -55,8 +59,14 @@ class Child {
         if (process_ == 0) {
             close(up[0]);
             close(down[1]);
-            block([&](char word) { if (write(up[1], &word, 1) != 1) _exit(2); },
-                  [&] { char word; return read(down[0], &word, 1) == 1; });
+            block(
+                [&](char word) {
+                    if (write(up[1], &word, 1) != 1) _exit(2);
+                },
+                [&] {
+                    char word;
+                    return read(down[0], &word, 1) == 1;
+                });
             _exit(0);
         }
         close(up[1]);
@@ -69,8 +79,13 @@ class Child {
         close(hear_);
         close(tell_);
     }
-    bool hear() { char word; return read(hear_, &word, 1) == 1; }
-    void tell() { if (write(tell_, "x", 1) != 1) ADD_FAILURE() << "the other process is gone"; }
+    bool hear() {
+        char word;
+        return read(hear_, &word, 1) == 1;
+    }
+    void tell() {
+        if (write(tell_, "x", 1) != 1) ADD_FAILURE() << "the other process is gone";
+    }
     void kill() {
         ::kill(process_, SIGKILL);
         end();
@@ -81,7 +96,7 @@ class Child {
         process_ = 0;
     }
 
-   private:
+ private:
     pid_t process_;
     int hear_, tell_;
 };
@@ -92,12 +107,26 @@ TEST_F(StoreFile, BelongsToItsUserOnly) {
     const auto inner = folder.path() / "deep" / "store";
     openStore(inner);
     const auto rights = [](const std::filesystem::path& path) {
-        struct stat status{};
+        struct stat status {};
         EXPECT_EQ(stat(path.c_str(), &status), 0) << path;
         return status.st_mode & 0777;
     };
     EXPECT_EQ(rights(inner), 0700u);
     EXPECT_EQ(rights(inner / "vessa.sqlite"), 0600u);
+}
+
+TEST_F(StoreFile, IsCompleteInItselfAfterTheLastConnectionClosed) {
+    {
+        const auto store = openStore(folder.path());
+        auto transaction = store->beginImport("document");
+        ASSERT_TRUE((*transaction)->add(*quantity(heartRate(), 1, "2020-03-01", "2020-03-01")).ok());
+        EXPECT_OK((*transaction)->commit());
+        EXPECT_EQ(allSamples(*store, heartRate()).size(), 1u);
+    }
+    EXPECT_FALSE(std::filesystem::exists(file.string() + "-wal"));
+    TemporaryFolder copy;
+    std::filesystem::copy(file, copy.path() / "vessa.sqlite");
+    EXPECT_EQ(allSamples(*openStore(copy.path()), heartRate()).size(), 1u);
 }
 
 TEST_F(StoreFile, IsRefusedUntouchedWhenItIsNotOurs) {
@@ -150,7 +179,8 @@ TEST_F(StoreFile, DamageIsReportedAndNothingIsChanged) {
 
 TEST_F(StoreFile, TheCheckFindsWhatWasTamperedWith) {
     makeStore();
-    for (const char* sql : {"UPDATE samples SET value = 9 WHERE value = 5", "UPDATE type_sources SET count = 11", "DELETE FROM rollups",
+    for (const char* sql : {"UPDATE samples SET value = 9 WHERE value = 5",
+                            "UPDATE type_sources SET count = 11", "DELETE FROM rollups",
                             "DELETE FROM samples WHERE value = 3", "UPDATE provenances SET source = 99"}) {
         TemporaryFolder copy;
         std::filesystem::copy(folder.path(), copy.path(), std::filesystem::copy_options::recursive);
@@ -180,7 +210,8 @@ TEST_F(StoreFile, AFullDiskFailsTheSaveAndHurtsNothing) {
     EXPECT_OK(store->saveObjectsAndWait({quantity(heartRate(), 1, "2020-03-01", "2020-03-01")}));
     std::vector<VSSamplePtr> many;
     for (int i = 0; i < 50000; ++i)
-        many.push_back(quantity(heartRate(), i, date("2020-03-01") + std::chrono::seconds(i), date("2020-03-01") + std::chrono::seconds(i)));
+        many.push_back(quantity(heartRate(), i, date("2020-03-01") + std::chrono::seconds(i),
+                                date("2020-03-01") + std::chrono::seconds(i)));
 
     signal(SIGXFSZ, SIG_IGN);
     rlimit before{};
@@ -199,9 +230,10 @@ TEST_F(StoreFile, AFullDiskFailsTheSaveAndHurtsNothing) {
 }
 
 TEST_F(StoreFile, AnotherConnectionSeesAndHearsOfChanges) {
-    const auto writing = openStore(folder.path()), watching = openStore(folder.path());
     Log<bool> told;
-    watching->executeQuery(std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto& error) { told.add(!error); }));
+    const auto writing = openStore(folder.path()), watching = openStore(folder.path());
+    watching->executeQuery(std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(),
+                                                             [&](const auto& error) { told.add(!error); }));
     ASSERT_TRUE(told.waitFor(1));
     EXPECT_OK(writing->saveObjectsAndWait({quantity(heartRate(), 1, "2020-03-01", "2020-03-01")}));
     ASSERT_TRUE(told.waitFor(2));
@@ -210,8 +242,10 @@ TEST_F(StoreFile, AnotherConnectionSeesAndHearsOfChanges) {
     auto provenance = from("Phone");
     provenance.metadata = std::make_shared<VSMetadata>(VSMetadata{{"k", 1}});
     for (int i = 0; i < 3; ++i) {
-        EXPECT_OK(writing->saveObjectsAndWait({quantity(heartRate(), i, "2020-03-02", "2020-03-02", provenance)}));
-        EXPECT_OK(watching->saveObjectsAndWait({quantity(heartRate(), i, "2020-03-02", "2020-03-02", provenance)}));
+        EXPECT_OK(
+            writing->saveObjectsAndWait({quantity(heartRate(), i, "2020-03-02", "2020-03-02", provenance)}));
+        EXPECT_OK(
+            watching->saveObjectsAndWait({quantity(heartRate(), i, "2020-03-02", "2020-03-02", provenance)}));
     }
     EXPECT_EQ(writing->sourceSummaries()->size(), 2u);
     expectSound(*writing);
@@ -224,9 +258,10 @@ TEST_F(StoreFile, AnotherProcessIsHeardOf) {
         if (store->saveObjectsAndWait({quantity(heartRate(), 1, "2020-03-01", "2020-03-01")}).ok()) say('+');
     });
     {
-        const auto store = openStore(folder.path());
         Log<size_t> told;
-        store->executeQuery(std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto&) { told.add(0); }));
+        const auto store = openStore(folder.path());
+        store->executeQuery(
+            std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto&) { told.add(0); }));
         ASSERT_TRUE(told.waitFor(1));
         child.tell();
         EXPECT_TRUE(child.hear());
@@ -245,7 +280,9 @@ TEST_F(StoreFile, AKilledProcessLosesNoAcknowledgedSave) {
                 // Some saves are large, some replace what was there, so that every phase of a commit is hit.
                 std::vector<VSSamplePtr> objects;
                 for (int n = 0; n < (i % 7 == 3 ? 500 : 1); ++n)
-                    objects.push_back(quantity(steps(), n, date("2020-03-01") + std::chrono::minutes(i), date("2020-03-01") + std::chrono::minutes(i + 30), from("Watch")));
+                    objects.push_back(quantity(steps(), n, date("2020-03-01") + std::chrono::minutes(i),
+                                               date("2020-03-01") + std::chrono::minutes(i + 30),
+                                               from("Watch")));
                 objects.push_back(quantity(heartRate(), round, "2020-03-01", "2020-03-01"));
                 if (!store->saveObjectsAndWait(objects).ok()) _exit(3);
                 say('+');
@@ -269,7 +306,11 @@ TEST_F(StoreFile, AKilledImportLeavesNoTrace) {
         const auto store = openStore(folder.path());
         auto transaction = store->beginImport("killed");
         for (int i = 0; i < 60000; ++i)
-            if (!(*transaction)->add(*quantity(steps(), i, date("2020-03-01") + std::chrono::minutes(i), date("2020-03-01") + std::chrono::minutes(i + 1), from("New"))).ok()) _exit(3);
+            if (!(*transaction)
+                     ->add(*quantity(steps(), i, date("2020-03-01") + std::chrono::minutes(i),
+                                     date("2020-03-01") + std::chrono::minutes(i + 1), from("New")))
+                     .ok())
+                _exit(3);
         say('+');
         listen();
     });

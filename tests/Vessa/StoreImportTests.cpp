@@ -15,7 +15,9 @@ struct Tally {
     int added = 0, present = 0;
     friend bool operator==(const Tally&, const Tally&) = default;
 };
-std::ostream& operator<<(std::ostream& stream, const Tally& tally) { return stream << tally.added << " added, " << tally.present << " present"; }
+std::ostream& operator<<(std::ostream& stream, const Tally& tally) {
+    return stream << tally.added << " added, " << tally.present << " present";
+}
 
 struct StoreImport : testing::Test {
     FixedEnvironment environment;
@@ -42,10 +44,12 @@ VSSamplePtr pulse(double value, const std::string& start, VSProvenance provenanc
 }
 
 VSSamplePtr reading(const std::vector<VSSamplePtr>& members) {
-    return std::make_shared<VSCorrelation>(type(VSCode::BloodPressure), members[0]->startDate(), members[0]->endDate(), members, from("Cuff"));
+    return std::make_shared<VSCorrelation>(type(VSCode::BloodPressure), members[0]->startDate(),
+                                           members[0]->endDate(), members, from("Cuff"));
 }
 
-std::vector<VSSamplePtr> pressure(double systolic, double diastolic, const std::string& when = "2020-03-01T08:00") {
+std::vector<VSSamplePtr> pressure(double systolic, double diastolic,
+                                  const std::string& when = "2020-03-01T08:00") {
     return {quantity(type(VSCode::BloodPressureSystolic), systolic, when, when, from("Cuff")),
             quantity(type(VSCode::BloodPressureDiastolic), diastolic, when, when, from("Cuff"))};
 }
@@ -77,7 +81,8 @@ TEST_F(StoreImport, EqualMeansEverythingThatTheDocumentSays) {
         if (i == 2) other.metadata = std::make_shared<VSMetadata>(VSMetadata{{"k", "w"}});
         if (i == 3) other.creationDate = date("2020-03-01T09:01");
         if (i == 4) other.timeZoneOffset = 7200;
-        different[i] = i == 5 ? quantity(heartRate(), 60, "2020-03-01T08:00", "2020-03-01T08:01", other) : pulse(60, "2020-03-01T08:00", other);
+        different[i] = i == 5 ? quantity(heartRate(), 60, "2020-03-01T08:00", "2020-03-01T08:01", other)
+                              : pulse(60, "2020-03-01T08:00", other);
     }
     EXPECT_EQ(import(different), (Tally{6, 0}));
     EXPECT_EQ(import(different), (Tally{0, 6}));
@@ -88,7 +93,8 @@ TEST_F(StoreImport, EqualMeansEverythingThatTheDocumentSays) {
     // The same quantity in another unit, which rounds.
     const VSObjectType* distance = type(VSCode::DistanceWalkingRunning);
     const auto inUnit = [&](const char* unit, double value) {
-        return std::make_shared<VSQuantitySample>(distance, VSQuantity(VSUnit::fromString(unit), value), date("2020-03-01"), date("2020-03-01"), base);
+        return std::make_shared<VSQuantitySample>(distance, VSQuantity(VSUnit::fromString(unit), value),
+                                                  date("2020-03-01"), date("2020-03-01"), base);
     };
     EXPECT_EQ(import({inUnit("km", 1.1)}), (Tally{1, 0}));
     EXPECT_EQ(import({inUnit("m", 1100)}), (Tally{0, 1}));
@@ -112,7 +118,8 @@ TEST_F(StoreImport, MembersJoinTheirTopLevelRecordsInAnyOrder) {
         EXPECT_EQ(count(VSCode::BloodPressureDiastolic), 2u);
         VSPredicate alone;
         alone.noCorrelation = true;
-        EXPECT_TRUE(store->samples(type(VSCode::BloodPressureSystolic), alone, 0, {})->empty()) << "each is a member of one";
+        EXPECT_TRUE(store->samples(type(VSCode::BloodPressureSystolic), alone, 0, {})->empty())
+            << "each is a member of one";
         for (const auto& again : documents) EXPECT_EQ(import(again), (Tally{0, 6}));
         expectSound(*store);
         store.reset();
@@ -132,7 +139,8 @@ TEST_F(StoreImport, WhatIsNotCommittedLeavesNoTraceAndBlocksNobodyAfterwards) {
     {
         auto transaction = store->beginImport("cancelled");
         ASSERT_TRUE(transaction.ok());
-        for (int i = 0; i < 1000; ++i) ASSERT_TRUE((*transaction)->add(*pulse(i, "2020-03-02T08:00", from("New"))).ok());
+        for (int i = 0; i < 1000; ++i)
+            ASSERT_TRUE((*transaction)->add(*pulse(i, "2020-03-02T08:00", from("New"))).ok());
         EXPECT_EQ(*(*transaction)->setCharacteristicsIfUnset(VSBirthDate{1970, 1, 1}, 1, 0, 0), 2);
         EXPECT_EQ(count(VSCode::HeartRate), 1u) << "nobody sees it before the commit";
         const auto second = store->beginImport("second", std::chrono::milliseconds(50));
@@ -148,7 +156,8 @@ TEST_F(StoreImport, WhatIsNotCommittedLeavesNoTraceAndBlocksNobodyAfterwards) {
 
 TEST_F(StoreImport, ASaveWaitsForAnImportAndQueriesHearOfItsCommit) {
     Log<size_t> told;
-    auto query = std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto&) { told.add(0); });
+    auto query =
+        std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto&) { told.add(0); });
     store->executeQuery(query);
     ASSERT_TRUE(told.waitFor(1));
     auto transaction = store->beginImport("document");
@@ -160,6 +169,7 @@ TEST_F(StoreImport, ASaveWaitsForAnImportAndQueriesHearOfItsCommit) {
     EXPECT_EQ(saved.wait(), true);
     ASSERT_TRUE(told.waitFor(2));
     EXPECT_EQ(count(VSCode::HeartRate), 2u);
+    store.reset();  // before what its handlers use
 }
 
 TEST_F(StoreImport, SetsOnlyCharacteristicsThatAreNotSet) {
@@ -174,7 +184,8 @@ TEST_F(StoreImport, SetsOnlyCharacteristicsThatAreNotSet) {
 
 TEST_F(StoreImport, ABadRecordIsRefusedAndTheOthersGoOn) {
     auto transaction = store->beginImport("document");
-    const auto bad = std::make_shared<VSCategorySample>(type(VSCode::SleepAnalysis), 77, date("2020-03-01"), date("2020-03-01"));
+    const auto bad = std::make_shared<VSCategorySample>(type(VSCode::SleepAnalysis), 77, date("2020-03-01"),
+                                                        date("2020-03-01"));
     const auto outcome = (*transaction)->add(*bad);
     ASSERT_FALSE(outcome.ok());
     EXPECT_EQ(outcome.error().code, VSErrorCode::Invalid);

@@ -14,12 +14,16 @@ struct StoreQueries : testing::Test {
     TemporaryFolder folder;
     std::shared_ptr<VSHealthStore> store = openStore(folder.path());
 
-    void save(double value, const std::string& start, const std::string& end = "", const VSObjectType* of = heartRate(), VSProvenance provenance = {}) {
-        EXPECT_OK(store->saveObjectsAndWait({quantity(of, value, start, end.empty() ? start : end, std::move(provenance))}));
+    void save(double value, const std::string& start, const std::string& end = "",
+              const VSObjectType* of = heartRate(), VSProvenance provenance = {}) {
+        EXPECT_OK(store->saveObjectsAndWait(
+            {quantity(of, value, start, end.empty() ? start : end, std::move(provenance))}));
     }
 };
 
-double valueOf(const VSSamplePtr& sample) { return dynamic_cast<const VSQuantitySample&>(*sample).quantity().value(); }
+double valueOf(const VSSamplePtr& sample) {
+    return dynamic_cast<const VSQuantitySample&>(*sample).quantity().value();
+}
 
 std::vector<double> valuesOf(const std::vector<VSSamplePtr>& samples) {
     std::vector<double> values;
@@ -32,7 +36,9 @@ std::vector<double> valuesOf(const std::vector<VSSamplePtr>& samples) {
 /// Predicates, orders and limits against plain filtering and sorting of everything.
 TEST_F(StoreQueries, AgreesWithFilteringEverything) {
     std::mt19937 random(11);
-    const auto pick = [&](int64_t from, int64_t to) { return std::uniform_int_distribution<int64_t>(from, to)(random); };
+    const auto pick = [&](int64_t from, int64_t to) {
+        return std::uniform_int_distribution<int64_t>(from, to)(random);
+    };
     const VSDate origin = date("2020-03-01");
     const std::vector<VSProvenance> provenances = {from("Watch"), from("Phone", "2"), {}};
     auto tagged = from("Watch");
@@ -40,45 +46,59 @@ TEST_F(StoreQueries, AgreesWithFilteringEverything) {
     tagged.device = std::make_shared<VSDevice>(VSDevice{"Band", {}, {}, {}, {}, {}, {}, {}});
     std::vector<VSSamplePtr> objects;
     for (int i = 0; i < 600; ++i) {
-        const int64_t lengths[] = {0, 0, pick(1, 3600), 86400 * pick(1, 2), 86400 * pick(3, 9), pick(1, 7) * 900};
-        const VSDate start = origin + std::chrono::seconds(pick(0, 9) == 0 ? 3600 * pick(0, 240) : pick(0, 864000));
+        const int64_t lengths[] = {
+            0, 0, pick(1, 3600), 86400 * pick(1, 2), 86400 * pick(3, 9), pick(1, 7) * 900};
+        const VSDate start =
+            origin + std::chrono::seconds(pick(0, 9) == 0 ? 3600 * pick(0, 240) : pick(0, 864000));
         const VSDate end = start + std::chrono::seconds(lengths[pick(0, 5)]);
-        objects.push_back(quantity(steps(), static_cast<double>(pick(0, 50)), start, end, pick(0, 5) == 0 ? tagged : provenances[static_cast<size_t>(pick(0, 2))]));
+        objects.push_back(quantity(steps(), static_cast<double>(pick(0, 50)), start, end,
+                                   pick(0, 5) == 0 ? tagged : provenances[static_cast<size_t>(pick(0, 2))]));
     }
     EXPECT_OK(store->saveObjectsAndWait(objects));
     const auto all = allSamples(*store, steps());
     ASSERT_EQ(all.size(), objects.size());
 
     for (int round = 0; round < 400; ++round) {
-        const VSDate a = origin + std::chrono::hours(pick(-30, 250)), b = a + std::chrono::hours(pick(0, 100));
-        VSPredicate predicate = VSPredicate::samplesWithStartDate(pick(0, 3) ? std::optional(a) : std::nullopt, pick(0, 3) ? std::optional(b) : std::nullopt,
-                                                                 static_cast<int>(pick(0, 3)));
-        if (pick(0, 3) == 0) predicate = predicate & VSPredicate::samplesStartingBefore(origin + std::chrono::hours(pick(0, 240)));
+        const VSDate a = origin + std::chrono::hours(pick(-30, 250)),
+                     b = a + std::chrono::hours(pick(0, 100));
+        VSPredicate predicate = VSPredicate::samplesWithStartDate(
+            pick(0, 3) ? std::optional(a) : std::nullopt, pick(0, 3) ? std::optional(b) : std::nullopt,
+            static_cast<int>(pick(0, 3)));
+        if (pick(0, 3) == 0)
+            predicate =
+                predicate & VSPredicate::samplesStartingBefore(origin + std::chrono::hours(pick(0, 240)));
         if (pick(0, 3) == 0) predicate.sources = {VSSource::forImportedName("Phone")};
         if (pick(0, 7) == 0) predicate.metadataKeys = {"tag"};
         if (pick(0, 7) == 0) predicate = predicate & VSPredicate::withMetadata("tag", pick(0, 1) ? 1 : 2);
         if (pick(0, 7) == 0) predicate.device = *tagged.device;
         std::vector<VSSortDescriptor> sort;
-        const char* keys[] = {VSSampleSortIdentifierStartDate, VSSampleSortIdentifierEndDate, VSObjectSortIdentifierDataID};
-        for (int i = static_cast<int>(pick(0, 2)); i > 0; --i) sort.push_back({keys[pick(0, 2)], pick(0, 1) == 0});
+        const char* keys[] = {VSSampleSortIdentifierStartDate, VSSampleSortIdentifierEndDate,
+                              VSObjectSortIdentifierDataID};
+        for (int i = static_cast<int>(pick(0, 2)); i > 0; --i)
+            sort.push_back({keys[pick(0, 2)], pick(0, 1) == 0});
         const int limit = static_cast<int>(pick(0, 1) ? 0 : pick(1, 30));
 
         std::vector<VSSamplePtr> expected;
-        std::copy_if(all.begin(), all.end(), std::back_inserter(expected), [&](const auto& s) { return predicate.matches(*s); });
+        std::copy_if(all.begin(), all.end(), std::back_inserter(expected),
+                     [&](const auto& s) { return predicate.matches(*s); });
         std::sort(expected.begin(), expected.end(), [&](const VSSamplePtr& x, const VSSamplePtr& y) {
             for (const auto& key : sort) {
                 const auto value = [&](const VSSamplePtr& s) {
-                    return key.key == keys[0] ? s->startDate().microseconds() : key.key == keys[1] ? s->endDate().microseconds() : VSObjectIDValue(s->dataID());
+                    return key.key == keys[0]   ? s->startDate().microseconds()
+                           : key.key == keys[1] ? s->endDate().microseconds()
+                                                : VSObjectIDValue(s->dataID());
                 };
                 if (value(x) != value(y)) return key.ascending == (value(x) < value(y));
             }
             return (sort.empty() || sort[0].ascending) == (x->dataID() < y->dataID());
         });
-        if (limit && expected.size() > static_cast<size_t>(limit)) expected.resize(static_cast<size_t>(limit));
+        if (limit && expected.size() > static_cast<size_t>(limit))
+            expected.resize(static_cast<size_t>(limit));
         const auto found = store->samples(steps(), predicate, limit, sort);
         ASSERT_TRUE(found.ok()) << found.error().message;
         ASSERT_EQ(found->size(), expected.size()) << "round " << round;
-        for (size_t i = 0; i < expected.size(); ++i) ASSERT_EQ((*found)[i]->dataID(), expected[i]->dataID()) << "round " << round << ", place " << i;
+        for (size_t i = 0; i < expected.size(); ++i)
+            ASSERT_EQ((*found)[i]->dataID(), expected[i]->dataID()) << "round " << round << ", place " << i;
     }
     const auto unknown = store->samples(steps(), {}, 0, {{"value", true}});
     ASSERT_FALSE(unknown.ok());
@@ -88,7 +108,8 @@ TEST_F(StoreQueries, AgreesWithFilteringEverything) {
 TEST_F(StoreQueries, ObserverFiresAtItsStartAndAfterChangesOfItsTypeOnly) {
     save(60, "2020-03-01T08:00");
     Log<bool> told;
-    auto query = std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto& error) { told.add(!error); });
+    auto query = std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(),
+                                                   [&](const auto& error) { told.add(!error); });
     store->executeQuery(query);
     ASSERT_TRUE(told.waitFor(1));
     save(100, "2020-03-01T08:00", "", steps());  // another type
@@ -97,9 +118,11 @@ TEST_F(StoreQueries, ObserverFiresAtItsStartAndAfterChangesOfItsTypeOnly) {
     EXPECT_OK(wait([&](auto done) { store->deleteObject(allSamples(*store, heartRate())[0], done); }));
     ASSERT_TRUE(told.waitFor(3));
     store->stopQuery(query);
-    // A change after the stop is not told: a second observer, which hears of it, shows that there was time for it.
+    // A change after the stop is not told: a second observer, which hears of it, shows that there was time
+    // for it.
     Log<bool> witness;
-    auto other = std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto&) { witness.add(true); });
+    auto other = std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(),
+                                                   [&](const auto&) { witness.add(true); });
     store->executeQuery(other);
     ASSERT_TRUE(witness.waitFor(1));
     save(62, "2020-03-01T08:02");
@@ -113,18 +136,20 @@ TEST_F(StoreQueries, AnchoredQueryTellsEachChangeOnce) {
     using Answer = VSAnchoredObjectQuery::Answer;
     const auto ask = [&](VSQueryAnchor anchor, int limit) {
         Promise<VSResult<Answer>> promise;
-        store->executeQuery(std::make_shared<VSAnchoredObjectQuery>(heartRate(), VSPredicate(), anchor, limit, [&](const auto& a) { promise.set(a); }));
+        store->executeQuery(std::make_shared<VSAnchoredObjectQuery>(heartRate(), VSPredicate(), anchor, limit,
+                                                                    [&](const auto& a) { promise.set(a); }));
         return *promise.wait().value();
     };
-    const Answer first = ask({0}, 2), second = ask(first.anchor, 2), third = ask(second.anchor, 2), none = ask(third.anchor, 2);
+    const Answer first = ask({0}, 2), second = ask(first.anchor, 2), third = ask(second.anchor, 2),
+                 none = ask(third.anchor, 2);
     EXPECT_EQ(valuesOf(first.added), (std::vector<double>{0, 1}));
     EXPECT_EQ(valuesOf(second.added), (std::vector<double>{2, 3}));
     EXPECT_EQ(valuesOf(third.added), (std::vector<double>{4}));
     EXPECT_TRUE(none.added.empty() && none.deleted.empty());
 
     Log<Answer> live;
-    auto query = std::make_shared<VSAnchoredObjectQuery>(heartRate(), VSPredicate(), VSQueryAnchor::beyondAll(), 0,
-                                                         [&](const auto& a) { live.add(*a); });
+    auto query = std::make_shared<VSAnchoredObjectQuery>(
+        heartRate(), VSPredicate(), VSQueryAnchor::beyondAll(), 0, [&](const auto& a) { live.add(*a); });
     query->updateHandler = [&](const auto& a) { live.add(*a); };
     store->executeQuery(query);
     ASSERT_TRUE(live.waitFor(1));
@@ -145,6 +170,7 @@ TEST_F(StoreQueries, AnchoredQueryTellsEachChangeOnce) {
     EXPECT_EQ(valuesOf(since.added), (std::vector<double>{9}));
     EXPECT_EQ(since.deleted.size(), 1u);
     EXPECT_TRUE(ask({0}, 0).deleted.empty());
+    store.reset();  // before what its handlers use
 }
 
 TEST_F(StoreQueries, NumbersAreNeverUsedAgain) {
@@ -168,8 +194,8 @@ TEST_F(StoreQueries, CollectionFollowsChanges) {
         told.add(sums);
     };
     auto query = std::make_shared<VSStatisticsCollectionQuery>(
-        steps(), VSPredicate::samplesWithStartDate(date("2020-03-01"), date("2020-03-08"), 0), VSStatisticsOptionCumulativeSum, date("2020-03-01"),
-        VSDateComponents{0, 0, 1, 0, 0, 0});
+        steps(), VSPredicate::samplesWithStartDate(date("2020-03-01"), date("2020-03-08"), 0),
+        VSStatisticsOptionCumulativeSum, date("2020-03-01"), VSDateComponents{0, 0, 1, 0, 0, 0});
     query->initialResultsHandler = tell;
     query->statisticsUpdateHandler = tell;
     store->executeQuery(query);
@@ -178,21 +204,24 @@ TEST_F(StoreQueries, CollectionFollowsChanges) {
     ASSERT_TRUE(told.waitFor(2));
     EXPECT_EQ(told.entries()[0], (std::vector<double>{100}));
     EXPECT_EQ(told.entries()[1], (std::vector<double>{100, 20, 20}));
-    store->stopQuery(query);
+    store.reset();  // before what its handlers use
 }
 
-/// Whole-second spans that rollups, partial edges and single samples answer: see StoreStatisticsTests for the definition.
+/// Whole-second spans that rollups, partial edges and single samples answer: see StoreStatisticsTests for the
+/// definition.
 TEST_F(StoreQueries, StatisticsAnswerOnce) {
     save(60, "2020-03-01T08:00");
     save(80, "2020-03-01T10:00");
     Promise<VSResult<VSStatistics>> promise;
-    store->executeQuery(std::make_shared<VSStatisticsQuery>(heartRate(), VSPredicate(), VSStatisticsOptionDiscreteAverage | VSStatisticsOptionDiscreteMax,
-                                                            [&](const auto& result) { promise.set(result); }));
+    store->executeQuery(std::make_shared<VSStatisticsQuery>(
+        heartRate(), VSPredicate(), VSStatisticsOptionDiscreteAverage | VSStatisticsOptionDiscreteMax,
+        [&](const auto& result) { promise.set(result); }));
     const auto answer = promise.wait();
     EXPECT_EQ((*answer)->average, 70);
     EXPECT_EQ((*answer)->maximum, 80);
     EXPECT_FALSE((*answer)->minimum || (*answer)->sum) << "not asked for";
-    const auto empty = store->statistics(heartRate(), VSPredicate::samplesWithStartDate(date("2020-04-01"), std::nullopt, 0), 30);
+    const auto empty = store->statistics(
+        heartRate(), VSPredicate::samplesWithStartDate(date("2020-04-01"), std::nullopt, 0), 30);
     EXPECT_FALSE(empty->hasData());
     EXPECT_EQ(empty->count, 0);
 }
@@ -211,14 +240,18 @@ TEST_F(StoreQueries, SourcesStandInTheirOrder) {
         return *promise.wait();
     };
     EXPECT_EQ(order(), (std::vector<std::string>{"own", "Old", "Young"}));
-    EXPECT_OK(wait([&](auto done) { store->setOrderedSources({VSSource::forImportedName("Young"), VSSource::application()}, steps(), done); }));
+    EXPECT_OK(wait([&](auto done) {
+        store->setOrderedSources({VSSource::forImportedName("Young"), VSSource::application()}, steps(),
+                                 done);
+    }));
     EXPECT_EQ(order(), (std::vector<std::string>{"Young", "own", "Old"}));
     save(1, "2020-02-01T08:00", "", steps(), from("New"));
     EXPECT_EQ(order(), (std::vector<std::string>{"Young", "own", "New", "Old"}));
 
     Promise<size_t> sources;
-    store->executeQuery(std::make_shared<VSSourceQuery>(steps(), VSPredicate::samplesWithStartDate(date("2020-03-02"), std::nullopt, 0),
-                                                        [&](const auto& result) { sources.set(result->size()); }));
+    store->executeQuery(std::make_shared<VSSourceQuery>(
+        steps(), VSPredicate::samplesWithStartDate(date("2020-03-02"), std::nullopt, 0),
+        [&](const auto& result) { sources.set(result->size()); }));
     EXPECT_EQ(sources.wait(), 2u);
 }
 
@@ -229,15 +262,17 @@ TEST_F(StoreQueries, TheStoreMayEndInAHandler) {
         auto holder = std::make_shared<std::shared_ptr<VSHealthStore>>(openStore(folder.path()));
         VSHealthStore& inner = **holder;
         if (round % 2) {
-            inner.executeQuery(std::make_shared<VSSampleQuery>(heartRate(), VSPredicate(), 0, std::vector<VSSortDescriptor>(), [&, holder](const auto&) {
-                holder->reset();
-                ended.set(true);
-            }));
+            inner.executeQuery(std::make_shared<VSSampleQuery>(
+                heartRate(), VSPredicate(), 0, std::vector<VSSortDescriptor>(), [&, holder](const auto&) {
+                    holder->reset();
+                    ended.set(true);
+                }));
         } else {
-            inner.saveObject(quantity(heartRate(), 2, "2020-03-01T08:00", "2020-03-01T08:00"), [&, holder](const auto&) {
-                holder->reset();
-                ended.set(true);
-            });
+            inner.saveObject(quantity(heartRate(), 2, "2020-03-01T08:00", "2020-03-01T08:00"),
+                             [&, holder](const auto&) {
+                                 holder->reset();
+                                 ended.set(true);
+                             });
         }
         EXPECT_EQ(ended.wait(), true);
     }
@@ -247,7 +282,8 @@ TEST_F(StoreQueries, TheStoreMayEndInAHandler) {
 TEST_F(StoreQueries, AcceptedWritesAreDoneBeforeTheStoreEnds) {
     std::atomic<int> completed = 0;
     for (int i = 0; i < 50; ++i)
-        store->saveObject(quantity(heartRate(), i, "2020-03-01T08:00", "2020-03-01T08:00"), [&](const VSStatus& s) { completed += s.ok(); });
+        store->saveObject(quantity(heartRate(), i, "2020-03-01T08:00", "2020-03-01T08:00"),
+                          [&](const VSStatus& s) { completed += s.ok(); });
     store.reset();
     EXPECT_EQ(completed, 50);
     store = openStore(folder.path());

@@ -25,13 +25,18 @@ struct Expected {
     double sum = 0;
 };
 
-bool covers(const Plain& earlier, double moment) { return earlier.start <= moment && moment < earlier.end; }
+bool covers(const Plain& earlier, double moment) {
+    return earlier.start <= moment && moment < earlier.end;
+}
 
-/// How much of a sample's value counts in [from, to): its span is cut at every border of other samples, and each
-/// piece counts unless a sample of an earlier source covers its middle.
-double countedShare(const Plain& sample, const std::vector<Plain>& all, int64_t from, int64_t to, bool merged) {
+/// How much of a sample's value counts in [from, to): its span is cut at every border of other samples, and
+/// each piece counts unless a sample of an earlier source covers its middle.
+double countedShare(const Plain& sample, const std::vector<Plain>& all, int64_t from, int64_t to,
+                    bool merged) {
     const auto isCovered = [&](double moment) {
-        return merged && std::any_of(all.begin(), all.end(), [&](const Plain& other) { return other.rank < sample.rank && covers(other, moment); });
+        return merged && std::any_of(all.begin(), all.end(), [&](const Plain& other) {
+                   return other.rank < sample.rank && covers(other, moment);
+               });
     };
     if (sample.start == sample.end) return isCovered(static_cast<double>(sample.start)) ? 0 : sample.value;
     const int64_t a = std::max(sample.start, from), b = std::min(sample.end, to);
@@ -68,8 +73,8 @@ Expected expectedIn(const std::vector<Plain>& all, int64_t from, int64_t to, boo
     return expected;
 }
 
-constexpr int allOptions = VSStatisticsOptionDiscreteAverage | VSStatisticsOptionDiscreteMin | VSStatisticsOptionDiscreteMax |
-                           VSStatisticsOptionCumulativeSum;
+constexpr int allOptions = VSStatisticsOptionDiscreteAverage | VSStatisticsOptionDiscreteMin |
+                           VSStatisticsOptionDiscreteMax | VSStatisticsOptionCumulativeSum;
 
 template <typename Actual>
 void expectSame(const Actual& actual, const Expected& expected, const std::string& where) {
@@ -80,34 +85,51 @@ void expectSame(const Actual& actual, const Expected& expected, const std::strin
     }
     ASSERT_EQ(actual.average.has_value(), expected.count > 0) << where;
     if (!expected.count) return;
-    EXPECT_NEAR(*actual.average, expected.startingSum / static_cast<double>(expected.count), 1e-9 * std::max(1.0, std::abs(*actual.average))) << where;
+    EXPECT_NEAR(*actual.average, expected.startingSum / static_cast<double>(expected.count),
+                1e-9 * std::max(1.0, std::abs(*actual.average)))
+        << where;
     EXPECT_EQ(actual.minimum, expected.minimum) << where;
     EXPECT_EQ(actual.maximum, expected.maximum) << where;
 }
 
 /// A store with a random history, and the same history in plain form.
 class History {
-   public:
+ public:
     History(unsigned seed, const VSObjectType* type, const std::string& zone)
-        : random_(seed), type_(type), environment_("2020-03-31T20:00", zone), store_(openStore(folder_.path())) {
+        : random_(seed),
+          type_(type),
+          environment_("2020-03-31T20:00", zone),
+          store_(openStore(folder_.path())) {
         const char* origins[] = {"2020-03-27T00:00", "2020-10-23T00:00", "1985-12-30T00:00"};
         origin_ = date(origins[pick(0, 2)]);
         const char* names[] = {"Watch", "Phone", "Band"};
-        for (int i = static_cast<int>(pick(1, 4)); i > 0; --i) provenances_.push_back(i == 4 ? VSProvenance() : from(names[i - 1]));
-        if (pick(0, 2) == 0) provenances_.push_back(from("Watch", "2"));  // the same source in a later version
+        for (int i = static_cast<int>(pick(1, 4)); i > 0; --i)
+            provenances_.push_back(i == 4 ? VSProvenance() : from(names[i - 1]));
+        if (pick(0, 2) == 0)
+            provenances_.push_back(from("Watch", "2"));  // the same source in a later version
     }
 
-    int64_t pick(int64_t low, int64_t high) { return std::uniform_int_distribution<int64_t>(low, high)(random_); }
+    int64_t pick(int64_t low, int64_t high) {
+        return std::uniform_int_distribution<int64_t>(low, high)(random_);
+    }
     VSHealthStore& store() { return *store_; }
     VSDate origin() const { return origin_; }
 
     void addSome(int count) {
         std::vector<VSSamplePtr> objects;
         for (int i = 0; i < count; ++i) {
-            const VSDate start = origin_ + std::chrono::seconds(pick(0, 2) ? pick(0, 6 * 86400) : 900 * pick(0, 6 * 96));
-            const int64_t lengths[] = {0, pick(1, 900), 900 * pick(1, 8), pick(1, 20000), 86400 * pick(0, 4) + pick(0, 90000), 86400 * pick(0, 9) == 0 ? 86400 * 40 : 60};
-            objects.push_back(quantity(type_, static_cast<double>(pick(0, 100)), start, start + std::chrono::seconds(lengths[pick(0, 5)]),
-                                       provenances_[static_cast<size_t>(pick(0, static_cast<int64_t>(provenances_.size()) - 1))]));
+            const VSDate start =
+                origin_ + std::chrono::seconds(pick(0, 2) ? pick(0, 6 * 86400) : 900 * pick(0, 6 * 96));
+            const int64_t lengths[] = {0,
+                                       pick(1, 900),
+                                       900 * pick(1, 8),
+                                       pick(1, 20000),
+                                       86400 * pick(0, 4) + pick(0, 90000),
+                                       86400 * pick(0, 9) == 0 ? 86400 * 40 : 60};
+            objects.push_back(quantity(
+                type_, static_cast<double>(pick(0, 100)), start,
+                start + std::chrono::seconds(lengths[pick(0, 5)]),
+                provenances_[static_cast<size_t>(pick(0, static_cast<int64_t>(provenances_.size()) - 1))]));
         }
         EXPECT_OK(store_->saveObjectsAndWait(std::move(objects)));
     }
@@ -139,16 +161,21 @@ class History {
         for (const auto& sample : allSamples(*store_, type_)) {
             const auto place = std::find(sources.begin(), sources.end(), sample->sourceRevision().source);
             ASSERT_NE(place, sources.end());
-            plain.push_back({sample->startDate().microseconds() / 1'000'000, sample->endDate().microseconds() / 1'000'000,
-                             dynamic_cast<const VSQuantitySample&>(*sample).quantity().value(), static_cast<int>(place - sources.begin())});
+            plain.push_back({sample->startDate().microseconds() / 1'000'000,
+                             sample->endDate().microseconds() / 1'000'000,
+                             dynamic_cast<const VSQuantitySample&>(*sample).quantity().value(),
+                             static_cast<int>(place - sources.begin())});
         }
-        const VSDateComponents intervals[] = {{0, 0, 1, 0, 0, 0}, {0, 0, 0, 1, 0, 0}, {0, 0, 7, 0, 0, 0}, {0, 1, 0, 0, 0, 0}, {0, 0, 0, 0, 30, 0}, {0, 0, 0, 0, 7, 0}};
+        const VSDateComponents intervals[] = {{0, 0, 1, 0, 0, 0}, {0, 0, 0, 1, 0, 0},  {0, 0, 7, 0, 0, 0},
+                                              {0, 1, 0, 0, 0, 0}, {0, 0, 0, 0, 30, 0}, {0, 0, 0, 0, 7, 0}};
         const VSDateComponents interval = intervals[pick(0, 9) == 0 ? 5 : pick(0, 4)];
-        const VSDate from = origin_ + std::chrono::seconds(pick(0, 3) ? 86400 * pick(-2, 5) : pick(-86400, 500000));
+        const VSDate from =
+            origin_ + std::chrono::seconds(pick(0, 3) ? 86400 * pick(-2, 5) : pick(-86400, 500000));
         const VSDate to = from + std::chrono::seconds(pick(0, 3) ? 86400 * pick(1, 8) : pick(1, 700000));
         const VSDate anchor = pick(0, 2) ? VSCalendar::current().startOfDay(from) : from;
         const auto predicate = VSPredicate::samplesWithStartDate(from, to, 0);
-        const auto collection = store_->statisticsCollection(type_, predicate, allOptions | VSStatisticsOptionSeparateBySource, anchor, interval);
+        const auto collection = store_->statisticsCollection(
+            type_, predicate, allOptions | VSStatisticsOptionSeparateBySource, anchor, interval);
         ASSERT_TRUE(collection.ok()) << collection.error().message;
         std::map<VSDate, const VSStatistics*> found;
         for (const auto& bucket : (*collection)->statistics()) found[bucket.startDate] = &bucket;
@@ -157,7 +184,8 @@ class History {
         size_t met = 0;
         for (size_t i = 0; i + 1 < borders.size(); ++i) {
             // Of a bucket at the end of the range, the part inside of it.
-            const int64_t a = std::max(borders[i], from).microseconds() / 1'000'000, b = std::min(borders[i + 1], to).microseconds() / 1'000'000;
+            const int64_t a = std::max(borders[i], from).microseconds() / 1'000'000,
+                          b = std::min(borders[i + 1], to).microseconds() / 1'000'000;
             const Expected expected = expectedIn(plain, a, b, type_->isCumulative());
             const auto bucket = found.find(borders[i]);
             const std::string place = where + ", bucket " + std::to_string(i);
@@ -175,10 +203,13 @@ class History {
         }
         EXPECT_EQ(met, found.size()) << where;
         const auto single = store_->statistics(type_, predicate, allOptions);
-        expectSame(*single, expectedIn(plain, from.microseconds() / 1'000'000, to.microseconds() / 1'000'000, type_->isCumulative()), where + ", whole range");
+        expectSame(*single,
+                   expectedIn(plain, from.microseconds() / 1'000'000, to.microseconds() / 1'000'000,
+                              type_->isCumulative()),
+                   where + ", whole range");
     }
 
-   private:
+ private:
     std::mt19937 random_;
     const VSObjectType* const type_;
     FixedEnvironment environment_;
@@ -190,8 +221,8 @@ class History {
 
 }  // namespace
 
-/// Random histories, with deletions, new orders of the sources and additions between the questions, in zones with
-/// summer time and with odd offsets.
+/// Random histories, with deletions, new orders of the sources and additions between the questions, in zones
+/// with summer time and with odd offsets.
 TEST(StoreStatistics, AgreeWithTheDefinition) {
     const char* zones[] = {"Europe/Copenhagen", "America/New_York", "Asia/Kathmandu"};
     for (unsigned seed = 0; seed < 36 && !testing::Test::HasFailure(); ++seed) {
@@ -201,7 +232,8 @@ TEST(StoreStatistics, AgreeWithTheDefinition) {
             if (step) history.removeSome(static_cast<int>(history.pick(0, 25)));
             if (history.pick(0, 2) == 0) history.reorder();
             for (int question = 0; question < 6; ++question) {
-                history.compareOnce("seed " + std::to_string(seed) + ", step " + std::to_string(step) + ", question " + std::to_string(question));
+                history.compareOnce("seed " + std::to_string(seed) + ", step " + std::to_string(step) +
+                                    ", question " + std::to_string(question));
             }
             expectSound(history.store());  // the rollups kept equal rollups made anew, bit for bit
         }
@@ -215,13 +247,17 @@ TEST(StoreStatistics, TwoSourcesOfTheSameStepsCountOnce) {
     EXPECT_OK(store->saveObjectsAndWait({
         quantity(steps(), 1000, "2020-03-01T10:00", "2020-03-01T11:00", from("Phone")),
         quantity(steps(), 1200, "2020-03-01T10:30", "2020-03-01T11:30", from("Watch")),
-        quantity(steps(), 7, "2020-03-01T10:59:59", "2020-03-01T10:59:59", from("Watch")),  // its moment is the phone's
-        quantity(steps(), 5, "2020-03-01T11:00", "2020-03-01T11:00", from("Watch")),        // the phone's span ends before it
+        quantity(steps(), 7, "2020-03-01T10:59:59", "2020-03-01T10:59:59",
+                 from("Watch")),  // its moment is the phone's
+        quantity(steps(), 5, "2020-03-01T11:00", "2020-03-01T11:00",
+                 from("Watch")),  // the phone's span ends before it
     }));
-    const auto statistics = store->statistics(steps(), {}, VSStatisticsOptionCumulativeSum | VSStatisticsOptionSeparateBySource);
+    const auto statistics =
+        store->statistics(steps(), {}, VSStatisticsOptionCumulativeSum | VSStatisticsOptionSeparateBySource);
     EXPECT_EQ(statistics->sum, 1000 + 600 + 5);
     EXPECT_EQ(statistics->bySource.at(VSSource::forImportedName("Watch")).sum, 1212);
-    EXPECT_OK(wait([&](auto done) { store->setOrderedSources({VSSource::forImportedName("Watch")}, steps(), done); }));
+    EXPECT_OK(wait(
+        [&](auto done) { store->setOrderedSources({VSSource::forImportedName("Watch")}, steps(), done); }));
     EXPECT_EQ(store->statistics(steps(), {}, VSStatisticsOptionCumulativeSum)->sum, 1212 + 500);
 }
 
@@ -233,9 +269,11 @@ TEST(StoreStatistics, BordersInsideOfAQuarterAreExact) {
     const VSDate midnight = date("1930-06-02");
     ASSERT_NE(midnight.microseconds() % (900 * 1'000'000), 0);
     const auto second = std::chrono::seconds(1);
-    EXPECT_OK(store->saveObjectsAndWait({quantity(heartRate(), 50, midnight - second, midnight - second), quantity(heartRate(), 70, midnight, midnight),
+    EXPECT_OK(store->saveObjectsAndWait({quantity(heartRate(), 50, midnight - second, midnight - second),
+                                         quantity(heartRate(), 70, midnight, midnight),
                                          quantity(heartRate(), 90, midnight + second, midnight + second)}));
-    const auto days = store->statisticsCollection(heartRate(), {}, VSStatisticsOptionDiscreteAverage, midnight, {0, 0, 1, 0, 0, 0});
+    const auto days = store->statisticsCollection(heartRate(), {}, VSStatisticsOptionDiscreteAverage,
+                                                  midnight, {0, 0, 1, 0, 0, 0});
     ASSERT_EQ((*days)->statistics().size(), 2u);
     EXPECT_EQ((*days)->statistics()[0].average, 50);
     EXPECT_EQ((*days)->statistics()[1].average, 80);
@@ -245,12 +283,15 @@ TEST(StoreStatistics, ConditionsSelectTheSamplesThatExist) {
     FixedEnvironment environment;
     TemporaryFolder folder;
     const auto store = openStore(folder.path());
-    EXPECT_OK(store->saveObjectsAndWait({quantity(steps(), 100, "2020-03-01T10:00", "2020-03-01T11:00", from("Phone")),
-                                         quantity(steps(), 100, "2020-03-01T10:00", "2020-03-01T12:00", from("Watch"))}));
+    EXPECT_OK(store->saveObjectsAndWait(
+        {quantity(steps(), 100, "2020-03-01T10:00", "2020-03-01T11:00", from("Phone")),
+         quantity(steps(), 100, "2020-03-01T10:00", "2020-03-01T12:00", from("Watch"))}));
     VSPredicate ofWatch;
     ofWatch.sources = {VSSource::forImportedName("Watch")};
     EXPECT_EQ(store->statistics(steps(), ofWatch, VSStatisticsOptionCumulativeSum)->sum, 100);
     EXPECT_EQ(store->statistics(steps(), {}, VSStatisticsOptionCumulativeSum)->sum, 150);
-    const auto strict = VSPredicate::samplesWithStartDate(date("2020-03-01T10:00"), date("2020-03-01T11:30"), VSQueryOptionStrictEndDate);
-    EXPECT_EQ(store->statistics(steps(), strict, VSStatisticsOptionCumulativeSum)->sum, 100) << "the watch's span ends too late";
+    const auto strict = VSPredicate::samplesWithStartDate(date("2020-03-01T10:00"), date("2020-03-01T11:30"),
+                                                          VSQueryOptionStrictEndDate);
+    EXPECT_EQ(store->statistics(steps(), strict, VSStatisticsOptionCumulativeSum)->sum, 100)
+        << "the watch's span ends too late";
 }

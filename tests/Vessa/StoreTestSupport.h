@@ -13,26 +13,36 @@
 
 namespace test {
 
-inline const VSObjectType* type(VSTypeCode code) { return VSObjectType::dataTypeWithCode(code); }
-inline const VSObjectType* heartRate() { return type(VSCode::HeartRate); }
-inline const VSObjectType* steps() { return type(VSCode::StepCount); }
+inline const VSObjectType* type(VSTypeCode code) {
+    return VSObjectType::dataTypeWithCode(code);
+}
+inline const VSObjectType* heartRate() {
+    return type(VSCode::HeartRate);
+}
+inline const VSObjectType* steps() {
+    return type(VSCode::StepCount);
+}
 
 inline VSProvenance from(const std::string& sourceName, const std::string& version = "") {
     VSProvenance provenance;
-    provenance.sourceRevision = std::make_shared<VSSourceRevision>(VSSourceRevision{VSSource::forImportedName(sourceName), version});
+    provenance.sourceRevision =
+        std::make_shared<VSSourceRevision>(VSSourceRevision{VSSource::forImportedName(sourceName), version});
     return provenance;
 }
 
-inline VSSamplePtr quantity(const VSObjectType* type, double value, VSDate start, VSDate end, VSProvenance provenance = {}) {
-    return std::make_shared<VSQuantitySample>(type, VSQuantity(type->canonicalUnit(), value), start, end, std::move(provenance));
-}
-inline VSSamplePtr quantity(const VSObjectType* type, double value, const std::string& start, const std::string& end,
+inline VSSamplePtr quantity(const VSObjectType* type, double value, VSDate start, VSDate end,
                             VSProvenance provenance = {}) {
+    return std::make_shared<VSQuantitySample>(type, VSQuantity(type->canonicalUnit(), value), start, end,
+                                              std::move(provenance));
+}
+inline VSSamplePtr quantity(const VSObjectType* type, double value, const std::string& start,
+                            const std::string& end, VSProvenance provenance = {}) {
     return quantity(type, value, date(start), date(end), std::move(provenance));
 }
 
 /// Without waiting for the disk at each save, which is most of the time of a test.
-inline std::shared_ptr<VSHealthStore> openStore(const std::filesystem::path& folder, VSHealthStore::Options options = {}) {
+inline std::shared_ptr<VSHealthStore> openStore(const std::filesystem::path& folder,
+                                                VSHealthStore::Options options = {}) {
     options.survivesPowerLoss = false;
     auto store = VSHealthStore::open(folder, options);
     if (!store) {
@@ -67,16 +77,16 @@ VSStatus wait(Start start) {
     return *status;
 }
 
-#define EXPECT_OK(expression)                                            \
-    do {                                                                 \
-        const VSStatus okStatus = (expression);                          \
-        EXPECT_TRUE(okStatus.ok()) << okStatus.error().message;          \
+#define EXPECT_OK(expression)                                   \
+    do {                                                        \
+        const VSStatus okStatus = (expression);                 \
+        EXPECT_TRUE(okStatus.ok()) << okStatus.error().message; \
     } while (false)
 
 /// What handlers were told, in order; a test waits for the n-th.
 template <typename T>
 class Log {
-   public:
+ public:
     void add(T entry) {
         std::lock_guard lock(mutex_);
         entries_.push_back(std::move(entry));
@@ -92,7 +102,7 @@ class Log {
         return entries_;
     }
 
-   private:
+ private:
     mutable std::mutex mutex_;
     std::condition_variable condition_;
     std::vector<T> entries_;

@@ -2,10 +2,12 @@
 #include <cmath>
 
 #include "ChartTestSupport.h"
+#include "Platform/Localization.h"
 #include "Platform/StyledText.h"
 #include "Qelvar/Charts/QVDottedAverageBackgroundView.h"
 #include "TestSupport.h"
 #include "VessaUI/VSNumberFormatter.h"
+#include "VessaUI/VSUnitController.h"
 
 using namespace test;
 
@@ -20,7 +22,10 @@ class BackgroundView : public testing::Test {
     FixedEnvironment environment;
     QVDottedAverageBackgroundView view;
 
-    void SetUp() override { view.layout({200, 100}, 2); }
+    void SetUp() override {
+        platform::loadTranslations();
+        view.layout({200, 100}, 2);
+    }
     void setValues(std::optional<double> min, std::optional<double> max, std::optional<double> average,
                    std::optional<double> maxData = std::nullopt, int precision = 0) {
         view.setValues(min, max, average, maxData, precision, nullptr, nullptr);
@@ -80,6 +85,29 @@ TEST_F(BackgroundView, AsksTheFormatterForTheBounds) {
     setValues(1, 2, {}, 3);
     EXPECT_EQ(view.minimumText(), "<1>");
     EXPECT_EQ(view.maximumText(), "<3>");
+}
+
+TEST_F(BackgroundView, TheUpperBoundSaysMoreThanAboveTheDisplayRange) {
+    const TemporaryFolder folder;
+    const auto store = VSHealthStore::open(folder.path() / "store");
+    ASSERT_TRUE(store.ok());
+    VSUnitController units(store.value());
+    const VSDataUnit* unit = nullptr;
+    for (const auto* group : VSDataUnitGroupController::shared().allDataUnitGroups()) {
+        const auto range =
+            group->isCharacteristic() ? std::nullopt : units.displayRangeForDataUnit(group->anyDataUnit());
+        if (range && range->maximum) unit = group->anyDataUnit();
+    }
+    ASSERT_TRUE(unit);
+    const double limit = *units.displayRangeForDataUnit(unit)->maximum;
+    const auto texts = [&](double max, std::optional<double> maxData) {
+        view.setValues(0, max, {}, maxData, 0, unit, &units);
+        return view.maximumText();
+    };
+    const QString atLimit = texts(limit, {});
+    EXPECT_EQ(texts(limit, limit * 3), platform::localized("GREATER_THAN_%@", {atLimit}));
+    EXPECT_EQ(texts(limit * 2, {}), platform::localized("GREATER_THAN_%@", {atLimit}));
+    EXPECT_EQ(texts(limit, limit / 2), atLimit);
 }
 
 TEST_F(BackgroundView, LabelsStandAtTheRightOnThePixelGrid) {

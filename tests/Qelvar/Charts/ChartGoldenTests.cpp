@@ -6,6 +6,7 @@
 #include <cmath>
 
 #include "ChartTestSupport.h"
+#include "Platform/Localization.h"
 #include "Platform/StyledText.h"
 #include "Qelvar/Charts/QVBarSeries.h"
 #include "Qelvar/Charts/QVCenteredHorizontalLineSeries.h"
@@ -26,7 +27,7 @@ namespace {
 
 const QColor kWhite = Qt::white;
 const QColor kHalfWhite = QColor::fromRgbF(1, 1, 1, 0.5f);
-constexpr double kTextShare = 0.02;
+constexpr double kTextShare = 0.008;
 
 QLinearGradient cardGradient(double height) {
     QLinearGradient gradient(0, 0, 0, height);
@@ -86,6 +87,7 @@ class CardChart {
  public:
     CardChart(std::shared_ptr<QVChartSeries> series, const std::vector<QVChartPointPtr>& points, VSDate start,
               VSDate end, const QVEdgeInsets& insets, const std::shared_ptr<QVCachedAxisDescriptor>& axis) {
+        platform::loadTranslations();
         source_->entries = {{std::move(series), points}};
         source_->bounds = [](double min, double max) {
             return VSDataUnitGroupChartingRules::Bounds{std::floor(min / 10) * 10, std::ceil(max / 10) * 10,
@@ -126,7 +128,6 @@ class CardChart {
         chart_.paint(painter);
         return image;
     }
-    QVDottedAverageBackgroundView& background() { return *background_; }
 
  private:
     ManualQueue queue_;

@@ -155,6 +155,10 @@ TEST(LineSeries, NothingShowsInsideAMarker) {
     const QImage fill = draw(series, Layer::Fill);
     EXPECT_LT(alphaAt(fill, 22, 53), kClear);
     EXPECT_GT(alphaAt(fill, 50, 53), kOpaque);
+
+    const QImage overlapping = draw(series, {point(20, 50), point(27, 50), point(80, 50)}, Layer::Fill);
+    for (int x = 15; x < 32; ++x)
+        EXPECT_LT(alphaAt(overlapping, x, 51), kClear) << "nor where two overlap, at " << x;
 }
 
 TEST(LineSeries, FillsBeneathWithOneGradientAndBeneathGapsWithTheOther) {
@@ -226,6 +230,21 @@ TEST(BarSeries, BarsStandOnTheirPaddingWithCapsBeyondTheEnds) {
     EXPECT_LT(alphaAt(butt, 50, 49), kClear);
     EXPECT_LT(alphaAt(butt, 50, 80), kClear);
     EXPECT_GT(alphaAt(butt, 46, 50), kOpaque);
+}
+
+TEST(LineSeries, TheFillHasNoSeamsAtAnyScale) {
+    QVLineSeries series = plainLine();
+    series.setFillGradient(
+        QVGradientObject::gradientWithTopColor(QColor(255, 255, 255, 128), QColor(255, 255, 255, 128)));
+    std::vector<QVChartPointPtr> points;
+    for (int i = 0; i <= 20; ++i) points.push_back(point(5 * i, 90));
+    for (const double scale : {1.0, 1.25, 1.5, 2.0}) {
+        Frame frame;
+        frame.scale = scale;
+        const QImage fill = draw(series, points, Layer::Fill, frame);
+        for (int x = 1; x < fill.width() - 1; ++x)
+            EXPECT_NEAR(qAlpha(fill.pixel(x, fill.height() / 2)), 128, 3) << x << " at " << scale;
+    }
 }
 
 TEST(BarSeries, BarsThatOverlapAreNotPaintedTwice) {

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <QFontMetricsF>
+#include <limits>
 
 #include "FormattersFixture.h"
 
@@ -92,7 +93,8 @@ TEST_F(QVDataUnitValueFormatterTest, TimePeriodsAreRoundedToMinutes) {
 TEST_F(QVDataUnitValueFormatterTest, EnumeratedValuesAreLabelsOrNoData) {
     const auto* mucus = group(VSGroupID::CervicalMucusQuality);
     EXPECT_EQ(plain(mucus, 2.7), "Sticky");
-    EXPECT_EQ(plain(mucus, 9), "No Data");
+    for (const double unknown : {9.0, 1e300, std::numeric_limits<double>::quiet_NaN()})
+        EXPECT_EQ(plain(mucus, unknown), "No Data");
     ASSERT_EQ(styled(mucus, 5).runs().size(), 1u);
     EXPECT_EQ(styled(mucus, 5).runs()[0].font, valueFont_);
 }

@@ -126,7 +126,7 @@ TEST_F(QVRecordsImporterTest, HugeAttributesAreRefused) {
         return text.replace(text.find("Wrist"), 5, std::string(length, 'w'));
     };
     expectRefused({write("huge.xml", kHead + record(1) + withSource(12'000'000) + kTail)},
-                  VSErrorCode::Invalid, "huge.xml:4: not a well-formed");
+                  VSErrorCode::Invalid, "huge.xml:4: a part of it is longer than 10 MB");
     const auto report = import({write("large.xml", kHead + record(1) + withSource(100'000) + kTail)});
     ASSERT_TRUE(report.ok()) << report.error().message;
     EXPECT_EQ(report->total.added, 1);

@@ -9,6 +9,12 @@
 #include "TestSupport.h"
 #include "Vessa/VSObject.h"
 
+// How a failed comparison shows a span.
+void PrintTo(const QVDateSpan& value, std::ostream* out) {
+    *out << VSISO8601FromDate(value.start, VSCalendar::current()) << " .. "
+         << VSISO8601FromDate(value.end, VSCalendar::current());
+}
+
 namespace {
 
 using test::date;
@@ -19,11 +25,6 @@ QVDateSpan span(const std::string& start, const std::string& end) {
 
 QVDateSpan spanOf(QVTimeScope timeScope, bool noon = false) {
     return QVTimeScopeSpan(timeScope, VSEnvironment::current()->now(), noon).value();
-}
-
-void PrintTo(const QVDateSpan& value, std::ostream* out) {
-    *out << VSISO8601FromDate(value.start, VSCalendar::current()) << " .. "
-         << VSISO8601FromDate(value.end, VSCalendar::current());
 }
 
 TEST(QVTimeScope, NamesAndZoomLevels) {
