@@ -20,40 +20,34 @@ FocusScope {
             id: back
             visible: root.stack ? root.stack.canGoBack : false
             anchors.left: parent.left
-            anchors.leftMargin: 4
             height: parent.height
-            width: Math.min(implicitWidth, (parent.width - title.implicitWidth) / 2 - 8, parent.width / 3)
-            implicitWidth: backRow.implicitWidth + 8
+            width: Math.min(backText.implicitWidth + 36, parent.width / 3)
             text: root.stack ? root.stack.backTitle : ""
             onClicked: root.stack.pop()
-            Keys.onReturnPressed: click()
-            Keys.onEnterPressed: click()
+            Accessible.name: text
+            Keys.onReturnPressed: back.clicked()
+            Keys.onEnterPressed: back.clicked()
             contentItem: Item {
-                Row {
-                    id: backRow
-                    anchors.verticalCenter: parent.verticalCenter
-                    anchors.left: parent.left
-                    anchors.leftMargin: 4
-                    spacing: 6
-                    opacity: back.down ? 0.3 : 1
-                    Item { // a chevron
-                        width: 12
-                        height: 20
-                        anchors.verticalCenter: parent.verticalCenter
-                        scale: root.mirrored ? -1 : 1
-                        Rectangle { x: 0; y: 5.5; width: 13; height: 2; radius: 1; rotation: -45; color: SystemStyle.tint }
-                        Rectangle { x: 0; y: 13; width: 13; height: 2; radius: 1; rotation: 45; color: SystemStyle.tint }
-                    }
-                    Text {
-                        text: back.text
-                        color: SystemStyle.tint
-                        font.pixelSize: SystemStyle.bodySize
-                        width: Math.min(implicitWidth, Math.max(0, back.width - 34))
-                        elide: Text.ElideRight
-                    }
+                opacity: back.down ? 0.3 : 1
+                Item { // a chevron
+                    id: chevron
+                    anchors { left: parent.left; leftMargin: 8; verticalCenter: parent.verticalCenter }
+                    width: 12
+                    height: 20
+                    scale: root.mirrored ? -1 : 1
+                    Rectangle { x: 0; y: 5.5; width: 13; height: 2; radius: 1; rotation: -45; color: SystemStyle.tint }
+                    Rectangle { x: 0; y: 13; width: 13; height: 2; radius: 1; rotation: 45; color: SystemStyle.tint }
+                }
+                Text {
+                    id: backText
+                    anchors { left: chevron.right; leftMargin: 6; right: parent.right; rightMargin: 4; verticalCenter: parent.verticalCenter }
+                    text: back.text
+                    color: SystemStyle.tint
+                    font.pixelSize: SystemStyle.bodySize
+                    elide: Text.ElideRight
                 }
             }
-            FocusRing { shown: back.visualFocus }
+            FocusRing { anchors.margins: 2; shown: back.visualFocus }
         }
 
         Text {
@@ -90,7 +84,8 @@ FocusScope {
         pushExit: Transition { NumberAnimation { property: "x"; from: 0; to: -root.slide / 3; duration: screens.duration; easing.type: Easing.OutCubic } }
         popEnter: Transition { NumberAnimation { property: "x"; from: -root.slide / 3; to: 0; duration: screens.duration; easing.type: Easing.OutCubic } }
         popExit: Transition { NumberAnimation { property: "x"; from: 0; to: root.slide; duration: screens.duration; easing.type: Easing.OutCubic } }
-        onBusyChanged: if (!busy && root.stack) root.stack.transitionFinished()
+        // Later: what slid out is destroyed when control returns to the event loop, and before its screen.
+        onBusyChanged: if (!busy && root.stack) Qt.callLater(root.stack.transitionFinished)
 
         function show(screen, animated) {
             push(screen.view, { screen: screen }, animated ? T.StackView.PushTransition : T.StackView.Immediate)

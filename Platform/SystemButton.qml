@@ -9,8 +9,9 @@ T.Button {
     implicitHeight: SystemStyle.touchHeight
     implicitWidth: label.implicitWidth + (filled ? 40 : 16)
     focusPolicy: Qt.StrongFocus
-    Keys.onReturnPressed: click()
-    Keys.onEnterPressed: click()
+    Accessible.name: text
+    Keys.onReturnPressed: button.clicked()
+    Keys.onEnterPressed: button.clicked()
     contentItem: Text {
         id: label
         text: button.text

@@ -81,7 +81,7 @@ VSStatus printReport(const QVImportReport& report) {
     };
     for (const auto& [type, count] : report.byType) row(type, count);
     row("total", report.total);
-    const VSStatus status = output.finish();
+    VSStatus status = output.finish();
     if (report.characteristicsSet > 0)
         QVPrintError(std::to_string(report.characteristicsSet) + " characteristics of the person were set");
     printRefusals(report);

@@ -117,7 +117,7 @@ class TypeStatistics {
     }
 
     VSStatus write() {
-        if (const VSStatus status = findUnit(); !status) return status;
+        if (VSStatus status = findUnit(); !status) return status;
         if (from_ >= to_) return {};
         if (!type_->isQuantityType()) return writeCounts();
         const auto predicate = VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionNone);

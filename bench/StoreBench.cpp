@@ -151,11 +151,11 @@ void BM_SaveToObserver(benchmark::State& state) {
 }
 
 BENCHMARK(BM_BulkSave)->Iterations(1);
-BENCHMARK(BM_DailyOverOneYear)->Unit(benchmark::kMillisecond);
-BENCHMARK(BM_DailyOverSixYears)->Unit(benchmark::kMillisecond);
-BENCHMARK(BM_MostRecentSample)->Unit(benchmark::kMicrosecond);
-BENCHMARK(BM_Open)->Unit(benchmark::kMillisecond);
-BENCHMARK(BM_SaveToObserver)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_DailyOverOneYear)->Iterations(20)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_DailyOverSixYears)->Iterations(10)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_MostRecentSample)->Iterations(200)->Unit(benchmark::kMicrosecond);
+BENCHMARK(BM_Open)->Iterations(50)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_SaveToObserver)->Iterations(100)->Unit(benchmark::kMillisecond);
 
 }  // namespace
 

@@ -83,18 +83,18 @@ std::unique_ptr<platform::NavigationStack> QVAppDelegate::dashboardStack() {
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::healthDataStack() {
-    return placeholderStack("Health Data Navigation Controller", "HEALTH_DATA", "healthdata_selected",
+    return placeholderStack("Health Data Navigation Controller", "HEALTH_DATA", "healthdata_selected/#8a8a8f",
                             "HEALTH_DATA_PENDING", QVUserActivityTab::HealthData,
                             {{"IMPORT_ACTION", [this] { emit importRequested(); }}});
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::sourcesStack() {
-    return placeholderStack("Sources Navigation Controller", "SOURCES", "sources_selected", "SOURCES_PENDING",
+    return placeholderStack("Sources Navigation Controller", "SOURCES", "sources_selected/#8a8a8f", "SOURCES_PENDING",
                             QVUserActivityTab::Sources);
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::medicalIDStack() {
-    return placeholderStack("Medical ID Navigation Controller", "MEDICAL_ID", "medical_ID_selected",
+    return placeholderStack("Medical ID Navigation Controller", "MEDICAL_ID", "medical_ID_selected/#8a8a8f",
                             "MEDICAL_ID_PENDING", QVUserActivityTab::MedicalID);
 }
 

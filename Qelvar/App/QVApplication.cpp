@@ -2,9 +2,7 @@
 
 #include <QGuiApplication>
 #include <QIcon>
-#include <QQmlEngine>
-#include <QQuickItem>
-#include <QQuickView>
+#include <QQuickWindow>
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -14,16 +12,12 @@
 #include "Platform/SystemEvents.h"
 #include "Platform/UserDefaults.h"
 #include "Qelvar/App/QVAppDelegate.h"
-#include "Qelvar/App/QVIconProvider.h"
 #include "Qelvar/App/QVScreenshots.h"
 #include "Qelvar/App/QVStartupTrace.h"
-#include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
+#include "Qelvar/App/QVWindow.h"
 #include "Qelvar/DataProviders/QVUserDefaults.h"
 
 namespace {
-
-constexpr QSize kPhoneSize(375, 667);
-constexpr QSize kSmallestSize(320, 320);
 
 bool hasDisplay() {
     return qEnvironmentVariableIsSet("WAYLAND_DISPLAY") || qEnvironmentVariableIsSet("DISPLAY") ||
@@ -36,12 +30,6 @@ void chooseGraphics(const QVApplicationOptions& options) {
     if (!options.screenshots) return;
     if (!qEnvironmentVariableIsSet("QT_QPA_PLATFORM")) qputenv("QT_QPA_PLATFORM", "offscreen");
     QQuickWindow::setGraphicsApi(QSGRendererInterface::Software);
-}
-
-void registerTypes() {
-    qmlRegisterType<QVDashboardTableViewCell>("Qelvar.Items", 1, 0, "QVDashboardTableViewCell");
-    qmlRegisterUncreatableType<QVImportController>("Qelvar.Items", 1, 0, "QVImportController",
-                                                   QStringLiteral("made by the application"));
 }
 
 VSResult<std::shared_ptr<VSHealthStore>> openStore(const std::filesystem::path& folder, bool demo) {
@@ -59,18 +47,6 @@ VSResult<std::shared_ptr<VSHealthStore>> openStore(const std::filesystem::path& 
     return store;
 }
 
-void setUpWindow(QQuickView& window, QVAppDelegate& app, QSize size) {
-    window.engine()->addImageProvider(QStringLiteral("icon"), new QVIconProvider);
-    window.setTitle(QStringLiteral("Qelvar"));
-    window.setIcon(QGuiApplication::windowIcon());
-    window.setColor(Qt::white);
-    window.setResizeMode(QQuickView::SizeRootObjectToView);
-    window.setMinimumSize(kSmallestSize);
-    window.resize(size.isValid() ? size : kPhoneSize);
-    window.setInitialProperties({{QStringLiteral("app"), QVariant::fromValue(&app)}});
-    window.setSource(QUrl(QStringLiteral("qrc:/Qelvar/QVTabBarController.qml")));
-}
-
 /// Waits until the demonstration's records are those of today, so that no picture shows half of them.
 void finishDemoData(QVAppDelegate& app) {
     app.didBecomeActive();
@@ -83,9 +59,8 @@ int runWindow(QGuiApplication& application, QVAppDelegate& app, const QVApplicat
     QVStartupTrace::note("controllers");
     // The pictures are of the finished demonstration; a person sees it grow.
     if (options.screenshots) finishDemoData(app);
-    QQuickView window;
-    setUpWindow(window, app, options.size);
-    if (!window.rootObject()) return 1;
+    QVWindow window(app, options.size);
+    if (!window.isUsable()) return 1;
     QVStartupTrace::note("screens laid out");
     app.didFinishLaunching();
     if (!options.openLink.isEmpty() && !app.openLink(options.openLink))
@@ -129,7 +104,6 @@ int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options)
     platform::loadTranslations();
     QGuiApplication::setLayoutDirection(platform::isRightToLeft() ? Qt::RightToLeft : Qt::LeftToRight);
     platform::SystemEvents::shared().start();
-    registerTypes();
 
     const std::filesystem::path folder = options.store.empty() ? QVStoreFolder(options.demo) : options.store;
     auto store = openStore(folder, options.demo);

@@ -45,11 +45,6 @@ const std::pair<VSTypeCode, const char*> kFixedUnits[] = {
     {VSCode::Height, "cm"},
 };
 
-bool hasFixedUnit(const VSObjectType* type) {
-    return std::any_of(std::begin(kFixedUnits), std::end(kFixedUnits),
-                       [type](const auto& entry) { return entry.first == type->code(); });
-}
-
 std::optional<double> numberEntry(const VSValue& entry, std::string_view key) {
     const VSValue* value = entry[key];
     return value ? value->number() : std::nullopt;
@@ -123,7 +118,7 @@ class SampleBuilder {
 
     /// An entry may name its unit, so that it does not mean another amount for people with other preferences.
     std::optional<VSUnit> unitFor(const VSValue& entry, const VSObjectType* type) const {
-        if (const auto text = stringEntry(entry, "unit"); text && !hasFixedUnit(type)) {
+        if (const auto text = stringEntry(entry, "unit")) {
             auto unit = type->unitFromString(*text);
             return unit ? std::optional(*unit) : std::nullopt;
         }
@@ -187,9 +182,12 @@ class SampleBuilder {
     std::shared_ptr<const VSMetadata> metadata_;
 };
 
-/// The sample types of every data unit of every display type.
+/// The sample types of every data unit of every display type, and the correlations that hold their samples:
+/// left behind, these would be readings without values.
 std::vector<const VSObjectType*> allSampleTypes() {
     std::set<const VSObjectType*> types;
+    for (const VSObjectType* type : VSObjectType::allTypes())
+        if (type->kind() == VSTypeKind::Correlation) types.insert(type);
     for (const VSDataUnitGroup* group : VSDataUnitGroupController::shared().allDataUnitGroups())
         for (const VSDataUnit* unit : group->dataUnits())
             if (unit->sampleType()->isSampleType()) types.insert(unit->sampleType());

@@ -31,8 +31,9 @@ FocusScope {
                         text: modelData
                         focus: index === 0
                         onClicked: root.screen.runAction(index)
-                        Keys.onReturnPressed: click()
-                        Keys.onEnterPressed: click()
+                        Accessible.name: text
+                        Keys.onReturnPressed: action.clicked()
+                        Keys.onEnterPressed: action.clicked()
                         background: Rectangle {
                             color: action.down ? SystemStyle.emphasis : SystemStyle.background
                             Rectangle { width: parent.width; height: SystemStyle.pixel; color: SystemStyle.hairline }

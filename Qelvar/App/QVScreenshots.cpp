@@ -102,7 +102,7 @@ bool QVScreenshots::waitForCards() {
             if (*frames < 2 || window_.rootObject()->property("busy").toBool()) return false;
             const auto cards = QVCardsInScene(window_.rootObject());
             return std::all_of(cards.begin(), cards.end(),
-                               [](const auto* card) { return card->isSettled(); });
+                               [](const auto* card) { return card->wasPaintedSettled(); });
         },
         "the cards");
     QObject::disconnect(connection);

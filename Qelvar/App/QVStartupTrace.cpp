@@ -42,7 +42,7 @@ double now() {
 bool cardsShowTheirData(QQuickView& window, bool settled) {
     const auto cards = QVCardsInScene(window.rootObject());
     return !cards.isEmpty() && std::all_of(cards.begin(), cards.end(), [settled](const auto* card) {
-        return settled ? card->isSettled() : card->showsItsData();
+        return settled ? card->wasPaintedSettled() : card->wasPaintedWithData();
     });
 }
 

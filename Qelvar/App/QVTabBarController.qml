@@ -7,8 +7,9 @@ FocusScope {
     id: root
     property var app: null
     readonly property var tabs: app.tabBarController
-    /// Something slides.
-    readonly property bool busy: stacks.anyBusy
+    // Something slides.
+    readonly property bool busy: busyStacks > 0
+    property int busyStacks: 0
     focus: true
     LayoutMirroring.enabled: app.rightToLeft
     LayoutMirroring.childrenInherit: true
@@ -22,10 +23,6 @@ FocusScope {
 
     Item {
         id: stacks
-        readonly property bool anyBusy: {
-            const loader = repeater.itemAt(root.tabs.selectedIndex)
-            return loader && loader.item ? loader.item.busy : false
-        }
         anchors.fill: parent
         anchors.bottomMargin: tabBar.height
         Repeater {
@@ -41,14 +38,16 @@ FocusScope {
                 active: false // made when it is first shown, then kept
                 onSelectedChanged: if (selected) show()
                 Component.onCompleted: if (selected) show()
+                onLoaded: item.forceActiveFocus()
                 function show() {
                     active = true
-                    item.forceActiveFocus()
+                    if (item) item.forceActiveFocus()
                 }
                 sourceComponent: NavigationStackView {
                     stack: parent.stack
                     mirrored: root.app.rightToLeft
                     focus: true
+                    onBusyChanged: root.busyStacks += busy ? 1 : -1
                 }
             }
         }
@@ -78,8 +77,8 @@ FocusScope {
                     text: title
                     focusPolicy: Qt.TabFocus
                     onClicked: root.tabs.tap(index)
-                    Keys.onReturnPressed: click()
-                    Keys.onEnterPressed: click()
+                    Keys.onReturnPressed: tab.clicked()
+                    Keys.onEnterPressed: tab.clicked()
                     Accessible.role: Accessible.PageTab
                     Accessible.name: title
                     Accessible.selectable: true
@@ -114,10 +113,11 @@ FocusScope {
     Repeater { // Ctrl+1 to Ctrl+4
         model: root.tabs
         Item {
+            id: numbered
             required property int index
             Shortcut {
-                sequence: "Ctrl+" + (parent.index + 1)
-                onActivated: root.tabs.tap(parent.index)
+                sequence: "Ctrl+" + (numbered.index + 1)
+                onActivated: root.tabs.tap(numbered.index)
             }
         }
     }

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cassert>
 
+#include "Platform/Localization.h"
+
 QVTimeScopeControl::QVTimeScopeControl(std::vector<QVTimeScope> timeScopes)
     : timeScopes_(std::move(timeScopes)) {
     assert(!timeScopes_.empty());
@@ -12,6 +14,10 @@ QStringList QVTimeScopeControl::segments() const {
     QStringList titles;
     for (const QVTimeScope timeScope : timeScopes_) titles.append(QVTimeScopeDisplayName(timeScope));
     return titles;
+}
+
+QString QVTimeScopeControl::accessibleName() const {
+    return platform::localized("TIME_SCOPE") + QStringLiteral(", ") + QVTimeScopeDisplayName(selectedTimeScope());
 }
 
 void QVTimeScopeControl::setSelectedTimeScope(QVTimeScope timeScope) {

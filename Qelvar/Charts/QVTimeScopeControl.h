@@ -12,6 +12,7 @@ class QVTimeScopeControl : public QObject {
     Q_OBJECT
     Q_PROPERTY(QStringList segments READ segments NOTIFY segmentsChanged)
     Q_PROPERTY(int selectedIndex READ selectedIndex NOTIFY selectedIndexChanged)
+    Q_PROPERTY(QString accessibleName READ accessibleName NOTIFY selectedIndexChanged)
  public:
     explicit QVTimeScopeControl(std::vector<QVTimeScope> timeScopes);
 
@@ -22,6 +23,8 @@ class QVTimeScopeControl : public QObject {
     /// Moves the selection without an action. A scope that is not offered selects the first.
     void setSelectedTimeScope(QVTimeScope timeScope);
     int selectedIndex() const { return selectedIndex_; }
+    /// What a screen reader says of it: what it is, and the selection.
+    QString accessibleName() const;
 
     /// The user picked a segment: selects it and sends valueChanged().
     Q_INVOKABLE void pick(int index);

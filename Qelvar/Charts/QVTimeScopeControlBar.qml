@@ -9,6 +9,7 @@ FocusScope {
     readonly property int count: repeater.count
     activeFocusOnTab: true
     Accessible.role: Accessible.PageTabList
+    Accessible.name: control ? control.accessibleName : ""
 
     function move(step) {
         const index = control.selectedIndex + step

@@ -323,7 +323,9 @@ void QVDashboardTableViewCell::itemChange(ItemChange change, const ItemChangeDat
 
 void QVDashboardTableViewCell::contentLooksDifferent() {
     // What a layout under way changes is painted right after it.
-    if (window() && !painting_) polish();
+    if (painting_) return;
+    painted_ = Painted::Outdated;
+    if (window()) polish();
 }
 
 void QVDashboardTableViewCell::animateFrames() {
@@ -338,6 +340,7 @@ void QVDashboardTableViewCell::updatePolish() {
     painting_ = true;
     image_ = render(screenScale());
     painting_ = false;
+    painted_ = isSettled() ? Painted::Settled : showsItsData() ? Painted::WithData : Painted::Outdated;
     update();
 }
 

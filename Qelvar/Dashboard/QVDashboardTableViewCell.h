@@ -63,8 +63,11 @@ class QVDashboardTableViewCell : public QQuickItem {
     bool showsItsData() const;
     /// The same, and nothing is moving any more.
     bool isSettled() const { return showsItsData() && !chart_.isAnimating(); }
+    /// The same of what was painted into the scene last.
+    bool wasPaintedWithData() const { return painted_ >= Painted::WithData; }
+    bool wasPaintedSettled() const { return painted_ == Painted::Settled; }
 
- signals:
+signals:
     void screenChanged();
     void rowChanged();
     void contentChanged();
@@ -108,4 +111,6 @@ class QVDashboardTableViewCell : public QQuickItem {
     std::shared_ptr<Observer> observer_;
     QMetaObject::Connection frames_;
     QImage image_;
+    enum class Painted { Outdated, WithData, Settled };
+    Painted painted_ = Painted::Outdated;
 };

@@ -56,8 +56,8 @@ FocusScope {
             focusPolicy: Qt.StrongFocus
             text: displayName
             onClicked: root.screen.selectRow(index)
-            Keys.onReturnPressed: click()
-            Keys.onEnterPressed: click()
+            Keys.onReturnPressed: row.clicked()
+            Keys.onEnterPressed: row.clicked()
             onActiveFocusChanged: if (activeFocus) ListView.view.currentIndex = index
             Accessible.role: Accessible.Button
             Accessible.name: displayName + (cell.accessibleValue ? ", " + cell.accessibleValue : "")

@@ -94,7 +94,7 @@ class ArchiveFile final : public QVImportFile {
             const int result = archive_read_next_header(archive_.get(), &entry);
             if (result == ARCHIVE_EOF) return false;
             if (result != ARCHIVE_OK && result != ARCHIVE_WARN) return damaged();
-            const auto taken = takeEntry(entry);
+            auto taken = takeEntry(entry);
             if (!taken || *taken) return taken;
         }
     }

@@ -44,7 +44,7 @@ class PlainFile final : public QVImportFile {
             done_ += count;
             return count;
         }
-        const auto count = QVReadWaiting(file_, path_, buffer, size, cancel_);
+        auto count = QVReadWaiting(file_, path_, buffer, size, cancel_);
         if (count) done_ += *count;
         return count;
     }

@@ -78,7 +78,7 @@ class Reading {
             const auto next = file.nextDocument();
             if (!next) return next.error();
             if (!*next) break;
-            if (const VSStatus status = readDocument(file, before, documents); !status) return status;
+            if (VSStatus status = readDocument(file, before, documents); !status) return status;
         }
         for (const auto& text : file.notes()) note(text);
         if (documents == 0)

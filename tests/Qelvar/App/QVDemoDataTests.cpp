@@ -56,19 +56,22 @@ TEST_F(DemoSamples, SpansAreRelativeToTheStartOfToday) {
     EXPECT_EQ(samples[1]->startDate(), samples[1]->endDate());
 }
 
-TEST_F(DemoSamples, UnitsAreTheTypesOwnThenTheEntrysThenThePreferredOne) {
-    auto fixed = entry(VSCode::BodyMass, 150, 0);
-    fixed.emplace("unit", "kg");
+TEST_F(DemoSamples, UnitsAreTheEntrysThenTheTypesOwnThenThePreferredOne) {
+    auto kilograms = entry(VSCode::BodyMass, 68, 0);
+    kilograms.emplace("unit", "kg");
+    auto unfit = kilograms;
+    unfit.insert_or_assign("unit", "cm");
     auto named = entry(VSCode::BloodGlucose, 5.5, 0);
     named.emplace("unit", "mmol/L");
-    const auto samples = build({fixed, named, entry(VSCode::BloodGlucose, 99, 0)});
-    ASSERT_EQ(samples.size(), 3u);
+    const auto samples = build({kilograms, unfit, named, entry(VSCode::BodyMass, 150, 0), entry(VSCode::BloodGlucose, 99, 0)});
+    ASSERT_EQ(samples.size(), 4u);
     const auto value = [&samples](size_t index, const char* unit) {
         return static_cast<const VSQuantitySample&>(*samples[index]).quantity().doubleValueForUnit(VSUnit::fromString(unit));
     };
-    EXPECT_DOUBLE_EQ(value(0, "lb"), 150);
+    EXPECT_DOUBLE_EQ(value(0, "kg"), 68);
     EXPECT_NEAR(value(1, "mg/dL"), 5.5 * 18.01558, 1e-9);
-    EXPECT_DOUBLE_EQ(value(2, "mg/dL"), 99);
+    EXPECT_DOUBLE_EQ(value(2, "lb"), 150);
+    EXPECT_DOUBLE_EQ(value(3, "mg/dL"), 99);
 }
 
 TEST_F(DemoSamples, PressuresGatherIntoACorrelation) {

@@ -1,0 +1,39 @@
+#include "Qelvar/App/QVWindow.h"
+
+#include <QGuiApplication>
+#include <QQmlEngine>
+#include <QQuickItem>
+#include <mutex>
+
+#include "Qelvar/App/QVIconProvider.h"
+#include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
+
+namespace {
+
+constexpr QSize kPhoneSize(375, 667);
+constexpr QSize kSmallestSize(320, 320);
+
+/// The classes that the layouts name.
+void registerTypes() {
+    static std::once_flag once;
+    std::call_once(once, [] {
+        qmlRegisterType<QVDashboardTableViewCell>("Qelvar.Items", 1, 0, "QVDashboardTableViewCell");
+        qmlRegisterUncreatableType<QVImportController>("Qelvar.Items", 1, 0, "QVImportController",
+                                                       QStringLiteral("made by the application"));
+    });
+}
+
+}  // namespace
+
+QVWindow::QVWindow(QVAppDelegate& app, QSize size) {
+    registerTypes();
+    engine()->addImageProvider(QStringLiteral("icon"), new QVIconProvider);
+    setTitle(QStringLiteral("Qelvar"));
+    setIcon(QGuiApplication::windowIcon());
+    setColor(Qt::white);
+    setResizeMode(QQuickView::SizeRootObjectToView);
+    setMinimumSize(kSmallestSize);
+    resize(size.isValid() ? size : kPhoneSize);
+    setInitialProperties({{QStringLiteral("app"), QVariant::fromValue(&app)}});
+    setSource(QUrl(QStringLiteral("qrc:/Qelvar/QVTabBarController.qml")));
+}

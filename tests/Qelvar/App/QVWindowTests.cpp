@@ -1,0 +1,214 @@
+#include "Qelvar/App/QVWindow.h"
+
+#include <gtest/gtest.h>
+
+#include <QAccessible>
+#include <QDropEvent>
+#include <QMimeData>
+#include <QQuickItem>
+#include <QTest>
+#include <algorithm>
+#include <fstream>
+#include <mutex>
+
+#include "Platform/Localization.h"
+#include "Platform/UserDefaults.h"
+#include "Qelvar/App/QVScreenshots.h"
+#include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
+#include "Qelvar/DataProviders/QVUserDefaults.h"
+#include "QtTestSupport.h"
+#include "TestSupport.h"
+
+namespace {
+
+using test::date;
+
+QStringList& complaints() {
+    static QStringList lines;
+    return lines;
+}
+
+/// The whole window, on a store of its own.
+class WindowTest : public testing::Test {
+   protected:
+    WindowTest() {
+        static std::once_flag once;
+        std::call_once(once, [] { QQuickWindow::setGraphicsApi(QSGRendererInterface::Software); });
+        complaints().clear();
+        previousHandler_ = qInstallMessageHandler([](QtMsgType type, const QMessageLogContext&, const QString& line) {
+            if (type != QtDebugMsg && type != QtInfoMsg && !line.contains("XDG_RUNTIME_DIR")) complaints() << line;
+        });
+        platform::UserDefaults::setStandard(std::make_unique<platform::UserDefaults>(folder_.path() / "defaults.json"));
+        store_ = *VSHealthStore::open(folder_.path() / "store");
+        QVUserDefaults::sharedDefaults().setHealthStore(store_);
+    }
+    ~WindowTest() override {
+        window_.reset();
+        app_.reset();
+        QVUserDefaults::sharedDefaults().setHealthStore(nullptr);
+        qInstallMessageHandler(previousHandler_);
+        EXPECT_TRUE(complaints().isEmpty()) << complaints().join('\n').toStdString();
+    }
+
+    void open(const QVDashboardViewController::Groups& groups) {
+        platform::loadTranslations();
+        app_ = std::make_unique<QVAppDelegate>(store_);
+        app_->willFinishLaunching();
+        auto& dashboard = app_->controllerManager()->dashboardDataUnitGroupsController();
+        ASSERT_TRUE(test::waitUntil([&dashboard] { return dashboard.hasLoadedDashboard(); }));
+        dashboard.setDataUnitGroupsForDashboard(groups);
+        window_ = std::make_unique<QVWindow>(*app_, QSize());
+        ASSERT_TRUE(window_->isUsable());
+        app_->didFinishLaunching();
+        window_->show();
+        ASSERT_TRUE(test::waitUntil([this] { return window_->isActive(); }));
+        ASSERT_TRUE(waitForCards(static_cast<qsizetype>(groups.size())));
+    }
+    bool waitForCards(qsizetype atLeast) {
+        return test::waitUntil([this, atLeast] {
+            const auto cards = QVCardsInScene(window_->rootObject());
+            return cards.size() >= atLeast && std::all_of(cards.begin(), cards.end(), [](const auto* card) { return card->wasPaintedSettled(); });
+        });
+    }
+    void press(Qt::Key key, Qt::KeyboardModifiers modifiers = {}) { QTest::keyClick(window_.get(), key, modifiers); }
+    /// What a screen reader says of the item that has the keyboard.
+    QString focused() const {
+        QAccessibleInterface* interface = QAccessible::queryAccessibleInterface(window_->activeFocusItem());
+        return interface ? interface->text(QAccessible::Name) : QString();
+    }
+    static const VSDataUnitGroup* group(int id) { return VSDataUnitGroupController::shared().dataUnitGroupWithID(id); }
+
+    test::FixedEnvironment environment_{"2020-03-31T20:00"};
+    test::TemporaryFolder folder_;
+    std::shared_ptr<VSHealthStore> store_;
+    std::unique_ptr<QVAppDelegate> app_;
+    std::unique_ptr<QVWindow> window_;
+    QtMessageHandler previousHandler_ = nullptr;
+};
+
+TEST_F(WindowTest, IsAPhonesAndShowsCardsThatCanBeReadAloud) {
+    open({group(VSGroupID::Steps), group(VSGroupID::HeartRate)});
+    EXPECT_EQ(window_->size(), QSize(375, 667));
+    EXPECT_EQ(window_->title(), "Qelvar");
+    const auto cards = QVCardsInScene(window_->rootObject());
+    ASSERT_EQ(cards.size(), 2);
+    EXPECT_EQ(cards[0]->size(), QSizeF(375, 187));
+    QAccessibleInterface* card = QAccessible::queryAccessibleInterface(cards[0]->parentItem());
+    ASSERT_TRUE(card);
+    EXPECT_EQ(card->role(), QAccessible::Button);
+    EXPECT_TRUE(card->text(QAccessible::Name).startsWith("Steps, No Data")) << card->text(QAccessible::Name).toStdString();
+}
+
+TEST_F(WindowTest, EverythingIsReachedByKeyboard) {
+    open({group(VSGroupID::Steps), group(VSGroupID::HeartRate)});
+    EXPECT_TRUE(focused().startsWith("Steps")) << focused().toStdString();
+    press(Qt::Key_Down);
+    EXPECT_TRUE(focused().startsWith("Heart Rate")) << focused().toStdString();
+    QStringList reached;
+    for (int i = 0; i < 12; ++i) {
+        press(Qt::Key_Tab);
+        reached << focused();
+    }
+    for (const char* name : {"Dashboard", "Health Data", "Sources", "Medical ID"}) EXPECT_TRUE(reached.contains(name)) << reached.join("|").toStdString();
+
+    // The time scope follows the arrows while its control has the keyboard.
+    for (int i = 0; i < 12 && !focused().startsWith("Time scope"); ++i) press(Qt::Key_Tab);
+    EXPECT_EQ(focused(), "Time scope, Week");
+    press(Qt::Key_Right);
+    EXPECT_EQ(focused(), "Time scope, Month");
+    EXPECT_EQ(app_->controllerManager()->selectedTimeScopeController().selectedTimeScope(), QVTimeScope::Month);
+    ASSERT_TRUE(waitForCards(2));
+
+    press(Qt::Key_3, Qt::ControlModifier);
+    EXPECT_EQ(app_->tabBarController()->selectedIndex(), 2);
+    press(Qt::Key_1, Qt::ControlModifier);
+    EXPECT_EQ(app_->tabBarController()->selectedIndex(), 0);
+}
+
+TEST_F(WindowTest, ACardOpensAndEscapeReturns) {
+    open({group(VSGroupID::Steps), group(VSGroupID::HeartRate)});
+    auto* stack = app_->tabBarController()->selectedStack();
+    press(Qt::Key_Down);
+    press(Qt::Key_Return);
+    ASSERT_EQ(stack->count(), 2);
+    EXPECT_EQ(stack->topScreen()->title(), "Heart Rate");
+    const auto isStill = [this] { return !window_->rootObject()->property("busy").toBool(); };
+    ASSERT_TRUE(test::waitUntil(isStill));
+    press(Qt::Key_Escape);
+    EXPECT_EQ(stack->count(), 1);
+    ASSERT_TRUE(test::waitUntil(isStill));
+    QTest::mouseClick(window_.get(), Qt::LeftButton, {}, QPoint(180, 200));
+    EXPECT_EQ(stack->count(), 2);
+    ASSERT_TRUE(test::waitUntil(isStill));
+}
+
+TEST_F(WindowTest, WhatAnotherConnectionSavesReachesTheCard) {
+    open({group(VSGroupID::HeartRate)});
+    const auto other = *VSHealthStore::open(folder_.path() / "store");
+    const auto* type = VSObjectType::dataTypeWithCode(VSCode::HeartRate);
+    const VSQuantity quantity(VSUnit::fromString("count/min"), 77);
+    ASSERT_TRUE(other->saveObjectsAndWait({std::make_shared<const VSQuantitySample>(type, quantity, date("2020-03-31T10:00"), date("2020-03-31T10:00"))}).ok());
+    EXPECT_TRUE(test::waitUntil([this] {
+        const auto cards = QVCardsInScene(window_->rootObject());
+        return !cards.isEmpty() && cards[0]->valueText().startsWith("77") && cards[0]->wasPaintedSettled();
+    }));
+}
+
+TEST_F(WindowTest, AnEmptyDashboardOffersToImport) {
+    open({});
+    EXPECT_TRUE(app_->dashboard()->showsEmptyState());
+    EXPECT_TRUE(QVCardsInScene(window_->rootObject()).isEmpty());
+    QStringList reached;
+    for (int i = 0; i < 8; ++i) {
+        press(Qt::Key_Tab);
+        reached << focused();
+    }
+    EXPECT_TRUE(reached.contains(app_->dashboard()->importTitle())) << reached.join("|").toStdString();
+}
+
+TEST_F(WindowTest, ADroppedDocumentIsImportedAndTheSheetIsClosedByKeyboard) {
+    open({group(VSGroupID::HeartRate)});
+    const auto path = folder_.path() / "records.xml";
+    std::ofstream(path) << "<?xml version=\"1.0\"?>\n<HealthData locale=\"en_US\"><Record type=\"VSQuantityTypeIdentifierHeartRate\" "
+                           "sourceName=\"Watch\" unit=\"count/min\" startDate=\"2020-03-31 10:00:00 +0200\" "
+                           "endDate=\"2020-03-31 10:00:00 +0200\" creationDate=\"2020-03-31 10:00:00 +0200\" value=\"66\"/></HealthData>";
+    QMimeData data;
+    data.setUrls({QUrl::fromLocalFile(QString::fromStdString(path.string()))});
+    QDragEnterEvent enter({100, 300}, Qt::CopyAction, &data, Qt::LeftButton, {});
+    QCoreApplication::sendEvent(window_.get(), &enter);
+    QDropEvent drop({100, 300}, Qt::CopyAction, &data, Qt::LeftButton, {});
+    QCoreApplication::sendEvent(window_.get(), &drop);
+    QVImportController& controller = *app_->importController();
+    ASSERT_TRUE(test::waitUntil([&controller] { return controller.state() == QVImportController::State::Finished; }));
+    EXPECT_EQ(controller.rowValues().value(1), "1");
+    EXPECT_TRUE(test::waitUntil([this] { return focused() == "Done"; })) << focused().toStdString();
+    press(Qt::Key_Return);
+    EXPECT_EQ(controller.state(), QVImportController::State::Idle);
+    EXPECT_TRUE(test::waitUntil([this] { return QVCardsInScene(window_->rootObject())[0]->valueText().startsWith("66"); }));
+}
+
+TEST_F(WindowTest, RightToLeftMirrorsTheTabs) {
+    environment_->setLocale("ar_EG");
+    open({group(VSGroupID::Steps)});
+    QTest::mouseClick(window_.get(), Qt::LeftButton, {}, QPoint(20, 650));
+    EXPECT_EQ(app_->tabBarController()->selectedIndex(), 3);
+    environment_->setLocale("en_US");
+    platform::loadTranslations();
+}
+
+TEST_F(WindowTest, PicturesAreTakenOfEveryTabAndScope) {
+    open({group(VSGroupID::Steps), group(VSGroupID::HeartRate), group(VSGroupID::FlightsClimbed), group(VSGroupID::ActiveEnergy)});
+    const auto folder = folder_.path() / "pictures";
+    ASSERT_TRUE(QVScreenshots(*window_, *app_, folder).takeAll());
+    for (const char* name : {"dashboard-day", "dashboard-week", "dashboard-month", "dashboard-year", "display-type", "health-data", "sources", "medical-id"})
+        EXPECT_TRUE(std::filesystem::exists(folder / (std::string(name) + ".png"))) << name;
+    const QImage full(QString::fromStdString((folder / "dashboard-week-full.png").string()));
+    EXPECT_EQ(full.width(), 375);
+    EXPECT_GT(full.height(), 4 * 187 + 100) << "all cards";
+    app_->controllerManager()->dashboardDataUnitGroupsController().setDataUnitGroupsForDashboard({});
+    app_->tabBarController()->setSelectedIndex(0);
+    ASSERT_TRUE(QVScreenshots(*window_, *app_, folder).takeAll());
+    EXPECT_TRUE(std::filesystem::exists(folder / "dashboard-empty.png"));
+}
+
+}  // namespace
