@@ -2,7 +2,8 @@
 
 #include <QGuiApplication>
 #include <QIcon>
-#include <QQuickWindow>
+#include <QQmlEngine>
+#include <QQuickView>
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -77,6 +78,21 @@ int runWindow(QGuiApplication& application, QVAppDelegate& app, const QVApplicat
     return QGuiApplication::exec();
 }
 
+/// Says in a window what keeps the application from starting, for those who did not start it from a terminal.
+void showStartFailure(const QString& message) {
+    QQuickView window;
+    window.setTitle(QStringLiteral("Qelvar"));
+    window.setResizeMode(QQuickView::SizeRootObjectToView);
+    window.resize(375, 667);
+    window.setInitialProperties({{QStringLiteral("title"), platform::localized("START_FAILED_TITLE")},
+                                 {QStringLiteral("message"), message},
+                                 {QStringLiteral("buttonTitle"), platform::localized("CLOSE")}});
+    QObject::connect(window.engine(), &QQmlEngine::quit, &QGuiApplication::quit);
+    window.setSource(QUrl(QStringLiteral("qrc:/Qelvar/QVStartFailure.qml")));
+    window.show();
+    QGuiApplication::exec();
+}
+
 }  // namespace
 
 std::filesystem::path QVStoreFolder(bool demo) {
@@ -110,6 +126,8 @@ int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options)
     if (!store) {
         std::fprintf(stderr, "qelvar: the store in %s cannot be opened: %s\n", folder.c_str(),
                      store.error().message.c_str());
+        if (!options.screenshots)
+            showStartFailure(QString::fromStdString(folder.string() + ": " + store.error().message));
         return 1;
     }
     QVStartupTrace::note("store open");

@@ -17,8 +17,8 @@ class QVPlaceholderViewController : public platform::Screen {
         const char* titleKey;
         std::function<void()> run;
     };
-    /// The icon is the name of one (platform::icon), with "/" and a colour to tint it, or empty; `title` gives the title in the user's
-    /// language.
+    /// The icon is the name of one (platform::icon), with "/" and a colour to tint it, or empty; `title`
+    /// gives the title in the user's language.
     QVPlaceholderViewController(std::function<QString()> title, QString icon, const char* messageKey,
                                 std::vector<Action> actions = {});
 

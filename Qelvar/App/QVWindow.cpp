@@ -35,5 +35,6 @@ QVWindow::QVWindow(QVAppDelegate& app, QSize size) {
     setMinimumSize(kSmallestSize);
     resize(size.isValid() ? size : kPhoneSize);
     setInitialProperties({{QStringLiteral("app"), QVariant::fromValue(&app)}});
+    connect(engine(), &QQmlEngine::quit, qGuiApp, &QGuiApplication::quit);
     setSource(QUrl(QStringLiteral("qrc:/Qelvar/QVTabBarController.qml")));
 }

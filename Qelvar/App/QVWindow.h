@@ -4,11 +4,11 @@
 
 #include "Qelvar/App/QVAppDelegate.h"
 
-/// The application's window: a phone's size unless another is given, with the screens of an application that has finished
-/// launching. Main thread only.
+/// The application's window: a phone's size unless another is given, with the screens of an application that
+/// has finished launching. Main thread only.
 class QVWindow : public QQuickView {
     Q_OBJECT
-   public:
+ public:
     /// REQUIRES: `app` outlives the window.
     QVWindow(QVAppDelegate& app, QSize size);
     /// The screens could be loaded.

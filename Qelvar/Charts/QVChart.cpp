@@ -157,16 +157,18 @@ void QVChart::showImages(const QImage& chart, const QImage& fill, const QImage& 
 
 void QVChart::showImage(ImageLayer& layer, const QImage& image, bool animated) {
     std::vector<ShownImage>& images = layer.images;
-    const bool hasCurrent = !images.empty() && images.back().opacity.target() == 1;
-    // The same image again would only make it dip.
-    if (hasCurrent ? images.back().image.cacheKey() == image.cacheKey() : image.isNull()) return;
-
+    // At once, also when the same image is still fading in.
     if (!animated || animationStyle_ != AnimationStyle::CrossFade) {
         images.clear();
         if (!image.isNull()) images.push_back({image, QVAnimatedNumber(1)});
         return;
     }
+    const bool hasCurrent = !images.empty() && images.back().opacity.target() == 1;
+    // The same image again would only make it dip.
+    if (hasCurrent ? images.back().image.cacheKey() == image.cacheKey() : image.isNull()) return;
     const QVAnimationTime now = clock_();
+    // A window that is not shown has no frames, yet goes on getting images.
+    advanceLayer(layer, now);
     for (ShownImage& old : images)
         if (old.opacity.target() != 0)
             old.opacity.animateTo(0, now, animationDuration_, QVAnimationCurve::EaseInOut);
@@ -201,14 +203,20 @@ void QVChart::needsRepaint() const {
     if (!painting_ && onNeedsRepaint) onNeedsRepaint();
 }
 
+/// Moves the fades on and drops what has faded out; returns whether one is still running.
+bool QVChart::advanceLayer(ImageLayer& layer, QVAnimationTime now) {
+    bool running = false;
+    for (ShownImage& shown : layer.images) running |= shown.opacity.advance(now);
+    std::erase_if(layer.images, [](const ShownImage& shown) {
+        return shown.opacity.target() == 0 && !shown.opacity.isAnimating();
+    });
+    return running;
+}
+
 bool QVChart::advance(QVAnimationTime now) {
     animating_ = backgroundView_ && backgroundView_->advance(now);
-    for (ImageLayer* layer : {&secondaryFillLayer_, &fillLayer_, &chartLayer_}) {
-        for (ShownImage& shown : layer->images) animating_ |= shown.opacity.advance(now);
-        std::erase_if(layer->images, [](const ShownImage& shown) {
-            return shown.opacity.target() == 0 && !shown.opacity.isAnimating();
-        });
-    }
+    for (ImageLayer* layer : {&secondaryFillLayer_, &fillLayer_, &chartLayer_})
+        animating_ |= advanceLayer(*layer, now);
     for (std::vector<AxisLabelView>* views : {&axisLabels_, &leavingAxisLabels_})
         for (AxisLabelView& view : *views)
             for (QVAnimatedNumber* number : {&view.centerX, &view.centerY, &view.opacity})

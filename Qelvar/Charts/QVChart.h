@@ -120,6 +120,7 @@ class QVChart {
     void renderChart(bool animated);
     void showImages(const QImage& chart, const QImage& fill, const QImage& secondaryFill, bool animated);
     void showImage(ImageLayer& layer, const QImage& image, bool animated);
+    static bool advanceLayer(ImageLayer& layer, QVAnimationTime now);
     void updateBackgroundView(bool animated);
     void layoutBackgroundView();
 

@@ -17,7 +17,8 @@ QStringList QVTimeScopeControl::segments() const {
 }
 
 QString QVTimeScopeControl::accessibleName() const {
-    return platform::localized("TIME_SCOPE") + QStringLiteral(", ") + QVTimeScopeDisplayName(selectedTimeScope());
+    return platform::localized("TIME_SCOPE") + QStringLiteral(", ") +
+           QVTimeScopeDisplayName(selectedTimeScope());
 }
 
 void QVTimeScopeControl::setSelectedTimeScope(QVTimeScope timeScope) {

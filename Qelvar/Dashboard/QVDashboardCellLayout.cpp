@@ -72,9 +72,8 @@ QVDashboardCellLayout QVDashboardCellLayout::make(const QVDashboardCellContent& 
 
     layout.background = QRectF(kInset, kInset, width, preferredCellHeight - kInset);
     const auto placed = [&](QRectF frame) {
-        frame = flooredToPixels(frame, content.screenScale);
         if (content.rightToLeft) frame.moveLeft(width - frame.right());
-        return frame.translated(layout.background.topLeft());
+        return flooredToPixels(frame.translated(layout.background.topLeft()), content.screenScale);
     };
     if (content.hasCategoryIcon) layout.categoryIcon = placed(icon);
     layout.title = placed(title);

@@ -25,6 +25,11 @@ QVDashboardChartItem::QVDashboardChartItem(const VSDataUnitGroup* dataUnitGroup,
       dataProvider_(QVGroupDataProvider::create(dataUnitGroup_, unitController_, healthStore)),
       chartRenderer_(QVChartRenderer::create(platform::mainQueue(), dataProvider_)) {}
 
+void QVDashboardChartItem::setLocaleDidChange(bool changed) {
+    localeDidChange_ = changed;
+    if (changed) dataProvider_->localeDidChange();
+}
+
 void QVDashboardChartItem::activate() {
     if (active_) return;
     active_ = true;

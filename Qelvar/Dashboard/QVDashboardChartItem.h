@@ -51,7 +51,7 @@ class QVDashboardChartItem final : public QVGroupDataProviderDelegate {
     std::optional<VSDate> endDate() const { return endDate_; }
     /// Set when the user's locale changed, cleared by the card when it has made its texts anew.
     bool localeDidChange() const { return localeDidChange_; }
-    void setLocaleDidChange(bool changed) { localeDidChange_ = changed; }
+    void setLocaleDidChange(bool changed);
 
     bool isActive() const { return active_; }
     /// Starts the data provider; a second call does nothing.

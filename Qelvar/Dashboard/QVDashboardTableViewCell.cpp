@@ -314,9 +314,14 @@ void QVDashboardTableViewCell::itemChange(ItemChange change, const ItemChangeDat
     QQuickItem::itemChange(change, data);
     if (change == ItemSceneChange) {
         disconnect(frames_);
-        if (data.window)
+        disconnect(sceneLoss_);
+        if (data.window) {
             frames_ = connect(data.window, &QQuickWindow::afterAnimating, this,
                               &QVDashboardTableViewCell::animateFrames);
+            // With a lost graphics device the texture is lost, too.
+            sceneLoss_ = connect(data.window, &QQuickWindow::sceneGraphInvalidated, this,
+                                 &QVDashboardTableViewCell::contentLooksDifferent);
+        }
     }
     if (change == ItemDevicePixelRatioHasChanged || change == ItemSceneChange) contentLooksDifferent();
 }

@@ -67,7 +67,7 @@ class QVDashboardTableViewCell : public QQuickItem {
     bool wasPaintedWithData() const { return painted_ >= Painted::WithData; }
     bool wasPaintedSettled() const { return painted_ == Painted::Settled; }
 
-signals:
+ signals:
     void screenChanged();
     void rowChanged();
     void contentChanged();
@@ -109,7 +109,7 @@ signals:
     QVChart chart_;
 
     std::shared_ptr<Observer> observer_;
-    QMetaObject::Connection frames_;
+    QMetaObject::Connection frames_, sceneLoss_;
     QImage image_;
     enum class Painted { Outdated, WithData, Settled };
     Painted painted_ = Painted::Outdated;

@@ -106,7 +106,9 @@ void QVDashboardViewController::reloadDataUnitGroups() {
 }
 
 void QVDashboardViewController::updateEmptyState() {
-    const bool empty = dashboardDataUnitGroups_.empty();
+    // A list that has not been read yet is not an empty one.
+    const bool empty = dashboardDataUnitGroups_.empty() &&
+                       controllerManager_->dashboardDataUnitGroupsController().hasLoadedDashboard();
     if (empty == showsEmptyState_) return;
     showsEmptyState_ = empty;
     emit emptyStateChanged();

@@ -44,7 +44,7 @@ class QVDashboardViewController : public platform::Screen {
         return dashboardChartItems_;
     }
 
-    /// Nothing is on the dashboard (or the list has not been read yet).
+    /// Nothing is on the dashboard. False until the list has been read.
     bool showsEmptyState() const { return showsEmptyState_; }
     QString emptyStateTitle() const;
     QString emptyStateHelp() const;

@@ -113,20 +113,22 @@ void QVDashboardDataUnitGroupsController::dashboardRead(const std::optional<std:
 
 void QVDashboardDataUnitGroupsController::loadSelection() {
     userDefaults_.valueForKey(selectionKey, [this, alive = std::weak_ptr<bool>(alive_)](const auto& answer) {
-        platform::mainQueue().async([this, alive, ids = storedIDs(answer, selectionKey)] {
-            if (!alive.expired()) selectionRead(ids);
+        platform::mainQueue().async([this, alive, ids = storedIDs(answer, selectionKey), wasRead = answer.ok()] {
+            if (!alive.expired()) selectionRead(ids, wasRead);
         });
     });
 }
 
-void QVDashboardDataUnitGroupsController::selectionRead(const std::optional<std::vector<int>>& storedIDs) {
+void QVDashboardDataUnitGroupsController::selectionRead(const std::optional<std::vector<int>>& storedIDs,
+                                                        bool wasRead) {
     if (selectionWasSet_) return;  // by the user, while it was being read
     if (storedIDs) {
         selected_ = withoutRepetition(groupsWithIDs(*storedIDs));
         return;
     }
     selected_ = firstThreeOfDashboard();
-    if (!selected_.empty()) persistSelection();
+    // What could not be read may be there all the same, and is the user's.
+    if (wasRead && !selected_.empty()) persistSelection();
 }
 
 std::vector<int> QVDashboardDataUnitGroupsController::hardwareDefaultIDs() {

@@ -62,7 +62,7 @@ class QVDashboardDataUnitGroupsController {
     void load();
     void loadSelection();
     void dashboardRead(const std::optional<std::vector<int>>& storedIDs);
-    void selectionRead(const std::optional<std::vector<int>>& storedIDs);
+    void selectionRead(const std::optional<std::vector<int>>& storedIDs, bool wasRead);
     void loadDemoSelection();
     static std::vector<int> hardwareDefaultIDs();
     Groups groupsWithIDs(const std::vector<int>& ids) const;

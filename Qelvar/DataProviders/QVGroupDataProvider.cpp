@@ -92,6 +92,10 @@ void QVGroupDataProvider::invalidateCachedData() {
     for (const auto& [dataUnit, provider] : dataProviders_) provider->invalidateCachedData();
 }
 
+void QVGroupDataProvider::localeDidChange() {
+    chartSeries_ = QVChartSeriesForDataUnitGroup(dataUnitGroup_, timeScope_);
+}
+
 // Secondary text
 
 platform::StyledText QVGroupDataProvider::secondaryValueText() const {

@@ -66,6 +66,8 @@ class QVGroupDataProvider final : public QVChartRendererDataSource, public QVDat
     void activate();
     void deactivate();
     void invalidateCachedData();
+    /// The user's language changed: makes the series anew, for some carry labels.
+    void localeDidChange();
 
     /// Of the data unit at the index. Null where the display type draws nothing in this time scope.
     const std::shared_ptr<const QVChartSeries>& chartSeriesForIndex(size_t index) const {

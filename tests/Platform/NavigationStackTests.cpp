@@ -11,17 +11,17 @@ namespace {
 using platform::NavigationStack;
 
 class LoggingScreen : public platform::Screen {
-   public:
+ public:
     LoggingScreen(QString name, QStringList& log) : name_(std::move(name)), log_(log) { setTitle(name_); }
     ~LoggingScreen() override { log_ << name_ + " gone"; }
     QUrl view() const override { return {}; }
 
-   protected:
+ protected:
     void willAppear() override { log_ << name_ + " will appear"; }
     void didAppear() override { log_ << name_ + " appeared"; }
     void willDisappear() override { log_ << name_ + " will disappear"; }
 
-   private:
+ private:
     QString name_;
     QStringList& log_;
 };

@@ -16,9 +16,12 @@ VSValue read(const std::string& body) {
 
 TEST(PropertyList, ReadsEveryKindOfValue) {
     const VSValue value = read(
-        "<!-- a comment --><dict><key>text</key><string>a &lt; b, \xC3\xA9</string><key>count</key><integer>-3</integer>"
-        "<key>size</key><real>1.5</real><key>day</key><date>1986-04-12T00:00:00Z</date><key>yes</key><true/><key>no</key><false/>"
-        "<key>bytes</key><data>AAEC /w==</data><key>list</key><array><integer>1</integer><dict/></array></dict>");
+        "<!-- a comment --><dict><key>text</key><string>a &lt; b, "
+        "\xC3\xA9</string><key>count</key><integer>-3</integer>"
+        "<key>size</key><real>1.5</real><key>day</key><date>1986-04-12T00:00:00Z</date><key>yes</key><true/"
+        "><key>no</key><false/>"
+        "<key>bytes</key><data>AAEC "
+        "/w==</data><key>list</key><array><integer>1</integer><dict/></array></dict>");
     EXPECT_EQ(*value["text"]->string(), "a < b, \xC3\xA9");
     EXPECT_EQ(value["count"]->integer(), -3);
     EXPECT_EQ(value["size"]->number(), 1.5);
@@ -67,7 +70,8 @@ TEST(PropertyList, RefusesWhatIsNotOne) {
 
 TEST(PropertyList, EntitiesCannotBeDeclared) {
     const auto value = platform::readPropertyList(
-        "<?xml version=\"1.0\"?><!DOCTYPE plist [<!ENTITY a \"aaaa\"><!ENTITY b SYSTEM \"file:///etc/passwd\">]>"
+        "<?xml version=\"1.0\"?><!DOCTYPE plist [<!ENTITY a \"aaaa\"><!ENTITY b SYSTEM "
+        "\"file:///etc/passwd\">]>"
         "<plist><string>&a;&b;</string></plist>");
     ASSERT_FALSE(value.ok());
     EXPECT_NE(value.error().message.find("entities"), std::string::npos) << value.error().message;
@@ -81,7 +85,9 @@ TEST(PropertyList, ErrorsNameTheirLine) {
 
 TEST(PropertyList, StopsBeforeAKey) {
     const auto head = platform::readPropertyListBefore(
-        plist("<dict><key>a</key><dict><key>samples</key><integer>1</integer></dict><key>samples</key><broken"), "samples");
+        plist(
+            "<dict><key>a</key><dict><key>samples</key><integer>1</integer></dict><key>samples</key><broken"),
+        "samples");
     ASSERT_TRUE(head.ok()) << head.error().message;
     ASSERT_EQ(head->size(), 1u);
     EXPECT_EQ((*(*head).at("a")["samples"]).integer(), 1);

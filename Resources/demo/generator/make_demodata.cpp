@@ -156,6 +156,13 @@ void addMonth(Profile& profile, const std::vector<Record>& records) {
             if (at - lastHeartRate < (record.day > -7 ? 600 : 1800)) continue;
             lastHeartRate = at;
         }
+        if (record.type == "FlightsClimbed") {
+            // The tracker counts floors over many hours, also over midnight; shown as climbed when it said so.
+            Record climbed = record;
+            climbed.start = record.end - 120;
+            addRecord(profile, climbed, record.day, 1);
+            continue;
+        }
         addRecord(profile, record, record.day, 1);
     }
 }

@@ -16,10 +16,11 @@
 namespace {
 
 class AppDelegateTest : public testing::Test {
-   protected:
+ protected:
     AppDelegateTest() {
         platform::loadTranslations();
-        platform::UserDefaults::setStandard(std::make_unique<platform::UserDefaults>(folder_.path() / "defaults.json"));
+        platform::UserDefaults::setStandard(
+            std::make_unique<platform::UserDefaults>(folder_.path() / "defaults.json"));
         store_ = *VSHealthStore::open(folder_.path() / "store");
         QVUserDefaults::sharedDefaults().setHealthStore(store_);
     }
@@ -49,7 +50,8 @@ TEST_F(AppDelegateTest, FourTabsInTheirOrder) {
     for (int index = 0; index < 4; ++index) {
         EXPECT_EQ(tabs.data(tabs.index(index), QVTabBarController::TitleRole), titles[index]);
         EXPECT_EQ(tabs.data(tabs.index(index), QVTabBarController::ImageRole), images[index]);
-        EXPECT_EQ(tabs.data(tabs.index(index), QVTabBarController::SelectedImageRole), QString(images[index]) + "_selected");
+        EXPECT_EQ(tabs.data(tabs.index(index), QVTabBarController::SelectedImageRole),
+                  QString(images[index]) + "_selected");
         EXPECT_EQ(tabs.stack(index)->restorationIdentifier(), stacks[index]);
         EXPECT_EQ(tabs.stack(index)->rootScreen()->title(), titles[index]);
     }
@@ -61,7 +63,8 @@ TEST_F(AppDelegateTest, TappingTheMedicalIDAgainIsRefusedAndOthersReturnToTheirR
     const auto app = launch();
     QVTabBarController& tabs = *app->tabBarController();
     const auto push = [&tabs] {
-        tabs.selectedStack()->push(std::make_unique<QVPlaceholderViewController>([] { return QString("deep"); }, "", "DONE"));
+        tabs.selectedStack()->push(
+            std::make_unique<QVPlaceholderViewController>([] { return QString("deep"); }, "", "DONE"));
     };
     push();
     tabs.tap(0);
@@ -81,8 +84,10 @@ TEST_F(AppDelegateTest, TappingTheMedicalIDAgainIsRefusedAndOthersReturnToTheirR
 TEST_F(AppDelegateTest, ActivitiesLeadToTheirTabsRoot) {
     const auto app = launch();
     QVTabBarController& tabs = *app->tabBarController();
-    tabs.stack(2)->push(std::make_unique<QVPlaceholderViewController>([] { return QString("deep"); }, "", "DONE"));
-    EXPECT_TRUE(app->continueUserActivity(*QVUserActivityManager::activity("", {}, QVUserActivityTab::Sources)));
+    tabs.stack(2)->push(
+        std::make_unique<QVPlaceholderViewController>([] { return QString("deep"); }, "", "DONE"));
+    EXPECT_TRUE(
+        app->continueUserActivity(*QVUserActivityManager::activity("", {}, QVUserActivityTab::Sources)));
     EXPECT_EQ(tabs.selectedIndex(), 2);
     EXPECT_EQ(tabs.selectedStack()->count(), 1);
     EXPECT_TRUE(app->openLink("qelvar://HealthDataTab?DataCategory=3"));
@@ -114,7 +119,8 @@ TEST_F(AppDelegateTest, TheTabShownIsTheCurrentActivity) {
 
 TEST_F(AppDelegateTest, TheHealthDataTabOffersToImport) {
     const auto app = launch();
-    auto* screen = qobject_cast<QVPlaceholderViewController*>(app->tabBarController()->stack(1)->rootScreen());
+    auto* screen =
+        qobject_cast<QVPlaceholderViewController*>(app->tabBarController()->stack(1)->rootScreen());
     ASSERT_TRUE(screen);
     QSignalSpy requested(app.get(), &QVAppDelegate::importRequested);
     ASSERT_EQ(screen->actionTitles().size(), 1);
@@ -139,7 +145,8 @@ TEST_F(AppDelegateTest, DemoRecordsAreBuiltOnlyInTheDemonstration) {
     const auto types = store_->typeSummaries();
     ASSERT_TRUE(types.ok());
     EXPECT_GT(types->size(), 60u);
-    EXPECT_FALSE(app->controllerManager()->dashboardDataUnitGroupsController().dataUnitGroupsForDashboard().empty());
+    EXPECT_FALSE(
+        app->controllerManager()->dashboardDataUnitGroupsController().dataUnitGroupsForDashboard().empty());
     app->didBecomeActive();
     EXPECT_FALSE(app->isResettingDemoData()) << "once a day";
 }
@@ -154,12 +161,16 @@ TEST(UserActivities, NameWhatIsNeededToOpenThem) {
     EXPECT_EQ(full->requiredUserInfoKeys, (QStringList{"MainTab", "DataCategory", "DataUnit", "Calendar"}));
     EXPECT_EQ(full->userInfo.value("DataUnit").toInt(), 59);
 
-    const auto link = QVUserActivityManager::activityFromLink("qelvar://HealthDataTab/?DataCategory=4&DataUnit=59&Calendar=1");
+    const auto link = QVUserActivityManager::activityFromLink(
+        "qelvar://HealthDataTab/?DataCategory=4&DataUnit=59&Calendar=1");
     ASSERT_TRUE(link);
     EXPECT_EQ(link->userInfo, full->userInfo);
-    EXPECT_EQ(QVUserActivityManager::activityFromLink("QELVAR://DashboardTab")->userInfo.value("MainTab"), "DashboardTab");
+    EXPECT_EQ(QVUserActivityManager::activityFromLink("QELVAR://DashboardTab")->userInfo.value("MainTab"),
+              "DashboardTab");
     EXPECT_FALSE(QVUserActivityManager::activityFromLink("DashboardTab"));
-    EXPECT_EQ(QVUserActivityManager::activityFromLink("qelvar://SourcesTab?DataCategory=x")->requiredUserInfoKeys.size(), 1);
+    EXPECT_EQ(QVUserActivityManager::activityFromLink("qelvar://SourcesTab?DataCategory=x")
+                  ->requiredUserInfoKeys.size(),
+              1);
 }
 
 }  // namespace

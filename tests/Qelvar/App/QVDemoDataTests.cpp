@@ -15,13 +15,17 @@ namespace {
 
 using test::date;
 
-const VSObjectType* type(VSTypeCode code) { return VSObjectType::dataTypeWithCode(code); }
+const VSObjectType* type(VSTypeCode code) {
+    return VSObjectType::dataTypeWithCode(code);
+}
 
 VSValue::Dictionary entry(const std::string& identifier, double value, double offset) {
     return {{"dataTypeIdentifier", identifier}, {"value", value}, {"dateOffsetInterval", offset}};
 }
 
-VSValue::Dictionary entry(VSTypeCode code, double value, double offset) { return entry(type(code)->identifier(), value, offset); }
+VSValue::Dictionary entry(VSTypeCode code, double value, double offset) {
+    return entry(type(code)->identifier(), value, offset);
+}
 
 /// Everything in one list.
 std::vector<VSSamplePtr> build(const VSValue::Array& entries) {
@@ -31,13 +35,14 @@ std::vector<VSSamplePtr> build(const VSValue::Array& entries) {
                             {type(VSCode::StepCount), VSUnit::fromString("count")},
                             {type(VSCode::BloodGlucose), VSUnit::fromString("mg/dL")},
                             {type(VSCode::BodyMass), VSUnit::fromString("lb")}};
-    QVBuildDemoSamples(entries, date("2020-03-31"), units, 10'000,
-                       [&all](std::vector<VSSamplePtr> batch, bool) { all.insert(all.end(), batch.begin(), batch.end()); });
+    QVBuildDemoSamples(
+        entries, date("2020-03-31"), units, 10'000,
+        [&all](std::vector<VSSamplePtr> batch, bool) { all.insert(all.end(), batch.begin(), batch.end()); });
     return all;
 }
 
 class DemoSamples : public testing::Test {
-   protected:
+ protected:
     test::FixedEnvironment environment_{"2020-03-31T20:00"};
 };
 
@@ -47,7 +52,8 @@ TEST_F(DemoSamples, SpansAreRelativeToTheStartOfToday) {
     withEnd.emplace("metadata", VSMetadata{{"Place", "home"}});
     auto backwards = entry(VSCode::StepCount, 1, 0);
     backwards.emplace("dateOffsetIntervalEnd", -1);
-    const auto samples = build({withEnd, entry(VSCode::StepCount, 5, 60), backwards, entry("VSQuantityTypeIdentifierUnknown", 1, 0),
+    const auto samples = build({withEnd, entry(VSCode::StepCount, 5, 60), backwards,
+                                entry("VSQuantityTypeIdentifierUnknown", 1, 0),
                                 entry(VSCode::DateOfBirth, 1, 0), VSValue("not an entry")});
     ASSERT_EQ(samples.size(), 2u);
     EXPECT_EQ(samples[0]->startDate(), date("2020-03-30T23:00"));
@@ -63,10 +69,13 @@ TEST_F(DemoSamples, UnitsAreTheEntrysThenTheTypesOwnThenThePreferredOne) {
     unfit.insert_or_assign("unit", "cm");
     auto named = entry(VSCode::BloodGlucose, 5.5, 0);
     named.emplace("unit", "mmol/L");
-    const auto samples = build({kilograms, unfit, named, entry(VSCode::BodyMass, 150, 0), entry(VSCode::BloodGlucose, 99, 0)});
+    const auto samples =
+        build({kilograms, unfit, named, entry(VSCode::BodyMass, 150, 0), entry(VSCode::BloodGlucose, 99, 0)});
     ASSERT_EQ(samples.size(), 4u);
     const auto value = [&samples](size_t index, const char* unit) {
-        return static_cast<const VSQuantitySample&>(*samples[index]).quantity().doubleValueForUnit(VSUnit::fromString(unit));
+        return static_cast<const VSQuantitySample&>(*samples[index])
+            .quantity()
+            .doubleValueForUnit(VSUnit::fromString(unit));
     };
     EXPECT_DOUBLE_EQ(value(0, "kg"), 68);
     EXPECT_NEAR(value(1, "mg/dL"), 5.5 * 18.01558, 1e-9);
@@ -75,12 +84,15 @@ TEST_F(DemoSamples, UnitsAreTheEntrysThenTheTypesOwnThenThePreferredOne) {
 }
 
 TEST_F(DemoSamples, PressuresGatherIntoACorrelation) {
-    const auto systolic = entry(VSCode::BloodPressureSystolic, 120, 0), diastolic = entry(VSCode::BloodPressureDiastolic, 80, 0);
+    const auto systolic = entry(VSCode::BloodPressureSystolic, 120, 0),
+               diastolic = entry(VSCode::BloodPressureDiastolic, 80, 0);
     const auto together = entry(VSCode::BloodPressure, 0, 0);
-    auto samples = build({systolic, together, diastolic, together, together, systolic, diastolic, systolic, together});
+    auto samples =
+        build({systolic, together, diastolic, together, together, systolic, diastolic, systolic, together});
     std::vector<size_t> members;
     for (const auto& sample : samples)
-        if (const auto* correlation = dynamic_cast<const VSCorrelation*>(sample.get())) members.push_back(correlation->objects().size());
+        if (const auto* correlation = dynamic_cast<const VSCorrelation*>(sample.get()))
+            members.push_back(correlation->objects().size());
     EXPECT_EQ(members, (std::vector<size_t>{2, 3})) << "one alone makes none; those used are not used again";
     EXPECT_EQ(samples.size(), 5u + 2u) << "the pressures stand by themselves as well";
 }
@@ -100,7 +112,8 @@ TEST_F(DemoSamples, MenstrualFlowMarksTheStartOfCycles) {
 }
 
 TEST_F(DemoSamples, SexualActivityKeepsItsProtectionInTheMetadata) {
-    const auto samples = build({entry(VSCode::SexualActivity, 1, 0), entry(VSCode::SexualActivity, 2, 0), entry(VSCode::SexualActivity, 3, 0)});
+    const auto samples = build({entry(VSCode::SexualActivity, 1, 0), entry(VSCode::SexualActivity, 2, 0),
+                                entry(VSCode::SexualActivity, 3, 0)});
     ASSERT_EQ(samples.size(), 3u);
     EXPECT_TRUE(samples[0]->metadata().empty());
     EXPECT_EQ(samples[1]->metadata().at(VSMetadataKeySexualActivityProtectionUsed), VSValue(true));
@@ -142,9 +155,10 @@ TEST_F(DemoSamples, ComeInBatches) {
 }
 
 class DemoReset : public testing::Test {
-   protected:
+ protected:
     DemoReset() {
-        platform::UserDefaults::setStandard(std::make_unique<platform::UserDefaults>(folder_.path() / "defaults.json"));
+        platform::UserDefaults::setStandard(
+            std::make_unique<platform::UserDefaults>(folder_.path() / "defaults.json"));
         store_ = *VSHealthStore::open(folder_.path() / "store");
         unitController_ = std::make_shared<VSUnitController>(store_);
     }
@@ -163,7 +177,9 @@ class DemoReset : public testing::Test {
         EXPECT_TRUE(test::waitUntil([&demo] { return !demo.isResetting(); }));
         return due;
     }
-    std::vector<VSSamplePtr> samples(VSTypeCode code) { return *store_->samples(type(code), VSPredicate(), 0, {}); }
+    std::vector<VSSamplePtr> samples(VSTypeCode code) {
+        return *store_->samples(type(code), VSPredicate(), 0, {});
+    }
 
     test::FixedEnvironment environment_{"2020-03-31T20:00"};
     test::TemporaryFolder folder_;
@@ -173,18 +189,29 @@ class DemoReset : public testing::Test {
 };
 
 TEST_F(DemoReset, ReplacesWhatIsInTheStore) {
-    const auto old = std::make_shared<const VSQuantitySample>(
-        type(VSCode::HeartRate), VSQuantity(VSUnit::fromString("count/min"), 99), date("2020-03-01"), date("2020-03-01"));
-    ASSERT_TRUE(store_->saveObjectsAndWait({old}).ok());
+    const auto old = std::make_shared<const VSQuantitySample>(type(VSCode::HeartRate),
+                                                              VSQuantity(VSUnit::fromString("count/min"), 99),
+                                                              date("2020-03-01"), date("2020-03-01"));
+    const auto pressure = std::make_shared<const VSQuantitySample>(
+        type(VSCode::BloodPressureSystolic), VSQuantity(VSUnit::fromString("mmHg"), 120), date("2020-03-01"),
+        date("2020-03-01"));
+    const auto reading =
+        std::make_shared<const VSCorrelation>(type(VSCode::BloodPressure), date("2020-03-01"),
+                                              date("2020-03-01"), std::vector<VSSamplePtr>{pressure});
+    ASSERT_TRUE(store_->saveObjectsAndWait({old, reading}).ok());
     EXPECT_TRUE(reset("Female"));
     EXPECT_EQ(saves_, 1);
     const auto heartRates = samples(VSCode::HeartRate);
     ASSERT_EQ(heartRates.size(), 1u);
     EXPECT_EQ(heartRates[0]->startDate(), date("2020-03-30T23:00"));
     EXPECT_EQ(samples(VSCode::StepCount).size(), 1u);
+    EXPECT_TRUE(samples(VSCode::BloodPressureSystolic).empty());
+    EXPECT_TRUE(samples(VSCode::BloodPressure).empty()) << "a reading goes with its values";
 
     test::Promise<VSMedicalIDData> medicalID;
-    store_->fetchMedicalIDData([&medicalID](const auto& result) { medicalID.set(result.ok() && *result ? **result : VSMedicalIDData()); });
+    store_->fetchMedicalIDData([&medicalID](const auto& result) {
+        medicalID.set(result.ok() && *result ? **result : VSMedicalIDData());
+    });
     const auto data = medicalID.wait();
     ASSERT_TRUE(data);
     EXPECT_EQ(data->name, "Kim Example");
@@ -239,7 +266,8 @@ TEST(DemoDocument, IsWholeAndQuickToRead) {
     for (const VSObjectType* each : VSObjectType::allTypes())
         if (each->isQuantityType()) units.insert_or_assign(each, each->canonicalUnit());
     size_t count = 0;
-    QVBuildDemoSamples(entries, date("2020-03-31"), units, 10'000, [&count](std::vector<VSSamplePtr> batch, bool) { count += batch.size(); });
+    QVBuildDemoSamples(entries, date("2020-03-31"), units, 10'000,
+                       [&count](std::vector<VSSamplePtr> batch, bool) { count += batch.size(); });
     EXPECT_GT(count, entries.size() * 95 / 100) << "entries without a sample are few";
 }
 

@@ -14,7 +14,7 @@ namespace {
 using State = QVImportController::State;
 
 class ImportControllerTest : public testing::Test {
-   protected:
+ protected:
     ImportControllerTest() {
         platform::loadTranslations();
         store_ = *VSHealthStore::open(folder_.path() / "store");
@@ -27,8 +27,10 @@ class ImportControllerTest : public testing::Test {
         file << "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<HealthData locale=\"en_US\">\n";
         for (int i = 0; i < records; ++i) {
             char date[32];
-            std::snprintf(date, sizeof date, "2020-03-%02d %02d:%02d:00 +0100", 1 + i / 1440 % 28, i / 60 % 24, i % 60);
-            file << "<Record type=\"VSQuantityTypeIdentifierHeartRate\" sourceName=\"Watch\" unit=\"count/min\" creationDate=\""
+            std::snprintf(date, sizeof date, "2020-03-%02d %02d:%02d:00 +0100", 1 + i / 1440 % 28,
+                          i / 60 % 24, i % 60);
+            file << "<Record type=\"VSQuantityTypeIdentifierHeartRate\" sourceName=\"Watch\" "
+                    "unit=\"count/min\" creationDate=\""
                  << date << "\" startDate=\"" << date << "\" endDate=\"" << date << "\" value=\""
                  << (i < bad ? "fast" : std::to_string(60 + i % 40)) << "\"/>\n";
         }
@@ -39,7 +41,8 @@ class ImportControllerTest : public testing::Test {
         return test::waitUntil([&controller] { return controller.state() == State::Finished; });
     }
     size_t count() const {
-        return store_->samples(VSObjectType::dataTypeWithCode(VSCode::HeartRate), VSPredicate(), 0, {})->size();
+        return store_->samples(VSObjectType::dataTypeWithCode(VSCode::HeartRate), VSPredicate(), 0, {})
+            ->size();
     }
 
     test::FixedEnvironment environment_{"2020-03-31T20:00"};

@@ -5,6 +5,7 @@
 #include <QAccessible>
 #include <QDropEvent>
 #include <QMimeData>
+#include <QProcess>
 #include <QQuickItem>
 #include <QTest>
 #include <algorithm>
@@ -30,15 +31,18 @@ QStringList& complaints() {
 
 /// The whole window, on a store of its own.
 class WindowTest : public testing::Test {
-   protected:
+ protected:
     WindowTest() {
         static std::once_flag once;
         std::call_once(once, [] { QQuickWindow::setGraphicsApi(QSGRendererInterface::Software); });
         complaints().clear();
-        previousHandler_ = qInstallMessageHandler([](QtMsgType type, const QMessageLogContext&, const QString& line) {
-            if (type != QtDebugMsg && type != QtInfoMsg && !line.contains("XDG_RUNTIME_DIR")) complaints() << line;
-        });
-        platform::UserDefaults::setStandard(std::make_unique<platform::UserDefaults>(folder_.path() / "defaults.json"));
+        previousHandler_ =
+            qInstallMessageHandler([](QtMsgType type, const QMessageLogContext&, const QString& line) {
+                if (type != QtDebugMsg && type != QtInfoMsg && !line.contains("XDG_RUNTIME_DIR"))
+                    complaints() << line;
+            });
+        platform::UserDefaults::setStandard(
+            std::make_unique<platform::UserDefaults>(folder_.path() / "defaults.json"));
         store_ = *VSHealthStore::open(folder_.path() / "store");
         QVUserDefaults::sharedDefaults().setHealthStore(store_);
     }
@@ -67,16 +71,22 @@ class WindowTest : public testing::Test {
     bool waitForCards(qsizetype atLeast) {
         return test::waitUntil([this, atLeast] {
             const auto cards = QVCardsInScene(window_->rootObject());
-            return cards.size() >= atLeast && std::all_of(cards.begin(), cards.end(), [](const auto* card) { return card->wasPaintedSettled(); });
+            return cards.size() >= atLeast && std::all_of(cards.begin(), cards.end(), [](const auto* card) {
+                       return card->wasPaintedSettled();
+                   });
         });
     }
-    void press(Qt::Key key, Qt::KeyboardModifiers modifiers = {}) { QTest::keyClick(window_.get(), key, modifiers); }
+    void press(Qt::Key key, Qt::KeyboardModifiers modifiers = {}) {
+        QTest::keyClick(window_.get(), key, modifiers);
+    }
     /// What a screen reader says of the item that has the keyboard.
     QString focused() const {
         QAccessibleInterface* interface = QAccessible::queryAccessibleInterface(window_->activeFocusItem());
         return interface ? interface->text(QAccessible::Name) : QString();
     }
-    static const VSDataUnitGroup* group(int id) { return VSDataUnitGroupController::shared().dataUnitGroupWithID(id); }
+    static const VSDataUnitGroup* group(int id) {
+        return VSDataUnitGroupController::shared().dataUnitGroupWithID(id);
+    }
 
     test::FixedEnvironment environment_{"2020-03-31T20:00"};
     test::TemporaryFolder folder_;
@@ -96,7 +106,8 @@ TEST_F(WindowTest, IsAPhonesAndShowsCardsThatCanBeReadAloud) {
     QAccessibleInterface* card = QAccessible::queryAccessibleInterface(cards[0]->parentItem());
     ASSERT_TRUE(card);
     EXPECT_EQ(card->role(), QAccessible::Button);
-    EXPECT_TRUE(card->text(QAccessible::Name).startsWith("Steps, No Data")) << card->text(QAccessible::Name).toStdString();
+    EXPECT_TRUE(card->text(QAccessible::Name).startsWith("Steps, No Data"))
+        << card->text(QAccessible::Name).toStdString();
 }
 
 TEST_F(WindowTest, EverythingIsReachedByKeyboard) {
@@ -109,14 +120,16 @@ TEST_F(WindowTest, EverythingIsReachedByKeyboard) {
         press(Qt::Key_Tab);
         reached << focused();
     }
-    for (const char* name : {"Dashboard", "Health Data", "Sources", "Medical ID"}) EXPECT_TRUE(reached.contains(name)) << reached.join("|").toStdString();
+    for (const char* name : {"Dashboard", "Health Data", "Sources", "Medical ID"})
+        EXPECT_TRUE(reached.contains(name)) << reached.join("|").toStdString();
 
     // The time scope follows the arrows while its control has the keyboard.
     for (int i = 0; i < 12 && !focused().startsWith("Time scope"); ++i) press(Qt::Key_Tab);
     EXPECT_EQ(focused(), "Time scope, Week");
     press(Qt::Key_Right);
     EXPECT_EQ(focused(), "Time scope, Month");
-    EXPECT_EQ(app_->controllerManager()->selectedTimeScopeController().selectedTimeScope(), QVTimeScope::Month);
+    EXPECT_EQ(app_->controllerManager()->selectedTimeScopeController().selectedTimeScope(),
+              QVTimeScope::Month);
     ASSERT_TRUE(waitForCards(2));
 
     press(Qt::Key_3, Qt::ControlModifier);
@@ -142,12 +155,28 @@ TEST_F(WindowTest, ACardOpensAndEscapeReturns) {
     ASSERT_TRUE(test::waitUntil(isStill));
 }
 
-TEST_F(WindowTest, WhatAnotherConnectionSavesReachesTheCard) {
-    open({group(VSGroupID::HeartRate)});
-    const auto other = *VSHealthStore::open(folder_.path() / "store");
+/// Not a test of its own: what the process does that the next test starts.
+TEST(AnotherProcess, SavesAHeartRate) {
+    if (!qEnvironmentVariableIsSet("QELVAR_TEST_STORE"))
+        GTEST_SKIP() << "WhatAnotherProcessSavesReachesTheCard runs it";
+    test::FixedEnvironment environment{"2020-03-31T20:00"};
+    const auto store = *VSHealthStore::open(qgetenv("QELVAR_TEST_STORE").toStdString());
     const auto* type = VSObjectType::dataTypeWithCode(VSCode::HeartRate);
     const VSQuantity quantity(VSUnit::fromString("count/min"), 77);
-    ASSERT_TRUE(other->saveObjectsAndWait({std::make_shared<const VSQuantitySample>(type, quantity, date("2020-03-31T10:00"), date("2020-03-31T10:00"))}).ok());
+    const auto sample = std::make_shared<const VSQuantitySample>(type, quantity, date("2020-03-31T10:00"),
+                                                                 date("2020-03-31T10:00"));
+    ASSERT_TRUE(store->saveObjectsAndWait({sample}).ok());
+}
+
+TEST_F(WindowTest, WhatAnotherProcessSavesReachesTheCard) {
+    open({group(VSGroupID::HeartRate)});
+    QProcess other;
+    QProcessEnvironment environment = QProcessEnvironment::systemEnvironment();
+    environment.insert("QELVAR_TEST_STORE", QString::fromStdString((folder_.path() / "store").string()));
+    other.setProcessEnvironment(environment);
+    other.start(QCoreApplication::applicationFilePath(), {"--gtest_filter=AnotherProcess.*"});
+    ASSERT_TRUE(test::waitUntil([&other] { return other.state() == QProcess::NotRunning; }));
+    ASSERT_EQ(other.exitCode(), 0) << other.readAllStandardOutput().toStdString();
     EXPECT_TRUE(test::waitUntil([this] {
         const auto cards = QVCardsInScene(window_->rootObject());
         return !cards.isEmpty() && cards[0]->valueText().startsWith("77") && cards[0]->wasPaintedSettled();
@@ -164,14 +193,22 @@ TEST_F(WindowTest, AnEmptyDashboardOffersToImport) {
         reached << focused();
     }
     EXPECT_TRUE(reached.contains(app_->dashboard()->importTitle())) << reached.join("|").toStdString();
+    // The dialog's module is there, and it opens.
+    emit app_->dashboard()->importRequested();
+    const auto* dialog = window_->rootObject()->findChild<QObject*>("importFileDialog");
+    ASSERT_TRUE(dialog);
+    EXPECT_TRUE(dialog->property("visible").toBool());
+    EXPECT_EQ(dialog->property("title").toString(), "Import Records");
 }
 
 TEST_F(WindowTest, ADroppedDocumentIsImportedAndTheSheetIsClosedByKeyboard) {
     open({group(VSGroupID::HeartRate)});
     const auto path = folder_.path() / "records.xml";
-    std::ofstream(path) << "<?xml version=\"1.0\"?>\n<HealthData locale=\"en_US\"><Record type=\"VSQuantityTypeIdentifierHeartRate\" "
+    std::ofstream(path) << "<?xml version=\"1.0\"?>\n<HealthData locale=\"en_US\"><Record "
+                           "type=\"VSQuantityTypeIdentifierHeartRate\" "
                            "sourceName=\"Watch\" unit=\"count/min\" startDate=\"2020-03-31 10:00:00 +0200\" "
-                           "endDate=\"2020-03-31 10:00:00 +0200\" creationDate=\"2020-03-31 10:00:00 +0200\" value=\"66\"/></HealthData>";
+                           "endDate=\"2020-03-31 10:00:00 +0200\" creationDate=\"2020-03-31 10:00:00 +0200\" "
+                           "value=\"66\"/></HealthData>";
     QMimeData data;
     data.setUrls({QUrl::fromLocalFile(QString::fromStdString(path.string()))});
     QDragEnterEvent enter({100, 300}, Qt::CopyAction, &data, Qt::LeftButton, {});
@@ -179,12 +216,14 @@ TEST_F(WindowTest, ADroppedDocumentIsImportedAndTheSheetIsClosedByKeyboard) {
     QDropEvent drop({100, 300}, Qt::CopyAction, &data, Qt::LeftButton, {});
     QCoreApplication::sendEvent(window_.get(), &drop);
     QVImportController& controller = *app_->importController();
-    ASSERT_TRUE(test::waitUntil([&controller] { return controller.state() == QVImportController::State::Finished; }));
+    ASSERT_TRUE(
+        test::waitUntil([&controller] { return controller.state() == QVImportController::State::Finished; }));
     EXPECT_EQ(controller.rowValues().value(1), "1");
     EXPECT_TRUE(test::waitUntil([this] { return focused() == "Done"; })) << focused().toStdString();
     press(Qt::Key_Return);
     EXPECT_EQ(controller.state(), QVImportController::State::Idle);
-    EXPECT_TRUE(test::waitUntil([this] { return QVCardsInScene(window_->rootObject())[0]->valueText().startsWith("66"); }));
+    EXPECT_TRUE(test::waitUntil(
+        [this] { return QVCardsInScene(window_->rootObject())[0]->valueText().startsWith("66"); }));
 }
 
 TEST_F(WindowTest, RightToLeftMirrorsTheTabs) {
@@ -197,10 +236,12 @@ TEST_F(WindowTest, RightToLeftMirrorsTheTabs) {
 }
 
 TEST_F(WindowTest, PicturesAreTakenOfEveryTabAndScope) {
-    open({group(VSGroupID::Steps), group(VSGroupID::HeartRate), group(VSGroupID::FlightsClimbed), group(VSGroupID::ActiveEnergy)});
+    open({group(VSGroupID::Steps), group(VSGroupID::HeartRate), group(VSGroupID::FlightsClimbed),
+          group(VSGroupID::ActiveEnergy)});
     const auto folder = folder_.path() / "pictures";
     ASSERT_TRUE(QVScreenshots(*window_, *app_, folder).takeAll());
-    for (const char* name : {"dashboard-day", "dashboard-week", "dashboard-month", "dashboard-year", "display-type", "health-data", "sources", "medical-id"})
+    for (const char* name : {"dashboard-day", "dashboard-week", "dashboard-month", "dashboard-year",
+                             "display-type", "health-data", "sources", "medical-id"})
         EXPECT_TRUE(std::filesystem::exists(folder / (std::string(name) + ".png"))) << name;
     const QImage full(QString::fromStdString((folder / "dashboard-week-full.png").string()));
     EXPECT_EQ(full.width(), 375);

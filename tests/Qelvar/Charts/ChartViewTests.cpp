@@ -175,6 +175,36 @@ TEST_F(ChartView, NewImagesCrossFade) {
     EXPECT_EQ(colorAt(75, 50), QColor(0, 0, 200)) << "not animated: at once";
 }
 
+TEST_F(ChartView, AReloadWithoutAnimationEndsAFadeAtOnce) {
+    series->chart = QColor(200, 0, 0);
+    show();
+    // As when a card comes back into view: its item has images already.
+    chart.setAnimationStyle(QVChart::AnimationStyle::CrossFade);
+    const auto empty = makeRenderer();
+    chart.setChartRenderer(empty);
+    chart.reloadData(false);
+    EXPECT_EQ(colorAt(75, 50), QColor(Qt::black));
+    chart.setChartRenderer(renderer);
+    chart.reloadData(true);
+    EXPECT_EQ(colorAt(75, 50), QColor(Qt::black)) << "fading in";
+    chart.reloadData(false);
+    EXPECT_EQ(colorAt(75, 50), QColor(200, 0, 0));
+}
+
+TEST_F(ChartView, ImagesThatFadedOutUnseenAreDropped) {
+    chart.setAnimationStyle(QVChart::AnimationStyle::CrossFade);
+    show();
+    // No frames while the window is hidden: nobody calls advance().
+    const QImage first = renderer->chartImage();
+    for (int i = 0; i < 2; ++i) {
+        EXPECT_FALSE(first.isDetached());
+        now += ms(600);
+        chart.reloadData(true);
+        settle();
+    }
+    EXPECT_TRUE(first.isDetached()) << "nobody else holds it any more";
+}
+
 TEST_F(ChartView, TheSameImagesDoNotFadeAndStyleNoneSwaps) {
     series->chart = QColor(200, 0, 0);
     chart.setAnimationStyle(QVChart::AnimationStyle::CrossFade);

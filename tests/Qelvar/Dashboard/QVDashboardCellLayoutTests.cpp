@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 
-
 namespace {
 
 /// A card of a phone's width, with texts of the given widths at full size.
@@ -28,7 +27,8 @@ TEST(DashboardCellLayout, PartsStandWhereTheyBelong) {
     EXPECT_EQ(layout.firstBaseline, 4 + 22);
     EXPECT_EQ(layout.secondBaseline, 4 + 36.5) << "a pixel more than 36";
     EXPECT_EQ(layout.value, QRectF(4 + 367 - 11 - 90, 4 + 4, 90, 23));
-    EXPECT_EQ(layout.title, QRectF(4 + 12, 4 + 4, 367 - 11 - 90 - 8 - 12, 23)) << "up to 8 points before the value";
+    EXPECT_EQ(layout.title, QRectF(4 + 12, 4 + 4, 367 - 11 - 90 - 8 - 12, 23))
+        << "up to 8 points before the value";
     EXPECT_EQ(layout.average.topLeft(), QPointF(16, 4 + 26.5));
     EXPECT_EQ(layout.average.width(), 100);
     EXPECT_EQ(layout.lastUpdated.right(), 4 + 367 - 11);
@@ -116,10 +116,14 @@ TEST(DashboardCellLayout, FramesLieOnThePixelGrid) {
     auto odd = content(60.3, 90.7);
     odd.screenScale = 3;
     odd.firstLineAscent = 17.67;
-    const auto layout = QVDashboardCellLayout::make(odd);
-    for (const QRectF& frame : {layout.title, layout.value, layout.average, layout.lastUpdated})
-        for (const double value : {frame.x(), frame.y(), frame.width(), frame.height()})
-            EXPECT_NEAR(value * 3, qRound(value * 3), 1e-6);
+    odd.width = 360.2;
+    for (const bool rightToLeft : {false, true}) {
+        odd.rightToLeft = rightToLeft;
+        const auto layout = QVDashboardCellLayout::make(odd);
+        for (const QRectF& frame : {layout.title, layout.value, layout.average, layout.lastUpdated})
+            for (const double value : {frame.x(), frame.y(), frame.width(), frame.height()})
+                EXPECT_NEAR(value * 3, qRound(value * 3), 1e-6) << rightToLeft;
+    }
 }
 
 }  // namespace

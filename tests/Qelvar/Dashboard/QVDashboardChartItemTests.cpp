@@ -4,6 +4,7 @@
 
 #include "Platform/Localization.h"
 #include "Platform/SystemEvents.h"
+#include "Qelvar/Charts/QVStackedValueSeries.h"
 #include "QtTestSupport.h"
 #include "TestSupport.h"
 #include "VessaUI/VSDataCategory.h"
@@ -158,6 +159,24 @@ TEST_F(ChartItemTest, InvalidationLoadsTheCurrentValueAgain) {
     item->deactivate();
     EXPECT_FALSE(item->isActive());
     EXPECT_TRUE(item->dataProvider()->isActive()) << "the provider keeps running";
+}
+
+TEST_F(ChartItemTest, LabelsInTheChartFollowTheLanguage) {
+    auto item = makeItem(VSGroupID::StandHours);
+    item->updateDateRange(dateCache, QVTimeScope::Day);
+    const auto labels = [&] {
+        const auto* stacked =
+            dynamic_cast<const QVStackedValueSeries*>(item->dataProvider()->chartSeriesForIndex(0).get());
+        return stacked ? stacked->valueLabels() : std::map<int, QString>();
+    };
+    const auto english = labels();
+    ASSERT_FALSE(english.empty());
+    environment->setLocale("de_DE");
+    platform::loadTranslations();
+    item->setLocaleDidChange(true);
+    EXPECT_NE(labels(), english);
+    environment->setLocale("en_US");
+    platform::loadTranslations();
 }
 
 TEST_F(ChartItemTest, EqualityAndBackgroundFlags) {

@@ -19,16 +19,25 @@ namespace {
 using test::date;
 using Groups = QVDashboardViewController::Groups;
 
-const VSDataUnitGroup* group(int id) { return VSDataUnitGroupController::shared().dataUnitGroupWithID(id); }
-const VSDataUnitGroup* steps() { return group(VSGroupID::Steps); }
-const VSDataUnitGroup* heartRate() { return group(VSGroupID::HeartRate); }
-const VSDataUnitGroup* distance() { return group(VSGroupID::WalkingRunningDistance); }
+const VSDataUnitGroup* group(int id) {
+    return VSDataUnitGroupController::shared().dataUnitGroupWithID(id);
+}
+const VSDataUnitGroup* steps() {
+    return group(VSGroupID::Steps);
+}
+const VSDataUnitGroup* heartRate() {
+    return group(VSGroupID::HeartRate);
+}
+const VSDataUnitGroup* distance() {
+    return group(VSGroupID::WalkingRunningDistance);
+}
 
 class DashboardTest : public testing::Test {
-   protected:
+ protected:
     DashboardTest() {
         platform::loadTranslations();
-        platform::UserDefaults::setStandard(std::make_unique<platform::UserDefaults>(folder_.path() / "defaults.json"));
+        platform::UserDefaults::setStandard(
+            std::make_unique<platform::UserDefaults>(folder_.path() / "defaults.json"));
         store_ = *VSHealthStore::open(folder_.path() / "store");
         QVUserDefaults::sharedDefaults().setHealthStore(store_);
         manager_ = std::make_shared<QVControllerManager>(store_);
@@ -50,7 +59,8 @@ class DashboardTest : public testing::Test {
     }
 
     /// A card for a row of the screen, without a window.
-    std::unique_ptr<QVDashboardTableViewCell> card(QVDashboardViewController& screen, int row, double width = 375) {
+    std::unique_ptr<QVDashboardTableViewCell> card(QVDashboardViewController& screen, int row,
+                                                   double width = 375) {
         auto cell = std::make_unique<QVDashboardTableViewCell>();
         cell->setSize({width, QVDashboardTableViewCell::preferredCellHeight()});
         screen.prepareCell(*cell, row);
@@ -59,24 +69,25 @@ class DashboardTest : public testing::Test {
 
     void save(VSTypeCode code, double value, const char* unit, const std::string& start) {
         const auto* type = VSObjectType::dataTypeWithCode(code);
-        const auto sample = std::make_shared<const VSQuantitySample>(type, VSQuantity(VSUnit::fromString(unit), value), date(start), date(start));
+        const auto sample = std::make_shared<const VSQuantitySample>(
+            type, VSQuantity(VSUnit::fromString(unit), value), date(start), date(start));
         const auto saved = store_->saveObjectsAndWait({sample});
         ASSERT_TRUE(saved.ok()) << saved.error().message;
     }
 
     /// Draws the card until its data is there and its chart stands still.
-    static bool settle(QVDashboardTableViewCell& cell) {
-        QVAnimationTime time{1};
-        cell.chartView().setAnimationClock([&time] { return time; });
+    bool settle(QVDashboardTableViewCell& cell) {
+        cell.chartView().setAnimationClock([this] { return animationTime_; });
         return test::waitUntil([&] {
             cell.render(1);
-            time += std::chrono::seconds(1);
-            cell.chartView().advance(time);
+            animationTime_ += std::chrono::seconds(1);
+            cell.chartView().advance(animationTime_);
             return cell.isSettled();
         });
     }
 
     test::FixedEnvironment environment_{"2020-03-31T20:00"};
+    QVAnimationTime animationTime_{1};
     test::TemporaryFolder folder_;
     std::shared_ptr<VSHealthStore> store_;
     std::shared_ptr<QVControllerManager> manager_;
@@ -86,8 +97,10 @@ class DashboardTest : public testing::Test {
 TEST(DashboardTable, ANewListIsReachedByTheFewestChanges) {
     QVDashboardTable table;
     QAbstractItemModelTester tester(&table, QAbstractItemModelTester::FailureReportingMode::Fatal);
-    QSignalSpy reset(&table, &QAbstractItemModel::modelReset), removed(&table, &QAbstractItemModel::rowsRemoved);
-    QSignalSpy inserted(&table, &QAbstractItemModel::rowsInserted), moved(&table, &QAbstractItemModel::rowsMoved);
+    QSignalSpy reset(&table, &QAbstractItemModel::modelReset),
+        removed(&table, &QAbstractItemModel::rowsRemoved);
+    QSignalSpy inserted(&table, &QAbstractItemModel::rowsInserted),
+        moved(&table, &QAbstractItemModel::rowsMoved);
     table.setGroups({steps(), heartRate(), distance()});
     EXPECT_EQ(inserted.size(), 3);
     table.setGroups({steps(), heartRate(), distance()});
@@ -97,7 +110,8 @@ TEST(DashboardTable, ANewListIsReachedByTheFewestChanges) {
     table.setGroups({distance(), heartRate()});
     EXPECT_EQ(removed.size(), 1);
     table.setGroups({heartRate(), group(VSGroupID::FlightsClimbed), distance(), heartRate()});
-    EXPECT_EQ(table.groups(), (Groups{heartRate(), group(VSGroupID::FlightsClimbed), distance()})) << "one given twice counts once";
+    EXPECT_EQ(table.groups(), (Groups{heartRate(), group(VSGroupID::FlightsClimbed), distance()}))
+        << "one given twice counts once";
     EXPECT_EQ(table.data(table.index(0), QVDashboardTable::DisplayNameRole), heartRate()->displayName());
     table.setGroups({});
     EXPECT_EQ(table.rowCount(), 0);
@@ -126,13 +140,15 @@ TEST_F(DashboardTest, ItemsThatStayKeepTheirDataAndOthersGo) {
     auto* screen = show();
     ASSERT_EQ(screen->dashboardChartItems().size(), 2u);
     const auto stepsItem = screen->dashboardChartItems().at(VSGroupID::Steps);
-    std::weak_ptr<QVDashboardChartItem> heartRateItem = screen->dashboardChartItems().at(VSGroupID::HeartRate);
+    std::weak_ptr<QVDashboardChartItem> heartRateItem =
+        screen->dashboardChartItems().at(VSGroupID::HeartRate);
     setDashboard({distance(), steps()});
     EXPECT_EQ(screen->dashboardChartItems().at(VSGroupID::Steps), stepsItem);
     EXPECT_TRUE(heartRateItem.expired());
     EXPECT_EQ(screen->dashboardDataUnitGroups(), (Groups{distance(), steps()}));
     setDashboard({distance(), steps(), heartRate()});
-    EXPECT_FALSE(screen->dashboardChartItems().at(VSGroupID::HeartRate)->isActive()) << "a fresh one, not asked for yet";
+    EXPECT_FALSE(screen->dashboardChartItems().at(VSGroupID::HeartRate)->isActive())
+        << "a fresh one, not asked for yet";
 }
 
 TEST_F(DashboardTest, ChangesMadeWhileAwayArePickedUpOnReturn) {
@@ -145,6 +161,15 @@ TEST_F(DashboardTest, ChangesMadeWhileAwayArePickedUpOnReturn) {
     EXPECT_FALSE(screen->emptyStateTitle().isEmpty());
     setDashboard({steps()});
     EXPECT_FALSE(screen->showsEmptyState());
+}
+
+TEST_F(DashboardTest, AListThatHasNotBeenReadYetIsNotAnEmptyOne) {
+    setDashboard({});
+    manager_ = std::make_shared<QVControllerManager>(store_);
+    auto* screen = show();
+    ASSERT_FALSE(dashboard().hasLoadedDashboard());
+    EXPECT_FALSE(screen->showsEmptyState());
+    EXPECT_TRUE(test::waitUntil([screen] { return screen->showsEmptyState(); }));
 }
 
 TEST_F(DashboardTest, EmptyStateMarginsFollowTheScreensWidth) {
@@ -187,8 +212,10 @@ TEST_F(DashboardTest, ACardShowsWhatTheStoreHolds) {
     EXPECT_EQ(cell->titleText(), heartRate()->displayName());
     EXPECT_TRUE(cell->valueText().startsWith("72")) << cell->valueText().toStdString();
     EXPECT_TRUE(cell->lastUpdatedText().contains("8:30")) << cell->lastUpdatedText().toStdString();
-    EXPECT_TRUE(cell->secondaryText().contains("64") && cell->secondaryText().contains("72")) << cell->secondaryText().toStdString();
-    EXPECT_TRUE(cell->accessibleValue().contains(cell->valueText()) && cell->accessibleValue().contains(cell->lastUpdatedText()));
+    EXPECT_TRUE(cell->secondaryText().contains("64") && cell->secondaryText().contains("72"))
+        << cell->secondaryText().toStdString();
+    EXPECT_TRUE(cell->accessibleValue().contains(cell->valueText()) &&
+                cell->accessibleValue().contains(cell->lastUpdatedText()));
 
     auto empty = card(*screen, 0);
     ASSERT_TRUE(settle(*empty));
@@ -241,8 +268,10 @@ TEST_F(DashboardTest, ANewOrderOfSourcesReloadsTheCardsOfThatType) {
     auto cell = card(*screen, 0);
     ASSERT_TRUE(settle(*cell));
     QSignalSpy reloaded(screen, &QVDashboardViewController::tableReloaded);
-    manager_->dataProviderOrderController().setOrderedDataProviderSources({}, VSObjectType::dataTypeWithCode(VSCode::BodyMass));
-    manager_->dataProviderOrderController().setOrderedDataProviderSources({}, VSObjectType::dataTypeWithCode(VSCode::StepCount));
+    manager_->dataProviderOrderController().setOrderedDataProviderSources(
+        {}, VSObjectType::dataTypeWithCode(VSCode::BodyMass));
+    manager_->dataProviderOrderController().setOrderedDataProviderSources(
+        {}, VSObjectType::dataTypeWithCode(VSCode::StepCount));
     EXPECT_TRUE(test::waitUntil([&] { return reloaded.size() == 1; }));
     EXPECT_TRUE(settle(*cell));
 }
@@ -291,14 +320,15 @@ TEST_F(DashboardTest, TheCardIsMirroredForRightToLeftLanguages) {
 
 TEST_F(DashboardTest, ATapOpensTheScreenOfTheDisplayType) {
     class Detail : public platform::Screen {
-       public:
+     public:
         QUrl view() const override { return {}; }
     };
     const VSDataUnitGroup* opened = nullptr;
-    auto screen = std::make_unique<QVDashboardViewController>(manager_, [&opened](const VSDataUnitGroup* chosen) {
-        opened = chosen;
-        return std::make_unique<Detail>();
-    });
+    auto screen =
+        std::make_unique<QVDashboardViewController>(manager_, [&opened](const VSDataUnitGroup* chosen) {
+            opened = chosen;
+            return std::make_unique<Detail>();
+        });
     auto* raw = screen.get();
     stack_ = std::make_unique<platform::NavigationStack>("stack", std::move(screen));
     stack_->setVisible(true);

@@ -143,6 +143,16 @@ TEST_F(SelectionTest, AChangeBeforeTheListIsLoadedLosesNothing) {
     EXPECT_EQ(ids(controller->dataUnitGroupsForDashboard()), (IDs{6, 59}));
 }
 
+TEST_F(SelectionTest, ASelectionThatCannotBeReadIsNotReplaced) {
+    storeIDs(selectionKey, {13, 6});
+    userDefaults.setHealthStore(nullptr);
+    auto controller = makeController();
+    ASSERT_TRUE(waitUntil([&] { return !controller->selectedDataUnitGroupsArray().empty(); }));
+    EXPECT_EQ(ids(controller->selectedDataUnitGroupsArray()), (IDs{59, 7, 10}));
+    userDefaults.setHealthStore(store);
+    EXPECT_EQ(stored(selectionKey), (IDs{13, 6}));
+}
+
 TEST_F(SelectionTest, APairedWatchAddsItsDisplayTypesOnce) {
     platform::PairedDevices::shared().setActivePairedDevice(true);
     {
