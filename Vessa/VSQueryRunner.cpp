@@ -83,11 +83,13 @@ void VSQueryRunner::typesChanged(const std::vector<VSChangeNotifier::Change>& ch
 }
 
 void VSQueryRunner::run(const RunningPtr& running) {
+    int64_t heard = 0;  // what it knew of when it began
     {
         std::lock_guard lock(mutex_);
         running->queued = false;
         if (running->stopped) return;
         running->busy = true;
+        heard = running->told;
     }
     const Delivery deliver = answer(*running);
     {
@@ -108,7 +110,9 @@ void VSQueryRunner::run(const RunningPtr& running) {
             ended = std::move(found->second);
             running_.erase(found);
         }
-    } else if (running->told > running->answered) {
+    } else if (running->told > std::max(running->answered, heard)) {
+        // After a failed read only a newer change brings it back: an error that lasts must not go round and
+        // round.
         schedule(running);
     }
 }

@@ -15,6 +15,15 @@ bool sameTotal(const std::optional<VSQuantity>& total, const VSUnit& unit, const
     return !row.isNull(column) && VSSameStoredValue(inUnit(*total, unit), row.real(column));
 }
 
+/// Whether a row was created when the sample says. Documents give whole seconds and cut off the rest.
+bool sameCreation(const VSSampleRow& row, VSDate sought) {
+    constexpr int64_t kSecond = 1'000'000;
+    const int64_t created = row.start + row.created, wanted = sought.microseconds();
+    if (created == wanted) return true;
+    const int64_t rest = (created % kSecond + kSecond) % kSecond;
+    return created - rest == wanted;
+}
+
 }  // namespace
 
 double VSStoredValue(const VSSample& sample) {
@@ -53,15 +62,12 @@ bool VSStoreMatcher::sameRow(const VSSample& sample, int64_t metadata, const VSS
     if (row.duration != (sample.endDate() - sample.startDate()).count() || row.metadata != metadata)
         return false;
     if (!VSSameStoredValue(row.value, VSStoredValue(sample))) return false;
-    if (sample.creationDate() && row.start + row.created != sample.creationDate()->microseconds())
-        return false;
+    if (sample.creationDate() && !sameCreation(row, *sample.creationDate())) return false;
     const auto& entry = provenances_.provenance(row.provenance);
     const VSProvenance& sought = sample.provenance();
     if (entry.revision != sought.sourceRevision && *entry.revision != sample.sourceRevision()) return false;
-    if (!entry.device != !sought.device ||
-        (entry.device && entry.device != sought.device && *entry.device != *sought.device))
-        return false;
-    return !sought.timeZoneOffset || !entry.timeZoneOffset || *sought.timeZoneOffset == *entry.timeZoneOffset;
+    return !entry.device == !sought.device &&
+           (!entry.device || entry.device == sought.device || *entry.device == *sought.device);
 }
 
 bool VSStoreMatcher::sameWorkout(const VSWorkout& workout, int64_t id) {

@@ -19,8 +19,10 @@ struct VSMemberKey {
 };
 
 /// Finds rows that say the same as a sample: type, span, value, source with version, device, metadata and
-/// content (workout totals and events; members). Creation date and time-zone offset count where the sample
-/// has them.
+/// content (workout totals and events; members). The creation date counts, to the second that documents give,
+/// where the sample has one. The time-zone offset does not: a document writes all its dates with the offset
+/// of the day on which it was made, so that one made in summer says the same of a record as one made in
+/// winter.
 class VSStoreMatcher {
  public:
     VSStoreMatcher(VSDatabase& database, VSStoreProvenances& provenances, VSStoreMetadata& metadata)

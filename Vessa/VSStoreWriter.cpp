@@ -79,6 +79,7 @@ void VSStoreWriter::begin() {
         provenances_.forgetNumbers();
         metadata_.forgetNumbers();
     }
+    inserted_.clear();
     last_ = database_.integer("SELECT last FROM state");
     types_.fill({});
     auto rows = database_.use("SELECT type, longest FROM types");
@@ -154,16 +155,23 @@ int64_t VSStoreWriter::insertAlone(const VSSample& sample, VSDate now) {
     return id;
 }
 
+int64_t VSStoreWriter::insertOnce(const VSSample& sample, VSDate now) {
+    int64_t& id = inserted_[&sample];
+    if (!id) id = insertAlone(sample, now);
+    return id;
+}
+
 int64_t VSStoreWriter::insert(const VSSample& sample, VSDate now) {
     const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample);
-    if (!correlation) return insertAlone(sample, now);
+    if (!correlation) return insertOnce(sample, now);
+    if (const auto known = inserted_.find(&sample); known != inserted_.end()) return known->second;
     std::vector<VSMemberKey> members;
     for (const VSSamplePtr& object : correlation->objects()) {
         int64_t id = VSObjectIDValue(object->dataID()) ? find(*object) : 0;
-        if (!id) id = insertAlone(*object, now);
+        if (!id) id = insertOnce(*object, now);
         members.push_back({object->sampleType(), object->startDate().microseconds(), id});
     }
-    const int64_t id = insertAlone(sample, now);
+    const int64_t id = insertOnce(sample, now);
     for (size_t index = 0; index < members.size(); ++index)
         insertMember(id, static_cast<int>(index), members[index]);
     return id;

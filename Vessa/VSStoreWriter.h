@@ -5,6 +5,7 @@
 #include <optional>
 #include <set>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 #include "Vessa/VSObject.h"
@@ -28,8 +29,9 @@ class VSStoreWriter {
 
     /// Why a sample cannot be saved; none: it can.
     static std::optional<VSError> objection(const VSSample& sample);
-    /// Saves a sample without objection; a correlation with those members that are not in the store yet.
-    /// Returns its number.
+    /// Saves a sample without objection; a correlation with those members that are not in the store yet. An
+    /// object given twice within a transaction, alone and as a member, is saved once. Returns its number.
+    /// REQUIRES: the sample lives until the transaction ends.
     int64_t insert(const VSSample& sample, VSDate now);
     /// A sample of any kind without its members.
     int64_t insertAlone(const VSSample& sample, VSDate now);
@@ -62,6 +64,7 @@ class VSStoreWriter {
         bool removed = false;
     };
 
+    int64_t insertOnce(const VSSample& sample, VSDate now);
     SourceChange& sourceChange(int type, int64_t source);
     void insertWorkout(int64_t id, const VSWorkout& workout);
     void removeDetails(int64_t id);
@@ -77,6 +80,7 @@ class VSStoreWriter {
     VSStatement insert_;
 
     int64_t last_ = 0;
+    std::unordered_map<const VSSample*, int64_t> inserted_;  // the objects of this transaction
     std::array<TypeState, typeCodes> types_{};
     std::map<std::pair<int, int64_t>, SourceChange> sourceChanges_;
     std::pair<int, int64_t> recentKey_{-1, -1};

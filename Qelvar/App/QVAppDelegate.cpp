@@ -30,6 +30,7 @@ std::unique_ptr<platform::NavigationStack> placeholderStack(
     auto screen = std::make_unique<QVPlaceholderViewController>(
         [titleKey] { return platform::localized(titleKey); }, QString::fromLatin1(icon), messageKey,
         std::move(actions));
+    screen->setIconIsGlyph(true);
     screen->setUserActivity(QVUserActivityManager::activity(screen->title(), {}, tab));
     return std::make_unique<platform::NavigationStack>(QString::fromLatin1(stackIdentifier),
                                                        std::move(screen));
@@ -83,18 +84,18 @@ std::unique_ptr<platform::NavigationStack> QVAppDelegate::dashboardStack() {
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::healthDataStack() {
-    return placeholderStack("Health Data Navigation Controller", "HEALTH_DATA", "healthdata_selected/#8a8a8f",
+    return placeholderStack("Health Data Navigation Controller", "HEALTH_DATA", "healthdata_selected",
                             "HEALTH_DATA_PENDING", QVUserActivityTab::HealthData,
                             {{"IMPORT_ACTION", [this] { emit importRequested(); }}});
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::sourcesStack() {
-    return placeholderStack("Sources Navigation Controller", "SOURCES", "sources_selected/#8a8a8f",
+    return placeholderStack("Sources Navigation Controller", "SOURCES", "sources_selected",
                             "SOURCES_PENDING", QVUserActivityTab::Sources);
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::medicalIDStack() {
-    return placeholderStack("Medical ID Navigation Controller", "MEDICAL_ID", "medical_ID_selected/#8a8a8f",
+    return placeholderStack("Medical ID Navigation Controller", "MEDICAL_ID", "medical_ID_selected",
                             "MEDICAL_ID_PENDING", QVUserActivityTab::MedicalID);
 }
 

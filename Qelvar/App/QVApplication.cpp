@@ -35,15 +35,23 @@ void chooseGraphics(const QVApplicationOptions& options) {
 
 VSResult<std::shared_ptr<VSHealthStore>> openStore(const std::filesystem::path& folder, bool demo) {
     std::error_code error;
-    std::filesystem::create_directories(folder.parent_path(), error);
-    if (error)
-        return VSError{VSErrorCode::NotAccessible, folder.parent_path().string() + ": " + error.message()};
+    const std::filesystem::path parent = std::filesystem::absolute(folder).parent_path();
+    std::filesystem::create_directories(parent, error);
+    if (error) return VSError{VSErrorCode::NotAccessible, parent.string() + ": " + error.message()};
     auto store = VSHealthStore::open(folder);
     if (!store) return store;
     platform::UserDefaults::setStandard(
         std::make_unique<platform::UserDefaults>(folder / "user-defaults.json"));
     auto& defaults = platform::UserDefaults::standard();
-    if (demo && !defaults.boolean("UseDemoData")) defaults.setValue("UseDemoData", true);
+    if (demo && !defaults.boolean("UseDemoData")) {
+        // The demonstration replaces all records, so it never begins where a person's may be.
+        const auto types = (*store)->typeSummaries();
+        if (!types) return types.error();
+        if (!types->empty())
+            return VSError{VSErrorCode::Refused,
+                           "it holds records, which the demonstration would replace; name another folder"};
+        defaults.setValue("UseDemoData", true);
+    }
     QVUserDefaults::sharedDefaults().setHealthStore(*store);
     return store;
 }

@@ -10,6 +10,7 @@
 class QVPlaceholderViewController : public platform::Screen {
     Q_OBJECT
     Q_PROPERTY(QString icon READ icon CONSTANT)
+    Q_PROPERTY(bool iconIsGlyph READ iconIsGlyph CONSTANT)
     Q_PROPERTY(QString message READ message NOTIFY textsChanged)
     Q_PROPERTY(QStringList actionTitles READ actionTitles NOTIFY textsChanged)
  public:
@@ -17,13 +18,16 @@ class QVPlaceholderViewController : public platform::Screen {
         const char* titleKey;
         std::function<void()> run;
     };
-    /// The icon is the name of one (platform::icon), with "/" and a colour to tint it, or empty; `title`
+    /// The icon is the name of one (platform::icon), or empty; `title`
     /// gives the title in the user's language.
     QVPlaceholderViewController(std::function<QString()> title, QString icon, const char* messageKey,
                                 std::vector<Action> actions = {});
 
     QUrl view() const override;
     QString icon() const { return icon_; }
+    /// A glyph is shown in grey, other icons in their own colours. Set before the screen is shown.
+    bool iconIsGlyph() const { return iconIsGlyph_; }
+    void setIconIsGlyph(bool isGlyph) { iconIsGlyph_ = isGlyph; }
     QString message() const;
     QStringList actionTitles() const;
     Q_INVOKABLE void runAction(int index);
@@ -33,6 +37,7 @@ class QVPlaceholderViewController : public platform::Screen {
 
  private:
     const QString icon_;
+    bool iconIsGlyph_ = false;
     const char* const messageKey_;
     const std::vector<Action> actions_;
 };

@@ -1,5 +1,6 @@
 import QtQuick
 import QtQuick.Templates as T
+import Qelvar.Items
 
 FocusScope {
     id: root
@@ -52,13 +53,13 @@ FocusScope {
                     }
                 }
             }
-            Image {
+            Icon {
                 anchors.horizontalCenter: parent.horizontalCenter
-                visible: root.screen.icon.length > 0 && status === Image.Ready
+                visible: name.length > 0
                 width: 48
                 height: 48
-                sourceSize: Qt.size(width * Screen.devicePixelRatio, height * Screen.devicePixelRatio)
-                source: root.screen.icon.length > 0 ? "image://icon/" + root.screen.icon : ""
+                name: root.screen.icon
+                tint: root.screen.iconIsGlyph ? SystemStyle.inactive : "transparent"
             }
             Text {
                 width: Math.min(parent.width - 48, 480)

@@ -84,14 +84,13 @@ FocusScope {
                     Accessible.selectable: true
                     Accessible.selected: selected
                     contentItem: Item {
-                        Image {
+                        Icon {
                             anchors.horizontalCenter: parent.horizontalCenter
                             y: 5
                             width: 26
                             height: 26
-                            sourceSize: Qt.size(width * Screen.devicePixelRatio, height * Screen.devicePixelRatio)
-                            source: "image://icon/" + (tab.selected ? tab.selectedImage + "/" + SystemStyle.tint
-                                                                    : tab.image + "/" + SystemStyle.inactive)
+                            name: tab.selected ? tab.selectedImage : tab.image
+                            tint: tab.selected ? SystemStyle.tint : SystemStyle.inactive
                         }
                         Text {
                             anchors.horizontalCenter: parent.horizontalCenter

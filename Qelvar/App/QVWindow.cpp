@@ -5,7 +5,7 @@
 #include <QQuickItem>
 #include <mutex>
 
-#include "Qelvar/App/QVIconProvider.h"
+#include "Platform/IconItem.h"
 #include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
 
 namespace {
@@ -17,6 +17,7 @@ constexpr QSize kSmallestSize(320, 320);
 void registerTypes() {
     static std::once_flag once;
     std::call_once(once, [] {
+        qmlRegisterType<platform::IconItem>("Qelvar.Items", 1, 0, "Icon");
         qmlRegisterType<QVDashboardTableViewCell>("Qelvar.Items", 1, 0, "QVDashboardTableViewCell");
         qmlRegisterUncreatableType<QVImportController>("Qelvar.Items", 1, 0, "QVImportController",
                                                        QStringLiteral("made by the application"));
@@ -27,7 +28,6 @@ void registerTypes() {
 
 QVWindow::QVWindow(QVAppDelegate& app, QSize size) {
     registerTypes();
-    engine()->addImageProvider(QStringLiteral("icon"), new QVIconProvider);
     setTitle(QStringLiteral("Qelvar"));
     setIcon(QGuiApplication::windowIcon());
     setColor(Qt::white);

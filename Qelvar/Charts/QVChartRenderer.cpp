@@ -1,6 +1,7 @@
 #include "Qelvar/Charts/QVChartRenderer.h"
 
 #include <QUuid>
+#include <algorithm>
 #include <cmath>
 #include <utility>
 
@@ -151,22 +152,22 @@ void QVChartRenderer::start(std::shared_ptr<Operation> operation) {
 }
 
 void QVChartRenderer::finish(const Operation& operation, const std::optional<Images>& images) {
-    const bool current = operation.number > newestStored_ && operation.number > newestDropped_;
-    std::vector<Completion> completions;
+    const bool current = operation.number > newestFinished_ && operation.number > newestDropped_;
     if (images && current) {
-        newestStored_ = operation.number;
         chartImage_ = images->chart;
         chartFillImage_ = images->fill;
         chartSecondaryFillImage_ = images->secondaryFill;
         finishedLoadingData_ = operation.finishedLoading;
         dataState_ =
             operation.hasAverage ? QVChartDataState::RenderedWithData : QVChartDataState::RenderedWithoutData;
-        completions = std::exchange(overtaken_, {});
-    } else if (newestStored_ < operation.number && operation.number < newestOperation_->load()) {
+    } else if (newestFinished_ < operation.number && operation.number < newestOperation_->load()) {
         // A later drawing is on its way: this one is done when that is.
         overtaken_.push_back(operation.completion);
         return;
     }
+    newestFinished_ = std::max(newestFinished_, operation.number);
+    std::vector<Completion> completions;
+    if (operation.number == newestOperation_->load()) completions = std::exchange(overtaken_, {});
     completions.push_back(operation.completion);
     const Images shown{chartImage_, chartFillImage_, chartSecondaryFillImage_};
     const bool finishedLoading = finishedLoadingData_;

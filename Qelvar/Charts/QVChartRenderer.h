@@ -99,7 +99,7 @@ class QVChartRenderer final : public QVChartDataGroupDataSource,
 
     /// The number of the newest drawing asked for; read by drawings to see whether they are overtaken.
     std::shared_ptr<std::atomic<uint64_t>> newestOperation_ = std::make_shared<std::atomic<uint64_t>>(0);
-    uint64_t newestStored_ = 0;
+    uint64_t newestFinished_ = 0;
     /// Drawings up to this one show a range that is no longer wanted.
     uint64_t newestDropped_ = 0;
     std::vector<Completion> overtaken_;

@@ -2,7 +2,7 @@
 
 #include <QFontMetricsF>
 #include <QQuickWindow>
-#include <QSGSimpleTextureNode>
+#include <QSGImageNode>
 #include <chrono>
 #include <cmath>
 
@@ -121,7 +121,7 @@ QVDashboardTableViewCell::QVDashboardTableViewCell(QQuickItem* parent)
 
 QVDashboardTableViewCell::~QVDashboardTableViewCell() {
     chart_.onNeedsRepaint = nullptr;
-    if (dateCache_) dateCache_->removeObserver(observer_.get());
+    if (const auto dateCache = dateCache_.lock()) dateCache->removeObserver(observer_.get());
 }
 
 void QVDashboardTableViewCell::setScreen(QVDashboardViewController* screen) {
@@ -153,11 +153,12 @@ void QVDashboardTableViewCell::prepare() {
     if (complete_ && screen_ && row_ >= 0) screen_->prepareCell(*this, row_);
 }
 
-void QVDashboardTableViewCell::setDateCache(QVDateCache* dateCache) {
-    if (dateCache == dateCache_) return;
-    if (dateCache_) dateCache_->removeObserver(observer_.get());
+void QVDashboardTableViewCell::setDateCache(const std::shared_ptr<QVDateCache>& dateCache) {
+    const auto previous = dateCache_.lock();
+    if (dateCache == previous) return;
+    if (previous) previous->removeObserver(observer_.get());
     dateCache_ = dateCache;
-    if (dateCache_) dateCache_->addObserver(observer_);
+    if (dateCache) dateCache->addObserver(observer_);
 }
 
 void QVDashboardTableViewCell::setChartItem(std::shared_ptr<QVDashboardChartItem> item) {
@@ -184,7 +185,7 @@ void QVDashboardTableViewCell::setTimeScope(QVTimeScope timeScope) {
 void QVDashboardTableViewCell::rebuildTimeBasedContent() {
     const auto axis = axisDescriptor(*timeScope_);
     chart_.setXAxisDescriptor(axis);
-    if (dateCache_) chartItem_->updateDateRange(*dateCache_, *timeScope_);
+    if (const auto dateCache = dateCache_.lock()) chartItem_->updateDateRange(*dateCache, *timeScope_);
     chartBackground_->setHideAverageLine(chartItem_->shouldHideAverageLineForTimeScope(*timeScope_));
     chartBackground_->setHideMinMaxLabels(chartItem_->shouldHideMinMaxOnBackgroundForTimeScope(*timeScope_));
     if (axis) {
@@ -350,16 +351,17 @@ void QVDashboardTableViewCell::updatePolish() {
 }
 
 QSGNode* QVDashboardTableViewCell::updatePaintNode(QSGNode* node, UpdatePaintNodeData*) {
-    auto* texture = static_cast<QSGSimpleTextureNode*>(node);
-    if (image_.isNull() && !texture) return nullptr;
-    if (!texture) {
-        texture = new QSGSimpleTextureNode;
-        texture->setOwnsTexture(true);
+    auto* picture = static_cast<QSGImageNode*>(node);
+    if (image_.isNull() && !picture) return nullptr;
+    if (!picture) {
+        picture = window()->createImageNode();
+        picture->setOwnsTexture(true);
     }
     if (!image_.isNull()) {
-        texture->setTexture(window()->createTextureFromImage(image_, QQuickWindow::TextureIsOpaque));
+        picture->setTexture(window()->createTextureFromImage(image_, QQuickWindow::TextureIsOpaque));
+        picture->setSourceRect(QRectF({}, QSizeF(picture->texture()->textureSize())));
         image_ = {};
     }
-    texture->setRect(QRectF(0, 0, width(), height()));
-    return texture;
+    picture->setRect(QRectF(0, 0, width(), height()));
+    return picture;
 }

@@ -37,9 +37,9 @@ class QVDashboardTableViewCell : public QQuickItem {
     int row() const { return row_; }
     void setRow(int row);
 
-    /// Observes the cache from now on, in place of the one before. It outlives the cell; so does the unit
-    /// controller.
-    void setDateCache(QVDateCache* dateCache);
+    /// Observes the cache from now on, in place of the one before. Held weakly: a card that is destroyed late
+    /// may outlive it.
+    void setDateCache(const std::shared_ptr<QVDateCache>& dateCache);
     const std::shared_ptr<QVDashboardChartItem>& chartItem() const { return chartItem_; }
     void setChartItem(std::shared_ptr<QVDashboardChartItem> item);
     /// None until the first one was set.
@@ -103,7 +103,7 @@ class QVDashboardTableViewCell : public QQuickItem {
     QString title_, lastUpdated_;
 
     std::shared_ptr<QVDottedAverageBackgroundView> chartBackground_;
-    QVDateCache* dateCache_ = nullptr;
+    std::weak_ptr<QVDateCache> dateCache_;
     std::shared_ptr<QVDashboardChartItem> chartItem_;
     std::optional<QVTimeScope> timeScope_;
     QVChart chart_;

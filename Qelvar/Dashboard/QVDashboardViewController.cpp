@@ -121,7 +121,8 @@ void QVDashboardViewController::reloadTable() {
 void QVDashboardViewController::prepareCell(QVDashboardTableViewCell& cell, int row) {
     if (row < 0 || row >= static_cast<int>(table_->groups().size())) return;
     const auto& item = dashboardChartItems_.at(table_->groups()[static_cast<size_t>(row)]->dataUnitGroupID());
-    cell.setDateCache(&controllerManager_->dateCache());
+    // The cache is a member of the manager and lives as long.
+    cell.setDateCache(std::shared_ptr<QVDateCache>(controllerManager_, &controllerManager_->dateCache()));
     cell.setTimeScope(controllerManager_->selectedTimeScopeController().selectedTimeScope());
     cell.setChartItem(item);
     item->activate();

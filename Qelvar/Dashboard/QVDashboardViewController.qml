@@ -76,14 +76,13 @@ FocusScope {
         anchors.fill: table
         visible: root.screen.showsEmptyState
         readonly property real helpMargin: root.screen.emptyStateHelpMargin(width)
-        Image {
+        Icon {
             id: icon
             anchors.horizontalCenter: parent.horizontalCenter
             anchors.bottom: parent.verticalCenter
             width: 64
             height: 64
-            sourceSize: Qt.size(width * Screen.devicePixelRatio, height * Screen.devicePixelRatio)
-            source: "image://icon/dashboard_glyph_emptydashboard"
+            name: "dashboard_glyph_emptydashboard"
         }
         Text {
             id: emptyTitle

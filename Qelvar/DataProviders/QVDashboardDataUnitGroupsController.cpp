@@ -113,9 +113,10 @@ void QVDashboardDataUnitGroupsController::dashboardRead(const std::optional<std:
 
 void QVDashboardDataUnitGroupsController::loadSelection() {
     userDefaults_.valueForKey(selectionKey, [this, alive = std::weak_ptr<bool>(alive_)](const auto& answer) {
-        platform::mainQueue().async([this, alive, ids = storedIDs(answer, selectionKey), wasRead = answer.ok()] {
-            if (!alive.expired()) selectionRead(ids, wasRead);
-        });
+        platform::mainQueue().async(
+            [this, alive, ids = storedIDs(answer, selectionKey), wasRead = answer.ok()] {
+                if (!alive.expired()) selectionRead(ids, wasRead);
+            });
     });
 }
 

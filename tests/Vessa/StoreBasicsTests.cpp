@@ -236,3 +236,17 @@ TEST_F(StoreBasics, KeepsDefaultsCharacteristicsAndMedicalID) {
     EXPECT_EQ(**some.wait(), std::optional(data));
     expectSound(*store);
 }
+
+TEST_F(StoreBasics, AnObjectSavedAloneAndAsAMemberIsOne) {
+    const auto reading = bloodPressure(120, 80, "2020-03-01T08:00");
+    const auto& values = dynamic_cast<const VSCorrelation&>(*reading).objects();
+    EXPECT_OK(store->saveObjectsAndWait({values[0], values[1], reading, reading}));
+    EXPECT_EQ(allSamples(*store, type(VSCode::BloodPressure)).size(), 1u);
+    const auto systolic = allSamples(*store, type(VSCode::BloodPressureSystolic));
+    ASSERT_EQ(systolic.size(), 1u);
+    const auto saved = allSamples(*store, type(VSCode::BloodPressure)).at(0);
+    EXPECT_EQ(dynamic_cast<const VSCorrelation&>(*saved).objects().at(0)->dataID(), systolic[0]->dataID());
+    EXPECT_OK(store->saveObjectsAndWait({reading}));  // another save is another reading
+    EXPECT_EQ(allSamples(*store, type(VSCode::BloodPressureSystolic)).size(), 2u);
+    expectSound(*store);
+}

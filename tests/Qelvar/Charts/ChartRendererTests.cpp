@@ -233,6 +233,23 @@ TEST_F(ChartRenderer, ImagesOfADroppedRangeAreNotKept) {
     EXPECT_FALSE(render().chart.isNull());
 }
 
+TEST_F(ChartRenderer, ADrawingOvertakenByADroppedOneIsDoneToo) {
+    series->gate = std::make_shared<SolidSeries::Gate>();
+    Result first, second;
+    start(first);
+    start(second);
+    queue.runNext();
+    queue.runNext();
+    ASSERT_TRUE(series->gate->entered.wait());
+    renderer->dropCachedImages();
+    series->gate->mayGoOn.set(true);
+    queue.runNext();
+    queue.runNext();
+    EXPECT_EQ(first.calls, 1);
+    EXPECT_EQ(second.calls, 1);
+    EXPECT_TRUE(renderer->chartImage().isNull());
+}
+
 TEST_F(ChartRenderer, MayGoAwayWhileADrawingIsUnderWay) {
     series->gate = std::make_shared<SolidSeries::Gate>();
     Result result;

@@ -147,9 +147,11 @@ TEST_F(SelectionTest, ASelectionThatCannotBeReadIsNotReplaced) {
     storeIDs(selectionKey, {13, 6});
     userDefaults.setHealthStore(nullptr);
     auto controller = makeController();
+    // Behind the failed read of the dashboard and before the answer to that of the selection.
+    platform::mainQueue().async([this] { userDefaults.setHealthStore(store); });
     ASSERT_TRUE(waitUntil([&] { return !controller->selectedDataUnitGroupsArray().empty(); }));
     EXPECT_EQ(ids(controller->selectedDataUnitGroupsArray()), (IDs{59, 7, 10}));
-    userDefaults.setHealthStore(store);
+    storeIDs("behind the saves before", {});
     EXPECT_EQ(stored(selectionKey), (IDs{13, 6}));
 }
 
