@@ -16,12 +16,15 @@
 /// The place of an object in the store's one ever-growing order of insertions; 0 for one not yet saved.
 /// Kept on disk; never reused.
 enum class VSObjectID : int64_t {};
-constexpr int64_t VSObjectIDValue(VSObjectID id) { return static_cast<int64_t>(id); }
+constexpr int64_t VSObjectIDValue(VSObjectID id) {
+    return static_cast<int64_t>(id);
+}
 
 using VSMetadata = VSValue::Dictionary;
 inline constexpr const char* VSMetadataKeyWasUserEntered = "VSMetadataKeyWasUserEntered";
 inline constexpr const char* VSMetadataKeyMenstrualCycleStart = "VSMetadataKeyMenstrualCycleStart";
-inline constexpr const char* VSMetadataKeySexualActivityProtectionUsed = "VSMetadataKeySexualActivityProtectionUsed";
+inline constexpr const char* VSMetadataKeySexualActivityProtectionUsed =
+    "VSMetadataKeySexualActivityProtectionUsed";
 
 class VSSample;
 /// Samples are immutable once made and shared.
@@ -39,7 +42,7 @@ struct VSProvenance {
 
 /// A record with a type and a span of time: the base of the four kinds. startDate <= endDate.
 class VSSample {
-   public:
+ public:
     virtual ~VSSample() = default;
     VSObjectID dataID() const { return id_; }
     const VSObjectType* sampleType() const { return type_; }
@@ -53,10 +56,10 @@ class VSSample {
     std::optional<int> timeZoneOffset() const { return provenance_.timeZoneOffset; }
     const VSProvenance& provenance() const { return provenance_; }
 
-   protected:
+ protected:
     VSSample(const VSObjectType* type, VSDate start, VSDate end, VSProvenance provenance, VSObjectID id);
 
-   private:
+ private:
     const VSObjectType* type_;
     VSDate start_, end_;
     VSProvenance provenance_;
@@ -64,34 +67,35 @@ class VSSample {
 };
 
 class VSQuantitySample final : public VSSample {
-   public:
+ public:
     /// REQUIRES: a quantity type with a compatible unit, start <= end, a finite value.
     VSQuantitySample(const VSObjectType* type, VSQuantity quantity, VSDate start, VSDate end,
                      VSProvenance provenance = {}, VSObjectID id = {});
     const VSQuantity& quantity() const { return quantity_; }
 
-   private:
+ private:
     VSQuantity quantity_;
 };
 
 class VSCategorySample final : public VSSample {
-   public:
+ public:
     /// REQUIRES: a category type, start <= end.
-    VSCategorySample(const VSObjectType* type, int value, VSDate start, VSDate end, VSProvenance provenance = {}, VSObjectID id = {});
+    VSCategorySample(const VSObjectType* type, int value, VSDate start, VSDate end,
+                     VSProvenance provenance = {}, VSObjectID id = {});
     int value() const { return value_; }
 
-   private:
+ private:
     int value_;
 };
 
 /// Several samples that belong together, such as the two values of a blood pressure reading.
 class VSCorrelation final : public VSSample {
-   public:
+ public:
     VSCorrelation(const VSObjectType* type, VSDate start, VSDate end, std::vector<VSSamplePtr> objects,
                   VSProvenance provenance = {}, VSObjectID id = {});
     const std::vector<VSSamplePtr>& objects() const { return objects_; }
 
-   private:
+ private:
     std::vector<VSSamplePtr> objects_;
 };
 
@@ -102,17 +106,18 @@ struct VSWorkoutEvent {
 };
 
 class VSWorkout final : public VSSample {
-   public:
+ public:
     /// `duration` 0 means: the span less its pauses.
-    VSWorkout(int activityType, VSDate start, VSDate end, VSDuration duration, std::optional<VSQuantity> totalEnergyBurned,
-              std::optional<VSQuantity> totalDistance, std::vector<VSWorkoutEvent> events, VSProvenance provenance = {}, VSObjectID id = {});
+    VSWorkout(int activityType, VSDate start, VSDate end, VSDuration duration,
+              std::optional<VSQuantity> totalEnergyBurned, std::optional<VSQuantity> totalDistance,
+              std::vector<VSWorkoutEvent> events, VSProvenance provenance = {}, VSObjectID id = {});
     int workoutActivityType() const { return activity_; }
     VSDuration duration() const { return duration_; }
     const std::optional<VSQuantity>& totalEnergyBurned() const { return energy_; }
     const std::optional<VSQuantity>& totalDistance() const { return distance_; }
     const std::vector<VSWorkoutEvent>& workoutEvents() const { return events_; }
 
-   private:
+ private:
     int activity_;
     VSDuration duration_;
     std::optional<VSQuantity> energy_, distance_;

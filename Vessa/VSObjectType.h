@@ -11,17 +11,20 @@
 
 /// The integer code of a data type, 0 to 98. Kept on disk; never reused.
 enum class VSTypeCode : int {};
-constexpr int VSTypeCodeValue(VSTypeCode code) { return static_cast<int>(code); }
+constexpr int VSTypeCodeValue(VSTypeCode code) {
+    return static_cast<int>(code);
+}
 
 /// Codes that the program itself speaks of.
 namespace VSCode {
-inline constexpr VSTypeCode BodyMassIndex{0}, BodyFatPercentage{1}, Height{2}, BodyMass{3}, HeartRate{5}, StepCount{7},
-    DistanceWalkingRunning{8}, BasalEnergyBurned{9}, ActiveEnergyBurned{10}, FlightsClimbed{12}, NikeFuel{13},
-    OxygenSaturation{14}, BloodGlucose{15}, BloodPressureSystolic{16}, BloodPressureDiastolic{17},
-    DietaryEnergyConsumed{29}, RespiratoryRate{61}, BodyTemperature{62}, SleepAnalysis{63}, BiologicalSex{64},
-    DateOfBirth{65}, BloodType{66}, ZentroStandHour{70}, Workout{79}, BloodPressure{80}, DistanceCycling{83},
-    DietaryWater{87}, FitzpatrickSkinType{88}, UVExposure{89}, BasalBodyTemperature{90}, CervicalMucusQuality{91},
-    OvulationTestResult{92}, MenstrualFlow{95}, IntermenstrualBleeding{96}, SexualActivity{97};
+inline constexpr VSTypeCode BodyMassIndex{0}, BodyFatPercentage{1}, Height{2}, BodyMass{3}, HeartRate{5},
+    StepCount{7}, DistanceWalkingRunning{8}, BasalEnergyBurned{9}, ActiveEnergyBurned{10}, FlightsClimbed{12},
+    NikeFuel{13}, OxygenSaturation{14}, BloodGlucose{15}, BloodPressureSystolic{16},
+    BloodPressureDiastolic{17}, DietaryEnergyConsumed{29}, RespiratoryRate{61}, BodyTemperature{62},
+    SleepAnalysis{63}, BiologicalSex{64}, DateOfBirth{65}, BloodType{66}, ZentroStandHour{70}, Workout{79},
+    BloodPressure{80}, DistanceCycling{83}, DietaryWater{87}, FitzpatrickSkinType{88}, UVExposure{89},
+    BasalBodyTemperature{90}, CervicalMucusQuality{91}, OvulationTestResult{92}, MenstrualFlow{95},
+    IntermenstrualBleeding{96}, SexualActivity{97};
 }  // namespace VSCode
 
 enum class VSTypeKind { Quantity, Category, Correlation, Characteristic, Workout };
@@ -32,7 +35,7 @@ enum class VSAggregationStyle { Cumulative = 0, DiscreteAverage = 1 };
 /// A data type of the service. The instances live in the catalogue until the process ends; types are compared
 /// by their address and passed as `const VSObjectType*`, never null unless said. Any thread.
 class VSObjectType {
-   public:
+ public:
     VSTypeCode code() const { return code_; }
     /// The kind's prefix and the name in upper camel case: "VSQuantityTypeIdentifierHeartRate".
     const std::string& identifier() const { return identifier_; }
@@ -52,7 +55,8 @@ class VSObjectType {
     /// Invalid when it does not parse or does not convert to the canonical unit. REQUIRES: isQuantityType().
     VSResult<VSUnit> unitFromString(std::string_view text) const;
 
-    /// Values of a category type or enumerated characteristic and their identifiers, ascending; empty for others.
+    /// Values of a category type or enumerated characteristic and their identifiers, ascending; empty for
+    /// others.
     std::span<const std::pair<int, std::string>> enumeratedValues() const { return values_; }
     /// The identifier of an enumerated value ("VSCategoryValueSleepAnalysisAsleep"), or null.
     const std::string* identifierForValue(int value) const;
@@ -76,7 +80,7 @@ class VSObjectType {
 
     struct Catalogue;  // builds the instances
 
-   private:
+ private:
     VSObjectType() = default;
     VSTypeCode code_{};
     VSTypeKind kind_{};

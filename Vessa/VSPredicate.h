@@ -6,10 +6,15 @@
 
 #include "Vessa/VSObject.h"
 
-/// Options of a date predicate, a bit set. With none (0) a sample matches when its span meets [start, end): it
-/// starts before `end` and ends after `start`, or has no length and lies at `start` or later. StrictStartDate asks
-/// besides that it starts at `start` or later, StrictEndDate that it ends at `end` or earlier.
-enum VSQueryOptions : int { VSQueryOptionNone = 0, VSQueryOptionStrictStartDate = 1, VSQueryOptionStrictEndDate = 2 };
+/// Options of a date predicate, a bit set. With none (0) a sample matches when its span meets [start, end):
+/// it starts before `end` and ends after `start`, or has no length and lies at `start` or later.
+/// StrictStartDate asks besides that it starts at `start` or later, StrictEndDate that it ends at `end` or
+/// earlier.
+enum VSQueryOptions : int {
+    VSQueryOptionNone = 0,
+    VSQueryOptionStrictStartDate = 1,
+    VSQueryOptionStrictEndDate = 2
+};
 
 /// A condition on samples: the conjunction of everything set here. Plain value; `a & b` joins two.
 struct VSPredicate {
@@ -24,14 +29,15 @@ struct VSPredicate {
     std::optional<int> categoryValue;
     bool noCorrelation = false;  // not a member of a correlation
 
-    static VSPredicate samplesWithStartDate(std::optional<VSDate> start, std::optional<VSDate> end, int options);
+    static VSPredicate samplesWithStartDate(std::optional<VSDate> start, std::optional<VSDate> end,
+                                            int options);
     static VSPredicate samplesStartingBefore(VSDate date);
     static VSPredicate withMetadata(std::string key, VSValue value);
     static VSPredicate withCategoryValue(int value);
     /// Nothing but (perhaps) a date range with options 0: what statistics answer from rollups.
     bool isDateRangeOnly() const;
     bool matches(const VSSample& sample) const;  // all but noCorrelation, which only the store knows
-    /// What matches both. Conditions that contradict each other (two category values) become a date range in the distant future.
-    /// REQUIRES: the date options are equal when both have a date range.
+    /// What matches both. Conditions that contradict each other (two category values) become a date range in
+    /// the distant future. REQUIRES: the date options are equal when both have a date range.
     friend VSPredicate operator&(VSPredicate a, const VSPredicate& b);
 };

@@ -4,7 +4,7 @@
 
 /// A number with its unit. Plain value.
 class VSQuantity {
-   public:
+ public:
     VSQuantity(VSUnit unit, double value) : unit_(unit), value_(value) {}
 
     const VSUnit& unit() const { return unit_; }
@@ -14,7 +14,7 @@ class VSQuantity {
     /// REQUIRES: isCompatibleWith(unit).
     double doubleValueForUnit(const VSUnit& unit) const;
 
-   private:
+ private:
     VSUnit unit_;
     double value_;
 };

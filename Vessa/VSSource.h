@@ -32,7 +32,8 @@ struct VSDevice {
     friend auto operator<=>(const VSDevice&, const VSDevice&) = default;
 
     /// "name:Wrist tracker, hardware:1": the present fields in the order above, as name, manufacturer, model,
-    /// hardware, firmware, software, localIdentifier, UDI; a backslash precedes a comma, colon or backslash of a value.
+    /// hardware, firmware, software, localIdentifier, UDI; a backslash precedes a comma, colon or backslash
+    /// of a value.
     std::string description() const;
     /// The device of such a text. A text that is not of this form becomes the name of the device.
     static VSDevice fromDescription(const std::string& text);

@@ -25,9 +25,12 @@ enum VSStatisticsOptions : int {
 struct VSStatistics {
     const VSObjectType* type = nullptr;
     VSDate startDate, endDate;
-    int64_t count = 0;  // samples that start in the range
+    int64_t count = 0;                                     // samples that start in the range
     std::optional<double> sum, average, minimum, maximum;  // in the type's canonical unit
-    struct OfSource { int64_t count = 0; std::optional<double> sum, average, minimum, maximum; };
+    struct OfSource {
+        int64_t count = 0;
+        std::optional<double> sum, average, minimum, maximum;
+    };
     std::map<VSSource, OfSource> bySource;  // filled when asked for
 
     std::optional<VSQuantity> sumQuantity() const { return quantity(sum); }
@@ -37,22 +40,23 @@ struct VSStatistics {
     /// Whether any of the values asked for is there.
     bool hasData() const { return sum || average || minimum || maximum; }
 
-   private:
+ private:
     std::optional<VSQuantity> quantity(const std::optional<double>& value) const;
 };
 
 /// The buckets of a statistics-collection query. Immutable, shared; any thread.
 class VSStatisticsCollection {
-   public:
+ public:
     /// `statistics` ascending, only buckets with data.
-    VSStatisticsCollection(const VSObjectType* type, VSDate anchor, VSDateComponents interval, VSCalendar calendar,
-                           std::vector<VSStatistics> statistics);
+    VSStatisticsCollection(const VSObjectType* type, VSDate anchor, VSDateComponents interval,
+                           VSCalendar calendar, std::vector<VSStatistics> statistics);
     /// Only the buckets that hold data, ascending.
     const std::vector<VSStatistics>& statistics() const { return statistics_; }
     /// Every bucket that meets [from, to), empty ones included, ascending.
-    void enumerateStatistics(VSDate from, VSDate to, const std::function<void(const VSStatistics&)>& block) const;
+    void enumerateStatistics(VSDate from, VSDate to,
+                             const std::function<void(const VSStatistics&)>& block) const;
 
-   private:
+ private:
     const VSObjectType* type_;
     VSDate anchor_;
     VSDateComponents interval_;

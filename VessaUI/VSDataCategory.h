@@ -8,12 +8,13 @@
 
 /// Category IDs. Kept on disk in user activities; never reused.
 namespace VSCategoryID {
-inline constexpr int BodyMeasurements = 1, Fitness = 2, Vitals = 3, Nutrition = 4, Results = 5, Sleep = 6, ReproductiveHealth = 7, Me = 8;
+inline constexpr int BodyMeasurements = 1, Fitness = 2, Vitals = 3, Nutrition = 4, Results = 5, Sleep = 6,
+                     ReproductiveHealth = 7, Me = 8;
 }
 
 /// A group of display types with colours and an icon. Lives in the catalogue until the process ends.
 class VSDataCategory {
-   public:
+ public:
     int categoryID() const { return id_; }
     QString displayName() const;
     bool isMe() const { return id_ == VSCategoryID::Me; }  // the category of characteristics
@@ -24,7 +25,7 @@ class VSDataCategory {
     /// A rectangle with rounded corners (radius 8 points) filled with the gradient, top to bottom.
     QImage roundedGradient(QSizeF size, double scale) const;
 
-   private:
+ private:
     friend class VSDataCategoryController;
     int id_ = 0;
     const char* nameKey_ = "";
@@ -33,12 +34,12 @@ class VSDataCategory {
 };
 
 class VSDataCategoryController {
-   public:
+ public:
     static const VSDataCategoryController& shared();
     const std::vector<VSDataCategory>& allDataCategories() const { return categories_; }
     const VSDataCategory* categoryWithID(int id) const;  // null: unknown
 
-   private:
+ private:
     VSDataCategoryController();
     std::vector<VSDataCategory> categories_;
 };

@@ -14,13 +14,16 @@ struct VSDataUnitRow;
 /// A range of numbers in a unit; a bound may be absent.
 struct VSValueRange {
     std::optional<double> minimum, maximum;
-    bool containsValue(double value) const { return (!minimum || value >= *minimum) && (!maximum || value <= *maximum); }
+    bool containsValue(double value) const {
+        return (!minimum || value >= *minimum) && (!maximum || value <= *maximum);
+    }
     friend bool operator==(const VSValueRange&, const VSValueRange&) = default;
 };
 
-/// One data type as a display type shows it. Lives in the catalogue until the process ends; compared by address.
+/// One data type as a display type shows it. Lives in the catalogue until the process ends; compared by
+/// address.
 class VSDataUnit {
-   public:
+ public:
     const VSObjectType* dataType() const { return dataType_; }
     /// The type that queries and samples use (the same, but for what the catalogue says otherwise).
     const VSObjectType* sampleType() const { return dataType_; }
@@ -33,13 +36,14 @@ class VSDataUnit {
     /// An extra filter on the samples charted in a time scope (asleep and not in bed, for sleep), or none.
     std::optional<VSPredicate> chartingPredicateForTimeScope(VSTimeScopeIndex timeScope) const;
 
-    /// Its row in the tables of the catalogue (VessaUI/VSDataUnitGroupCatalogue.h): units to choose from and ranges.
+    /// Its row in the tables of the catalogue (VessaUI/VSDataUnitGroupCatalogue.h): units to choose from and
+    /// ranges.
     const VSDataUnitRow& row() const { return *row_; }
 
     VSDataUnit(const VSDataUnit&) = delete;
     VSDataUnit& operator=(const VSDataUnit&) = delete;
 
-   private:
+ private:
     friend struct VSDataUnitGroupCatalogue;
     VSDataUnit() = default;
     const VSObjectType* dataType_ = nullptr;

@@ -11,10 +11,11 @@
 
 /// Display-type IDs that the program speaks of. Kept on disk in the dashboard's selection; never reused.
 namespace VSGroupID {
-inline constexpr int Height = 3, HeartRate = 6, WalkingRunningDistance = 7, ActiveEnergy = 8, FlightsClimbed = 10, BloodPressure = 13,
-                     SleepAnalysis = 58, Steps = 59, CyclingDistance = 71, Workouts = 72, Water = 73, StandHours = 75,
-                     BasalBodyTemperature = 76, CervicalMucusQuality = 77, OvulationTestResult = 78, SexualActivity = 79,
-                     MenstrualFlow = 80, UVExposure = 81, Spotting = 82;
+inline constexpr int Height = 3, HeartRate = 6, WalkingRunningDistance = 7, ActiveEnergy = 8,
+                     FlightsClimbed = 10, BloodPressure = 13, SleepAnalysis = 58, Steps = 59,
+                     CyclingDistance = 71, Workouts = 72, Water = 73, StandHours = 75,
+                     BasalBodyTemperature = 76, CervicalMucusQuality = 77, OvulationTestResult = 78,
+                     SexualActivity = 79, MenstrualFlow = 80, UVExposure = 81, Spotting = 82;
 }
 
 struct VSDataUnitGroupRow;
@@ -22,7 +23,7 @@ struct VSDataUnitGroupRow;
 /// A display type: what a card, a list and an entry screen show. Lives in the catalogue until the process
 /// ends; compared by address. Immutable; texts follow the user's language.
 class VSDataUnitGroup {
-   public:
+ public:
     int dataUnitGroupID() const;
     int categoryID() const;
     QString displayName() const;
@@ -53,7 +54,7 @@ class VSDataUnitGroup {
     VSDataUnitGroup(const VSDataUnitGroup&) = delete;
     VSDataUnitGroup& operator=(const VSDataUnitGroup&) = delete;
 
-   private:
+ private:
     friend struct VSDataUnitGroupCatalogue;
     VSDataUnitGroup() = default;
     const VSDataUnitGroupRow* row_ = nullptr;
@@ -63,7 +64,7 @@ class VSDataUnitGroup {
 
 /// The catalogue of display types.
 class VSDataUnitGroupController {
-   public:
+ public:
     static const VSDataUnitGroupController& shared();
     const std::vector<const VSDataUnitGroup*>& allDataUnitGroups() const;
     const VSDataUnitGroup* dataUnitGroupWithID(int id) const;  // null: unknown

@@ -13,10 +13,11 @@
 /// The user's preferred units, kept in the health service's default values (key "VSPreferredUnits": a
 /// dictionary from type identifier to unit string). A preference not set follows the user's region (US
 /// customary in US, LR, MM; glucose in mmol/L where that is customary ...) and its changes. Until the stored
-/// preferences have been read the region's units answer; the signal tells when that changed anything. Main thread only.
+/// preferences have been read the region's units answer; the signal tells when that changed anything. Main
+/// thread only.
 class VSUnitController : public QObject {
     Q_OBJECT
-   public:
+ public:
     explicit VSUnitController(std::shared_ptr<VSHealthStore> healthStore);
 
     VSUnit unitForDataUnit(const VSDataUnit* dataUnit) const;
@@ -36,23 +37,25 @@ class VSUnitController : public QObject {
     std::optional<VSValueRange> manualEntryAbsoluteRangeForDataUnit(const VSDataUnit* dataUnit) const;
     std::optional<VSValueRange> manualEntryConfirmRangeForDataUnit(const VSDataUnit* dataUnit) const;
 
-   signals:
+ signals:
     /// VSUnitControllerUnitPreferencesDidChangeNotification, with the data types whose unit changed.
     void unitPreferencesDidChange(const QSet<const VSObjectType*>& changedTypes);
 
-   private:
+ private:
     enum class LoadState { Loading, Loaded, Failed };
     void load();
     void preferencesLoaded(const VSValue::Dictionary& stored);
     void save();
     void localeDidChange();
     QString nameOfUnit(const VSDataUnit* dataUnit, const VSUnit& unit, std::optional<double> value) const;
-    std::optional<VSValueRange> rangeInPreferredUnit(const VSDataUnit* dataUnit, const VSValueRange& range) const;
+    std::optional<VSValueRange> rangeInPreferredUnit(const VSDataUnit* dataUnit,
+                                                     const VSValueRange& range) const;
 
     std::shared_ptr<VSHealthStore> healthStore_;
     LoadState loadState_ = LoadState::Loading;
     bool saveWhenLoaded_ = false;
-    VSValue::Dictionary stored_;  // as read and changed, with the entries that this version does not understand
+    VSValue::Dictionary
+        stored_;  // as read and changed, with the entries that this version does not understand
     std::map<const VSObjectType*, VSUnit> preferred_;
     std::map<const VSObjectType*, VSUnit> defaultsTold_;  // the region's, as observers know them
     std::shared_ptr<bool> alive_ = std::make_shared<bool>(true);

@@ -90,8 +90,8 @@ std::unique_ptr<platform::NavigationStack> QVAppDelegate::healthDataStack() {
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::sourcesStack() {
-    return placeholderStack("Sources Navigation Controller", "SOURCES", "sources_selected",
-                            "SOURCES_PENDING", QVUserActivityTab::Sources);
+    return placeholderStack("Sources Navigation Controller", "SOURCES", "sources_selected", "SOURCES_PENDING",
+                            QVUserActivityTab::Sources);
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::medicalIDStack() {

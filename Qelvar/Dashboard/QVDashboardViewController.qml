@@ -45,7 +45,14 @@ FocusScope {
         header: Item { width: 1; height: SystemStyle.pixel }
         Accessible.role: Accessible.List
         Accessible.name: root.screen.title
-        onCurrentIndexChanged: positionViewAtIndex(currentIndex, ListView.Contain)
+        // Only the keyboard moves the list to the current card: a card inserted above it, or a finger on one that is half
+        // in sight, must not.
+        property bool byKeyboard: false
+        Keys.onPressed: event => {
+            byKeyboard = true
+            event.accepted = false
+        }
+        onCurrentIndexChanged: if (byKeyboard) positionViewAtIndex(currentIndex, ListView.Contain)
 
         delegate: T.AbstractButton {
             id: row
@@ -58,16 +65,17 @@ FocusScope {
             onClicked: root.screen.selectRow(index)
             Keys.onReturnPressed: row.clicked()
             Keys.onEnterPressed: row.clicked()
+            onPressed: table.byKeyboard = false
             onActiveFocusChanged: if (activeFocus) ListView.view.currentIndex = index
+            onVisualFocusChanged: if (visualFocus) table.positionViewAtIndex(index, ListView.Contain)
             Accessible.role: Accessible.Button
             Accessible.name: displayName + (cell.accessibleValue ? ", " + cell.accessibleValue : "")
-            Accessible.description: cell.accessibleValue
             contentItem: QVDashboardTableViewCell {
                 id: cell
                 screen: root.screen
                 row: row.index
             }
-            FocusRing { anchors.margins: 4; shown: row.visualFocus }
+            FocusRing { anchors.margins: 4; shown: row.visualFocus || (row.activeFocus && table.byKeyboard) }
         }
     }
 

@@ -31,7 +31,7 @@ enum class VSCalendarUnit { Era, Year, Month, Day, Hour, Minute, Second, Weekday
 /// Where a local time does not exist (clocks going forward) the first moment after the gap is meant; where it
 /// exists twice, the first of the two.
 class VSCalendar {
-   public:
+ public:
     /// In the zone and locale of VSEnvironment::current().
     static VSCalendar current();
     VSCalendar(std::string timeZone, std::string locale);
@@ -51,7 +51,8 @@ class VSCalendar {
     /// Year, month (1 to 12), day of the month, hour, minute, second, weekday (1 Sunday to 7 Saturday).
     int component(VSCalendarUnit unit, VSDate date) const;
     /// Local date and time to an instant. Months from 1. None when the date does not exist (30 February).
-    std::optional<VSDate> date(int year, int month, int day, int hour = 0, int minute = 0, int second = 0) const;
+    std::optional<VSDate> date(int year, int month, int day, int hour = 0, int minute = 0,
+                               int second = 0) const;
     /// Whole years from one date to a later one, as birthdays count them; negative when `to` is earlier.
     int wholeYearsBetween(VSDate from, VSDate to) const;
     bool isSameDay(VSDate a, VSDate b) const;
@@ -63,22 +64,23 @@ class VSCalendar {
     /// Seconds east of Greenwich at that moment.
     int secondsFromGMT(VSDate date) const;
 
-    /// The starts of the buckets that cover [start, end): anchor + n * interval for whole n, beginning with the
-    /// last one not after `start`, and closed by the first one not before `end`; so n buckets give n + 1 dates.
-    /// Each start is computed from the anchor, not from its neighbour (31 January plus months keeps the 31st
-    /// where it exists). REQUIRES: interval is positive, start < end.
-    std::vector<VSDate> bucketBoundaries(VSDate anchor, const VSDateComponents& interval, VSDate start, VSDate end) const;
+    /// The starts of the buckets that cover [start, end): anchor + n * interval for whole n, beginning with
+    /// the last one not after `start`, and closed by the first one not before `end`; so n buckets give n + 1
+    /// dates. Each start is computed from the anchor, not from its neighbour (31 January plus months keeps
+    /// the 31st where it exists). REQUIRES: interval is positive, start < end.
+    std::vector<VSDate> bucketBoundaries(VSDate anchor, const VSDateComponents& interval, VSDate start,
+                                         VSDate end) const;
 
     const std::string& timeZoneIdentifier() const { return timeZone_; }
     const std::string& localeIdentifier() const { return locale_; }
 
-   private:
+ private:
     std::string timeZone_;
     std::string locale_;
 };
 
-/// "2020-03-31T20:00", with optional seconds, fraction and offset ("+02:00", "+0200", "Z"); a day alone is its
-/// midnight; without an offset the calendar's zone is meant. None when it is not such a date.
+/// "2020-03-31T20:00", with optional seconds, fraction and offset ("+02:00", "+0200", "Z"); a day alone is
+/// its midnight; without an offset the calendar's zone is meant. None when it is not such a date.
 std::optional<VSDate> VSDateFromISO8601(std::string_view text, const VSCalendar& calendar);
 /// "2020-03-31T20:00:00+02:00", with six decimals of the second only where they are not zero.
 std::string VSISO8601FromDate(VSDate date, const VSCalendar& calendar);

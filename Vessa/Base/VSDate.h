@@ -16,15 +16,19 @@ double VSSecondsFromDuration(VSDuration duration);
 /// A point in time with microseconds, in the proleptic Gregorian reckoning of the system's clocks (UTC
 /// without leap seconds). A plain value; it knows no calendar and no time zone (VSCalendar does).
 class VSDate {
-   public:
+ public:
     using TimePoint = std::chrono::sys_time<VSDuration>;
 
     /// 1970-01-01 00:00:00 UTC.
     constexpr VSDate() = default;
     constexpr explicit VSDate(TimePoint time) : time_(time) {}
 
-    static constexpr VSDate fromMicroseconds(int64_t sinceUnixEpoch) { return VSDate(TimePoint(VSDuration(sinceUnixEpoch))); }
-    static constexpr VSDate fromSeconds(int64_t sinceUnixEpoch) { return fromMicroseconds(sinceUnixEpoch * 1'000'000); }
+    static constexpr VSDate fromMicroseconds(int64_t sinceUnixEpoch) {
+        return VSDate(TimePoint(VSDuration(sinceUnixEpoch)));
+    }
+    static constexpr VSDate fromSeconds(int64_t sinceUnixEpoch) {
+        return fromMicroseconds(sinceUnixEpoch * 1'000'000);
+    }
     /// Seconds since VSReferenceDate, rounded to the microsecond.
     static VSDate fromSecondsSinceReferenceDate(double seconds);
     static constexpr VSDate distantPast() { return fromMicroseconds(INT64_MIN / 4); }
@@ -36,12 +40,17 @@ class VSDate {
     double secondsSinceReferenceDate() const;
     constexpr TimePoint timePoint() const { return time_; }
 
-    friend constexpr auto operator<=>(const VSDate&, const VSDate&) = default;  // NOLINT(modernize-use-nullptr)
-    friend constexpr VSDate operator+(VSDate date, VSDuration duration) { return VSDate(date.time_ + duration); }
-    friend constexpr VSDate operator-(VSDate date, VSDuration duration) { return VSDate(date.time_ - duration); }
+    friend constexpr auto operator<=>(const VSDate&,
+                                      const VSDate&) = default;  // NOLINT(modernize-use-nullptr)
+    friend constexpr VSDate operator+(VSDate date, VSDuration duration) {
+        return VSDate(date.time_ + duration);
+    }
+    friend constexpr VSDate operator-(VSDate date, VSDuration duration) {
+        return VSDate(date.time_ - duration);
+    }
     friend constexpr VSDuration operator-(VSDate a, VSDate b) { return a.time_ - b.time_; }
 
-   private:
+ private:
     TimePoint time_{};
 };
 

@@ -9,7 +9,7 @@
 /// Clock, time zone and locale of the user: the only place that asks the system for them. Everything else
 /// asks VSEnvironment::current(), anew at every computation. Any thread.
 class VSEnvironment {
-   public:
+ public:
     virtual ~VSEnvironment() = default;
 
     virtual VSDate now() const = 0;
@@ -30,19 +30,19 @@ class VSEnvironment {
 /// at each call, so that a change of the system's zone is seen. With `startAt` the clock starts there and
 /// runs on from the moment of construction.
 class VSSystemEnvironment final : public VSEnvironment {
-   public:
+ public:
     explicit VSSystemEnvironment(std::optional<VSDate> startAt = std::nullopt);
     VSDate now() const override;
     std::string timeZoneIdentifier() const override;
     std::string localeIdentifier() const override;
 
-   private:
+ private:
     VSDuration offset_{};
 };
 
 /// Fixed values, for tests. The setters may be called between computations; thread-safe.
 class VSFixedEnvironment final : public VSEnvironment {
-   public:
+ public:
     VSFixedEnvironment(VSDate now, std::string timeZone, std::string locale);
     ~VSFixedEnvironment() override;
     VSDate now() const override;
@@ -52,7 +52,7 @@ class VSFixedEnvironment final : public VSEnvironment {
     void setTimeZone(std::string identifier);
     void setLocale(std::string identifier);
 
-   private:
+ private:
     struct State;
     std::unique_ptr<State> state_;
 };

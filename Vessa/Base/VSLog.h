@@ -10,7 +10,7 @@ enum class VSLogLevel { Error = 3, Debug = 7 };
 
 bool VSLogIsEnabled(VSLogLevel level);
 void VSLog(VSLogLevel level, std::string_view line);
-/// Replaces the sink (tests) and returns the one before (null: the default). A null sink restores the default. Any
-/// other sink gets the lines of all levels, on the thread that logs.
+/// Replaces the sink (tests) and returns the one before (null: the default). A null sink restores the
+/// default. Any other sink gets the lines of all levels, on the thread that logs.
 using VSLogSink = std::function<void(VSLogLevel, std::string_view)>;
 VSLogSink VSSetLogSink(VSLogSink sink);

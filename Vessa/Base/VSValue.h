@@ -12,7 +12,7 @@
 
 /// A property-list value: what metadata entries, default values and the demo file hold. Text is UTF-8.
 class VSValue {
-   public:
+ public:
     using Array = std::vector<VSValue>;
     using Dictionary = std::map<std::string, VSValue, std::less<>>;
     using Data = std::vector<uint8_t>;
@@ -45,13 +45,13 @@ class VSValue {
     /// ISO 8601 UTC dates, hexadecimal data; arrays and dictionaries as their JSON text.
     std::string description() const;
 
-    /// A lossless text of one line and back: JSON, with {"date": microseconds} and {"data": hex} for what JSON lacks
-    /// and dictionaries as {"dict": {...}}. It is what the store keeps.
+    /// A lossless text of one line and back: JSON, with {"date": microseconds} and {"data": hex} for what
+    /// JSON lacks and dictionaries as {"dict": {...}}. It is what the store keeps.
     std::string serialized() const;
     static std::optional<VSValue> fromSerialized(std::string_view text);
 
     friend bool operator==(const VSValue&, const VSValue&) = default;
 
-   private:
+ private:
     std::variant<std::string, bool, int64_t, double, VSDate, Data, Array, Dictionary> content_;
 };
