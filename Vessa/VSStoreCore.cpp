@@ -36,7 +36,10 @@ VSResult<std::shared_ptr<VSStoreCore>> VSStoreCore::open(const std::filesystem::
         if (core->writer_) core->writing_.start(1, core);
         return core;
     } catch (const VSDatabaseFailure& failure) {
-        return failure.error();
+        VSError error = failure.error();
+        const std::string where = folder.string();
+        if (error.message.find(where) == std::string::npos) error.message = where + ": " + error.message;
+        return error;
     }
 }
 
