@@ -33,6 +33,7 @@ void chooseGraphics(const QVApplicationOptions& options) {
     QQuickWindow::setGraphicsApi(QSGRendererInterface::Software);
 }
 
+/// The store of the folder; an error names the place.
 VSResult<std::shared_ptr<VSHealthStore>> openStore(const std::filesystem::path& folder, bool demo) {
     std::error_code error;
     const std::filesystem::path parent = std::filesystem::absolute(folder).parent_path();
@@ -48,8 +49,10 @@ VSResult<std::shared_ptr<VSHealthStore>> openStore(const std::filesystem::path& 
         const auto types = (*store)->typeSummaries();
         if (!types) return types.error();
         if (!types->empty())
-            return VSError{VSErrorCode::Refused,
-                           "it holds records, which the demonstration would replace; name another folder"};
+            return VSError{
+                VSErrorCode::Refused,
+                folder.string() +
+                    ": it holds records, which the demonstration would replace; name another folder"};
         defaults.setValue("UseDemoData", true);
     }
     QVUserDefaults::sharedDefaults().setHealthStore(*store);
@@ -132,10 +135,8 @@ int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options)
     const std::filesystem::path folder = options.store.empty() ? QVStoreFolder(options.demo) : options.store;
     auto store = openStore(folder, options.demo);
     if (!store) {
-        std::fprintf(stderr, "qelvar: the store in %s cannot be opened: %s\n", folder.c_str(),
-                     store.error().message.c_str());
-        if (!options.screenshots)
-            showStartFailure(QString::fromStdString(folder.string() + ": " + store.error().message));
+        std::fprintf(stderr, "qelvar: the store cannot be opened: %s\n", store.error().message.c_str());
+        if (!options.screenshots) showStartFailure(QString::fromStdString(store.error().message));
         return 1;
     }
     QVStartupTrace::note("store open");
