@@ -2,6 +2,7 @@
 
 #include <filesystem>
 #include <functional>
+#include <map>
 #include <memory>
 #include <optional>
 #include <string>
@@ -9,8 +10,11 @@
 
 #include "Vessa/Base/VSError.h"
 #include "Vessa/Base/VSValue.h"
+#include "Vessa/VSAuthorization.h"
+#include "Vessa/VSBatch.h"
 #include "Vessa/VSObject.h"
 #include "Vessa/VSQuery.h"
+#include "Vessa/VSStatisticsExplanation.h"
 
 /// Values of the characteristics; the numbers are those of the enumerated values of their types.
 struct VSBirthDate {
@@ -26,17 +30,17 @@ struct VSMedicalIDData {
     friend bool operator==(const VSMedicalIDData&, const VSMedicalIDData&) = default;
 };
 
-/// One import: a name and a time, and the objects that it added.
-struct VSBatch {
-    int64_t id = 0;
-    std::string name;
-    VSDate date;
-    int64_t added = 0;
-};
-
 struct VSCheckReport {
     std::vector<std::string> problems;
     int64_t samples = 0;
+};
+
+/// What was saved out of a damaged store.
+struct VSSalvageReport {
+    int64_t samples = 0;  // that are in the new store
+    std::optional<int64_t>
+        lost;  // samples known to have been there whose content could not be read; none: unknown
+    std::vector<std::string> losses;  // what was lost, in words, with the time it lies in where that is known
 };
 
 /// A connection to the store of one folder. Several connections, in one process or many, may be open on the
@@ -52,6 +56,8 @@ class VSHealthStore {
         /// False: a lost power supply may take the last saves with it, never more; a killed process loses
         /// nothing either way.
         bool survivesPowerLoss = true;
+        /// How long an operation that changes something waits for other programs that hold the store.
+        VSDuration patience = std::chrono::minutes(2);
     };
     /// Waits. Opens or makes the database in the folder (made with mode 0700). Refused: a newer schema, not
     /// our file. Corrupt: a damaged file (it is never changed). NotAccessible: cannot be locked or reached.
@@ -60,6 +66,12 @@ class VSHealthStore {
     static VSResult<std::shared_ptr<VSHealthStore>> open(const std::filesystem::path& folder) {
         return open(folder, {});
     }
+    /// Waits. Reads whatever can be read of the store in `damaged` (also one that cannot be opened) and makes
+    /// a sound store of it in `folder`, which holds none yet. Nothing in `damaged` is changed. NotAccessible:
+    /// there is no store, or it is in use; Refused: `folder` holds a store, or `damaged` is of another
+    /// program or newer.
+    static VSResult<VSSalvageReport> salvage(const std::filesystem::path& damaged,
+                                             const std::filesystem::path& folder);
     virtual ~VSHealthStore() = default;
 
     using Completion = std::function<void(const VSStatus&)>;
@@ -100,13 +112,29 @@ class VSHealthStore {
     virtual void fetchMedicalIDData(
         std::function<void(const VSResult<std::optional<VSMedicalIDData>>&)> completion) = 0;
     virtual void updateMedicalIDData(VSMedicalIDData data, Completion completion) = 0;
+    virtual void deleteMedicalIDData(Completion completion) = 0;
 
     // Default values of an application
     virtual void setDefaultValue(VSValue value, std::string key, Completion completion) = 0;
     virtual void getDefaultValue(std::string key,
                                  std::function<void(const VSResult<std::optional<VSValue>>&)> handler) = 0;
 
-    // Sources
+    // Sources, devices and permissions
+    /// All that ever wrote, by name and bundle identifier, and the applications that asked for a permission.
+    virtual void allSources(std::function<void(const VSResult<std::vector<VSSource>>&)> completion) = 0;
+    /// The devices of samples; only those with one of these local identifiers when any is given.
+    virtual void devices(std::vector<std::string> localIdentifiers,
+                         std::function<void(const VSResult<std::vector<VSDevice>>&)> completion) = 0;
+    /// The records of every application that asked for the type.
+    virtual void authorizationRecords(
+        const VSObjectType* type,
+        std::function<void(const VSResult<std::vector<VSAuthorizationRecord>>&)> completion) = 0;
+    /// Of one application; types that it did not ask for get a record that asks for nothing.
+    virtual void setAuthorizationStatuses(std::map<const VSObjectType*, VSAuthorizationStatus> statuses,
+                                          std::string bundleIdentifier, Completion completion) = 0;
+    /// Notes what the application of this connection wants; types that it asked for before keep their status.
+    virtual void requestAuthorization(std::vector<const VSObjectType*> toShare,
+                                      std::vector<const VSObjectType*> toRead, Completion completion) = 0;
     /// The order in which sources of a type count: the user's, else this application's own entries first,
     /// then by the date of their first sample. Sources that are new since the user chose stand at the end.
     virtual void orderedSources(const VSObjectType* type,
@@ -123,6 +151,11 @@ class VSHealthStore {
     virtual VSResult<std::shared_ptr<const VSStatisticsCollection>> statisticsCollection(
         const VSObjectType* type, const VSPredicate& predicate, int options, VSDate anchor,
         const VSDateComponents& interval) = 0;
+    /// Every sample of the predicate's range with what of it counted: the statistics of the same predicate
+    /// and options, taken apart.
+    virtual VSResult<VSStatisticsExplanation> explainStatistics(const VSObjectType* type,
+                                                                const VSPredicate& predicate,
+                                                                int options) = 0;
     struct SourceSummary {
         VSSource source;
         int64_t count = 0;
@@ -160,6 +193,13 @@ class VSHealthStore {
     /// Waits for the writer, at most `patience`; NotAccessible when another process holds it longer.
     virtual VSResult<std::unique_ptr<ImportTransaction>> beginImport(
         const std::string& name, VSDuration patience = std::chrono::seconds(30)) = 0;
+
+    // Batches. They wait.
+    /// The imports that were not taken back, oldest first.
+    virtual VSResult<std::vector<VSBatch>> batches() = 0;
+    /// Takes an import back: what it added and no later import had as well is deleted (anchored queries get
+    /// it as deleted objects), the characteristics that it set are unset. NotFound: there is no such batch.
+    virtual VSResult<VSUndoReport> undoBatch(int64_t batch) = 0;
 
     virtual VSResult<int64_t> databaseSizeInBytes() = 0;
     virtual const std::filesystem::path& folder() const = 0;

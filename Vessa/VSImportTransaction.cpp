@@ -156,11 +156,12 @@ VSStatus VSImportTransaction::commit() {
     try {
         if (added_) {
             auto batch =
-                database_->use("INSERT INTO batches(name, date, first_id, last_id) VALUES (?, ?, ?, ?)");
+                database_->use("INSERT INTO batches(name, date, first_id, last_id, added) VALUES (?, ?, ?, ?, ?)");
             batch.bindText(1, name_)
                 .bind(2, date_.microseconds())
                 .bind(3, lastBefore_ + 1)
                 .bind(4, writer_.lastNumber())
+                .bind(5, added_)
                 .run();
         }
         writer_.finish();

@@ -102,12 +102,38 @@ CREATE TABLE source_order(
     source INTEGER NOT NULL,
     PRIMARY KEY (type, position)) WITHOUT ROWID;
 
+CREATE TABLE merged_orders(
+    type INTEGER NOT NULL,
+    position INTEGER NOT NULL,
+    source INTEGER NOT NULL,
+    PRIMARY KEY (type, position)) WITHOUT ROWID;
+
 CREATE TABLE batches(
-    batch INTEGER PRIMARY KEY,
+    batch INTEGER PRIMARY KEY AUTOINCREMENT,
     name TEXT NOT NULL,
     date INTEGER NOT NULL,
     first_id INTEGER NOT NULL,
-    last_id INTEGER NOT NULL);
+    last_id INTEGER NOT NULL,
+    added INTEGER NOT NULL);
+CREATE TABLE batch_claims(
+    batch INTEGER NOT NULL,
+    first_id INTEGER NOT NULL,
+    last_id INTEGER NOT NULL,
+    PRIMARY KEY (batch, first_id)) WITHOUT ROWID;
+CREATE TABLE batch_characteristics(
+    batch INTEGER NOT NULL,
+    type INTEGER NOT NULL,
+    value INTEGER NOT NULL,
+    PRIMARY KEY (batch, type)) WITHOUT ROWID;
+
+CREATE TABLE authorizations(
+    bundle TEXT NOT NULL,
+    type INTEGER NOT NULL,
+    name TEXT NOT NULL,
+    status INTEGER NOT NULL,
+    reading INTEGER NOT NULL,
+    sharing INTEGER NOT NULL,
+    PRIMARY KEY (bundle, type)) WITHOUT ROWID;
 
 CREATE TABLE defaults(
     application TEXT NOT NULL,
@@ -125,10 +151,14 @@ CREATE TABLE medical_id(
     picture BLOB);
 )sql";
 
-constexpr const char* tableNames[] = {
-    "state",   "types",        "sources",  "devices",        "provenances",     "metadata",
-    "samples", "members",      "workouts", "workout_events", "deleted",         "type_sources",
-    "rollups", "source_order", "batches",  "defaults",       "characteristics", "medical_id"};
+constexpr const char* tableNames[] = {"state",          "types",         "sources",
+                                      "devices",        "provenances",   "metadata",
+                                      "samples",        "members",       "workouts",
+                                      "workout_events", "deleted",       "type_sources",
+                                      "rollups",        "merged_orders", "source_order",
+                                      "batches",        "batch_claims",  "batch_characteristics",
+                                      "authorizations", "defaults",      "characteristics",
+                                      "medical_id"};
 
 [[noreturn]] void refuse(VSErrorCode code, std::string message) {
     throw VSDatabaseFailure({code, std::move(message)});

@@ -11,7 +11,7 @@
 namespace VSStoreSchema {
 
 inline constexpr int32_t applicationID = 0x56455353;  // "VESS"
-inline constexpr int currentVersion = 1;
+inline constexpr int currentVersion = 2;
 inline constexpr const char* fileName = "vessa.sqlite";
 /// Its time stamp changes after each commit; the running programs watch it.
 inline constexpr const char* noticeFileName = "vessa.notice";

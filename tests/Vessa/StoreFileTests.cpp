@@ -148,7 +148,7 @@ TEST_F(StoreFile, IsRefusedUntouchedWhenItIsNotOurs) {
 
 TEST_F(StoreFile, OfANewerFormatIsRefusedUntouched) {
     makeStore();
-    change("PRAGMA user_version = 2; PRAGMA wal_checkpoint(TRUNCATE)");
+    change("PRAGMA user_version = 99; PRAGMA wal_checkpoint(TRUNCATE)");
     const std::string before = bytes();
     EXPECT_EQ(refusal(), VSErrorCode::Refused);
     VSHealthStore::Options options;

@@ -1,0 +1,89 @@
+#include "Vessa/VSHealthStoreConnection.h"
+
+#include "Vessa/VSStoreCharacteristics.h"
+
+VSResult<std::optional<VSBirthDate>> VSHealthStoreConnection::dateOfBirth() {
+    return core_->readers.read([](VSStoreReader& reader) -> std::optional<VSBirthDate> {
+        const auto value =
+            VSReadCharacteristic(reader.database(), VSObjectType::dataTypeWithCode(VSCode::DateOfBirth));
+        if (!value) return std::nullopt;
+        return VSBirthDateFromStored(*value);
+    });
+}
+
+void VSHealthStoreConnection::setDateOfBirth(std::optional<VSBirthDate> date, Completion completion) {
+    std::optional<int64_t> value;
+    if (date) value = VSStoredBirthDate(*date);
+    writeCharacteristic(VSObjectType::dataTypeWithCode(VSCode::DateOfBirth), value, std::move(completion));
+}
+
+void VSHealthStoreConnection::setCharacteristic(const VSObjectType* type, int value, Completion completion) {
+    writeCharacteristic(type, value ? std::optional<int64_t>(value) : std::nullopt, std::move(completion));
+}
+
+void VSHealthStoreConnection::fetchMedicalIDData(
+    std::function<void(const VSResult<std::optional<VSMedicalIDData>>&)> completion) {
+    core_->readLater([](VSStoreReader& reader) { return VSReadMedicalID(reader.database()); },
+                     std::move(completion));
+}
+
+void VSHealthStoreConnection::updateMedicalIDData(VSMedicalIDData data, Completion completion) {
+    core_->write(
+        [data = std::move(data)](VSStoreWriter& writer) {
+            VSWriteMedicalID(writer.database(), data);
+            return VSStatus();
+        },
+        std::move(completion));
+}
+
+void VSHealthStoreConnection::setDefaultValue(VSValue value, std::string key, Completion completion) {
+    core_->write(
+        [application = core_->options.applicationIdentifier, value = std::move(value),
+         key = std::move(key)](VSStoreWriter& writer) {
+            writer.database()
+                .use(
+                    "INSERT INTO defaults VALUES (?1, ?2, ?3) ON CONFLICT(application, key) DO UPDATE "
+                    "SET value = ?3")
+                .bindText(1, application)
+                .bindText(2, key)
+                .bindText(3, value.serialized())
+                .run();
+            return VSStatus();
+        },
+        std::move(completion));
+}
+
+void VSHealthStoreConnection::getDefaultValue(
+    std::string key, std::function<void(const VSResult<std::optional<VSValue>>&)> handler) {
+    core_->readLater(
+        [application = core_->options.applicationIdentifier,
+         key = std::move(key)](VSStoreReader& reader) -> std::optional<VSValue> {
+            auto row = reader.database().use("SELECT value FROM defaults WHERE application = ? AND key = ?");
+            if (!row.bindText(1, application).bindText(2, key).step()) return std::nullopt;
+            auto value = VSValue::fromSerialized(row.text(0));
+            if (!value)
+                throw VSDatabaseFailure(
+                    {VSErrorCode::Corrupt, "the default value " + key + " cannot be read"});
+            return value;
+        },
+        std::move(handler));
+}
+
+VSResult<int> VSHealthStoreConnection::characteristic(VSTypeCode code) {
+    return core_->readers.read([code](VSStoreReader& reader) {
+        return static_cast<int>(
+            VSReadCharacteristic(reader.database(), VSObjectType::dataTypeWithCode(code)).value_or(0));
+    });
+}
+
+void VSHealthStoreConnection::writeCharacteristic(const VSObjectType* type, std::optional<int64_t> value,
+                                                  Completion completion) {
+    core_->write(
+        [type, value](VSStoreWriter& writer) {
+            VSWriteCharacteristic(writer, type, value);
+            return VSStatus();
+        },
+        std::move(completion));
+}
+
+void VSHealthStoreConnection::deleteMedicalIDData(Completion) {}
