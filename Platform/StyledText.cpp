@@ -274,6 +274,12 @@ QString StyledText::plainText() const {
     return result;
 }
 
+QString StyledText::spokenText() const {
+    QString result;
+    for (const auto& run : runs_) result += run.text.isEmpty() ? QStringLiteral(" ") : run.text;
+    return result.simplified();
+}
+
 StyledText& StyledText::operator+=(const StyledText& other) {
     const std::vector<StyledRun> added = other.runs_;  // may be this one
     runs_.insert(runs_.end(), added.begin(), added.end());

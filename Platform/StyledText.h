@@ -40,6 +40,8 @@ class StyledText {
     bool isEmpty() const { return runs_.empty(); }
     /// The characters alone: images and spaces leave nothing.
     QString plainText() const;
+    /// The characters as a screen reader says them: what is apart stays apart.
+    QString spokenText() const;
     StyledText& operator+=(const StyledText& other);
     friend StyledText operator+(StyledText a, const StyledText& b) { return a += b; }
     friend bool operator==(const StyledText&, const StyledText&) = default;

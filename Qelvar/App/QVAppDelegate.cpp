@@ -154,3 +154,7 @@ QColor QVAppDelegate::keyColor() const {
 bool QVAppDelegate::isRightToLeft() const {
     return platform::isRightToLeft();
 }
+
+QString QVAppDelegate::tabBarName() const {
+    return platform::localized("TAB_BAR");
+}

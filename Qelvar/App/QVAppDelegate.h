@@ -20,6 +20,7 @@ class QVAppDelegate : public QObject {
     Q_PROPERTY(QVImportController* importController READ importController CONSTANT)
     Q_PROPERTY(QColor keyColor READ keyColor CONSTANT)
     Q_PROPERTY(bool rightToLeft READ isRightToLeft NOTIFY localeChanged)
+    Q_PROPERTY(QString tabBarName READ tabBarName NOTIFY localeChanged)
  public:
     /// `medicalIDIsSupported`: whether this device can show a Medical ID; without it there is no such tab.
     explicit QVAppDelegate(std::shared_ptr<VSHealthStore> healthStore, bool medicalIDIsSupported = true);
@@ -45,6 +46,8 @@ class QVAppDelegate : public QObject {
     QVImportController* importController() const { return importController_.get(); }
     QColor keyColor() const;
     bool isRightToLeft() const;
+    /// What a screen reader calls the row of tabs.
+    QString tabBarName() const;
 
  signals:
     void localeChanged();

@@ -1,30 +1,20 @@
 import QtQuick
-import QtQuick.Templates as T
 import Qelvar.Items
 
 // Progress and result of an import.
-T.Popup {
+SystemSheet {
     id: sheet
     property var controller: null
     readonly property bool running: controller.state === QVImportController.Running || controller.state === QVImportController.Cancelling
-    parent: T.Overlay.overlay
-    x: Math.round((parent.width - width) / 2)
-    y: Math.round((parent.height - height) / 2)
-    width: Math.min(parent.width - 32, 420)
-    height: Math.min(implicitHeight, parent.height - 48)
+    title: controller.title
     implicitHeight: body.implicitHeight + 2
-    modal: true
-    focus: true
-    closePolicy: T.Popup.NoAutoClose
     visible: controller.state !== QVImportController.Idle
-    T.Overlay.modal: Rectangle { color: "#66000000" }
-    background: Rectangle { color: SystemStyle.background; radius: 12 }
     onOpened: button.forceActiveFocus()
 
-    contentItem: Item {
-        implicitHeight: body.implicitHeight
-        Accessible.role: Accessible.Dialog
-        Accessible.name: sheet.controller.title
+    FocusScope {
+        width: parent.width
+        height: body.implicitHeight
+        focus: true
         Keys.onEscapePressed: sheet.controller.pressButton()
 
         Column {

@@ -60,6 +60,7 @@ FocusScope {
         height: SystemStyle.tabBarHeight
         color: SystemStyle.bar
         Accessible.role: Accessible.PageTabList
+        Accessible.name: root.app.tabBarName
         Rectangle { width: parent.width; height: SystemStyle.pixel; color: SystemStyle.hairline }
         Row {
             anchors.fill: parent
@@ -163,6 +164,12 @@ FocusScope {
     Connections {
         target: root.app
         function onImportRequested() { fileDialog.open() }
+    }
+    Announcement {
+        width: 1
+        height: 1
+        Accessible.role: Accessible.Notification
+        Accessible.name: text
     }
     Loader { // the sheet of an import: made for the first one
         id: importSheet

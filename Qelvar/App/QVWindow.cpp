@@ -5,8 +5,10 @@
 #include <QQuickItem>
 #include <mutex>
 
+#include "Platform/Announcement.h"
 #include "Platform/IconItem.h"
 #include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
+#include "Qelvar/Dashboard/QVDraggingView.h"
 
 namespace {
 
@@ -19,6 +21,8 @@ void registerTypes() {
     std::call_once(once, [] {
         qmlRegisterType<platform::IconItem>("Qelvar.Items", 1, 0, "Icon");
         qmlRegisterType<QVDashboardTableViewCell>("Qelvar.Items", 1, 0, "QVDashboardTableViewCell");
+        qmlRegisterType<QVDraggingView>("Qelvar.Items", 1, 0, "QVDraggingView");
+        qmlRegisterType<platform::AnnouncementItem>("Qelvar.Items", 1, 0, "Announcement");
         qmlRegisterUncreatableType<QVImportController>("Qelvar.Items", 1, 0, "QVImportController",
                                                        QStringLiteral("made by the application"));
     });

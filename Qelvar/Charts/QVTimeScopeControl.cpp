@@ -5,9 +5,19 @@
 
 #include "Platform/Localization.h"
 
-QVTimeScopeControl::QVTimeScopeControl(std::vector<QVTimeScope> timeScopes)
-    : timeScopes_(std::move(timeScopes)) {
+QVTimeScopeControl::QVTimeScopeControl(std::vector<QVTimeScope> timeScopes, Look look)
+    : timeScopes_(std::move(timeScopes)), look_(look) {
     assert(!timeScopes_.empty());
+}
+
+std::unique_ptr<QVTimeScopeControl> QVTimeScopeControl::controlWithStyle(
+    int style, std::vector<QVTimeScope> timeScopes) {
+    return std::make_unique<QVTimeScopeControl>(std::move(timeScopes), style == 1 ? Look::Pill : Look::Bar);
+}
+
+QUrl QVTimeScopeControl::view() const {
+    return QUrl(look_ == Look::Pill ? QStringLiteral("qrc:/Qelvar/QVTimeScopeControlPill.qml")
+                                    : QStringLiteral("qrc:/Qelvar/QVTimeScopeControlBar.qml"));
 }
 
 QStringList QVTimeScopeControl::segments() const {
@@ -36,4 +46,10 @@ void QVTimeScopeControl::select(int index) {
     if (index == selectedIndex_) return;
     selectedIndex_ = index;
     emit selectedIndexChanged();
+    emit accessibleNameChanged();
+}
+
+void QVTimeScopeControl::updateTitles() {
+    emit segmentsChanged();
+    emit accessibleNameChanged();
 }

@@ -1,29 +1,17 @@
 import QtQuick
-import QtQuick.Templates as T
 
-// The bar look of the time scope control: one segment for each scope. One stop of the Tab key; the arrow keys move the
-// selection.
-FocusScope {
+// The bar look of the time scope control: one segment for each scope.
+QVTimeScopeControlBase {
     id: root
-    property var control: null
-    readonly property int count: repeater.count
-    activeFocusOnTab: true
-    Accessible.role: Accessible.PageTabList
-    Accessible.name: control ? control.accessibleName : ""
+    implicitHeight: Math.max(44, frame.height + 16)
 
-    function move(step) {
-        const index = control.selectedIndex + step
-        if (index >= 0 && index < count) control.pick(index)
-    }
-    Keys.onLeftPressed: move(segments.LayoutMirroring.enabled ? 1 : -1)
-    Keys.onRightPressed: move(segments.LayoutMirroring.enabled ? -1 : 1)
-
+    FontMetrics { id: metrics; font.pixelSize: SystemStyle.captionSize }
     Rectangle {
         id: frame
         anchors.centerIn: parent
         anchors.verticalCenterOffset: -1
         width: parent.width - 2 * 8
-        height: 28
+        height: Math.max(28, metrics.height + 8)
         radius: 4
         color: SystemStyle.bar
         border.width: 1
@@ -35,25 +23,28 @@ FocusScope {
         Repeater {
             id: repeater
             model: root.control ? root.control.segments : []
-            T.AbstractButton {
+            MouseArea {
                 id: segment
                 required property string modelData
                 required property int index
-                readonly property bool isSelected: root.control.selectedIndex === index
+                readonly property bool checked: root.control.selectedIndex === index
+                readonly property bool atLeft: root.isMirrored ? index === repeater.count - 1 : index === 0
+                readonly property bool atRight: root.isMirrored ? index === 0 : index === repeater.count - 1
                 width: segments.width / repeater.count
                 height: segments.height
-                text: modelData
-                focusPolicy: Qt.NoFocus
                 onClicked: root.control.pick(index)
                 Accessible.role: Accessible.RadioButton
-                Accessible.name: text
+                Accessible.name: modelData
                 Accessible.checkable: true
-                Accessible.checked: isSelected
-                background: Rectangle {
-                    color: segment.isSelected ? SystemStyle.tint : segment.down ? Qt.alpha(SystemStyle.tint, 0.15) : "transparent"
+                Accessible.checked: checked
+                Accessible.onPressAction: root.control.pick(index)
+                Accessible.onToggleAction: root.control.pick(index)
+                Rectangle {
+                    anchors.fill: parent
+                    color: segment.checked ? SystemStyle.tint : segment.pressed ? Qt.alpha(SystemStyle.tint, 0.15) : "transparent"
                     radius: frame.radius
                     Rectangle { // inner sides are straight
-                        visible: segment.isSelected
+                        visible: segment.checked
                         color: parent.color
                         anchors.fill: parent
                         anchors.leftMargin: segment.atLeft ? 4 : 0
@@ -68,13 +59,13 @@ FocusScope {
                         x: parent.width - 0.5
                     }
                 }
-                readonly property bool isMirrored: segments.LayoutMirroring.enabled
-                readonly property bool atLeft: isMirrored ? index === repeater.count - 1 : index === 0
-                readonly property bool atRight: isMirrored ? index === 0 : index === repeater.count - 1
-                contentItem: Text {
-                    text: segment.text
-                    color: segment.isSelected ? "white" : SystemStyle.tint
-                    font.pixelSize: 13
+                Text {
+                    anchors.fill: parent
+                    text: segment.modelData
+                    color: segment.checked ? "white" : SystemStyle.tint
+                    font.pixelSize: SystemStyle.captionSize
+                    fontSizeMode: Text.HorizontalFit
+                    minimumPixelSize: 10
                     horizontalAlignment: Text.AlignHCenter
                     verticalAlignment: Text.AlignVCenter
                     elide: Text.ElideRight
@@ -82,9 +73,5 @@ FocusScope {
             }
         }
     }
-    FocusRing { anchors.fill: frame; shown: root.activeFocus && root.Window.window && root.keyboard; gap: 3 }
-    // A pointer's press gives the focus too, which needs no ring.
-    property bool keyboard: false
-    onActiveFocusChanged: if (!activeFocus) keyboard = false
-    Keys.onReleased: keyboard = true
+    FocusRing { anchors.fill: frame; shown: root.showsFocus; gap: 3 }
 }

@@ -213,9 +213,26 @@ void QVDashboardTableViewCell::refreshTexts() {
 
 QString QVDashboardTableViewCell::accessibleValue() const {
     QStringList parts;
-    for (const QString& part : {valueText(), secondaryText(), lastUpdated_})
+    for (const QString& part : {value_.spokenText(), average_.spokenText(), lastUpdated_})
         if (!part.isEmpty()) parts.append(part);
     return parts.join(QStringLiteral(", "));
+}
+
+void QVDashboardTableViewCell::describeChart() {
+    QString description;
+    if (chartItem_ && timeScope_ && showsItsData()) {
+        const QString span = QVTimeScopeDisplayName(*timeScope_);
+        const QString &minimum = chartBackground_->minimumText(), &maximum = chartBackground_->maximumText();
+        if (minimum.isEmpty() && maximum.isEmpty())
+            description = platform::localized("CHART_DESCRIPTION_EMPTY", {span});
+        else if (chartBackground_->labelsAreVisible())
+            description = platform::localized("CHART_DESCRIPTION_BOUNDS", {span, minimum, maximum});
+        else
+            description = platform::localized("CHART_DESCRIPTION", {span});
+    }
+    if (description == chartDescription_) return;
+    chartDescription_ = description;
+    emit chartDescriptionChanged();
 }
 
 double QVDashboardTableViewCell::screenScale() const {
@@ -279,10 +296,18 @@ void QVDashboardTableViewCell::paintTexts(QPainter& painter, const QVDashboardCe
 }
 
 QImage QVDashboardTableViewCell::render(double scale) {
+    return renderOn(Qt::white, scale);
+}
+
+QImage QVDashboardTableViewCell::renderCard() {
+    return renderOn(Qt::transparent, screenScale());
+}
+
+QImage QVDashboardTableViewCell::renderOn(const QColor& ground, double scale) {
     const QSize pixels(qCeil(width() * scale), qCeil(height() * scale));
     QImage image(pixels, QImage::Format_ARGB32_Premultiplied);
     image.setDevicePixelRatio(scale);
-    image.fill(Qt::white);
+    image.fill(ground);
     if (!chartItem_ || pixels.isEmpty()) return image;
     const QVDashboardCellLayout layout = cellLayout();
     QPainter painter(&image);
@@ -296,6 +321,7 @@ QImage QVDashboardTableViewCell::render(double scale) {
     chart_.paint(painter, layout.chart.topLeft());
     painter.restore();
     paintTexts(painter, layout);
+    describeChart();
     return image;
 }
 

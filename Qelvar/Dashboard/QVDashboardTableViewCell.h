@@ -26,6 +26,8 @@ class QVDashboardTableViewCell : public QQuickItem {
     /// What a screen reader says of it.
     Q_PROPERTY(QString accessibleName READ accessibleName NOTIFY contentChanged)
     Q_PROPERTY(QString accessibleValue READ accessibleValue NOTIFY contentChanged)
+    /// What the chart shows, in words.
+    Q_PROPERTY(QString chartDescription READ chartDescription NOTIFY chartDescriptionChanged)
  public:
     explicit QVDashboardTableViewCell(QQuickItem* parent = nullptr);
     ~QVDashboardTableViewCell() override;
@@ -45,6 +47,9 @@ class QVDashboardTableViewCell : public QQuickItem {
     /// None until the first one was set.
     std::optional<QVTimeScope> timeScope() const { return timeScope_; }
     void setTimeScope(QVTimeScope timeScope);
+    /// Nothing is seen of it: its row is the placeholder of what is dragged.
+    bool isContentHidden() const { return opacity() == 0; }
+    void setContentHidden(bool hidden) { setOpacity(hidden ? 0 : 1); }
     QVChart& chartView() { return chart_; }
     const QVDottedAverageBackgroundView& chartBackground() const { return *chartBackground_; }
 
@@ -54,11 +59,14 @@ class QVDashboardTableViewCell : public QQuickItem {
     QString lastUpdatedText() const { return lastUpdated_; }
     QString accessibleName() const { return title_; }
     QString accessibleValue() const;
+    QString chartDescription() const { return chartDescription_; }
 
     /// Where everything stands at the present width.
     QVDashboardCellLayout cellLayout() const;
     /// The card as it looks now, `scale` pixels a point, on white.
     QImage render(double scale);
+    /// The card alone, without the ground beneath and beside it, at the screen's scale.
+    QImage renderCard();
     /// Whether the item has loaded all that the card shows and the chart is drawn from it.
     bool showsItsData() const;
     /// The same, and nothing is moving any more.
@@ -71,6 +79,7 @@ class QVDashboardTableViewCell : public QQuickItem {
     void screenChanged();
     void rowChanged();
     void contentChanged();
+    void chartDescriptionChanged();
 
  protected:
     void componentComplete() override;
@@ -86,10 +95,12 @@ class QVDashboardTableViewCell : public QQuickItem {
     void prepare();
     void rebuildTimeBasedContent();
     void refreshTexts();
+    void describeChart();
     void contentLooksDifferent();
     void animateFrames();
     double screenScale() const;
     QVDashboardCellContent layoutContent() const;
+    QImage renderOn(const QColor& ground, double scale);
     void paintTexts(QPainter& painter, const QVDashboardCellLayout& layout) const;
 
     QVDashboardViewController* screen_ = nullptr;
@@ -100,7 +111,7 @@ class QVDashboardTableViewCell : public QQuickItem {
     QString categoryIconName_, averageIconName_;
     platform::StyledText value_;
     platform::StyledText average_;
-    QString title_, lastUpdated_;
+    QString title_, lastUpdated_, chartDescription_;
 
     std::shared_ptr<QVDottedAverageBackgroundView> chartBackground_;
     std::weak_ptr<QVDateCache> dateCache_;

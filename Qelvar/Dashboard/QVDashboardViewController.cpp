@@ -3,18 +3,34 @@
 #include <algorithm>
 #include <set>
 
+#include "Platform/Announcement.h"
 #include "Platform/Localization.h"
 #include "Platform/NavigationStack.h"
 #include "Platform/SystemEvents.h"
 #include "Qelvar/Controllers/QVUserActivityManager.h"
 #include "Qelvar/Dashboard/QVDashboardTable.h"
 #include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
+#include "Qelvar/Formatters/QVNumberFormatters.h"
 
 namespace {
+
+constexpr double kDraggingViewOpacity = 0.8;
 
 QVTimeScopeControl* makeControl() {
     return new QVTimeScopeControl(
         {QVTimeScope::Day, QVTimeScope::Week, QVTimeScope::Month, QVTimeScope::Year});
+}
+
+template <typename Values, typename Value>
+bool contains(const Values& values, const Value& value) {
+    return std::find(values.begin(), values.end(), value) != values.end();
+}
+
+QVDashboardViewController::Groups withoutRepetition(const QVDashboardViewController::Groups& groups) {
+    QVDashboardViewController::Groups result;
+    for (const VSDataUnitGroup* group : groups)
+        if (!contains(result, group)) result.push_back(group);
+    return result;
 }
 
 bool showsDataType(const VSDataUnitGroup& group, const VSObjectType* dataType) {
@@ -25,12 +41,20 @@ bool showsDataType(const VSDataUnitGroup& group, const VSObjectType* dataType) {
 }  // namespace
 
 struct QVDashboardViewController::Observer final : QVDashboardDataUnitGroupsObserver,
-                                                   QVDataProviderOrderObserver {
+                                                   QVDataProviderOrderObserver,
+                                                   QVReorderableTableViewControllerDelegate {
     explicit Observer(QVDashboardViewController& owner) : screen(owner) {}
     void dashboardDataUnitGroupsUpdated(const Groups&) override { screen.reloadDataUnitGroups(); }
     void dataProviderOrderUpdated(const std::vector<VSSource>&, const VSObjectType* dataType) override {
         screen.dataProviderOrderUpdated(dataType);
     }
+    void reorderingDidBegin(QVReorderableTableViewController&, int row) override {
+        screen.reorderingDidBegin(row);
+    }
+    void rowDidMove(QVReorderableTableViewController&, int fromRow, int toRow) override {
+        screen.rowDidMove(fromRow, toRow);
+    }
+    void reorderingDidFinish(QVReorderableTableViewController&) override { screen.reorderingDidFinish(); }
     QVDashboardViewController& screen;
 };
 
@@ -42,6 +66,8 @@ QVDashboardViewController::QVDashboardViewController(std::shared_ptr<QVControlle
       table_(std::make_unique<QVDashboardTable>()),
       observer_(std::make_shared<Observer>(*this)) {
     controllerManager_->dataProviderOrderController().addObserver(observer_);
+    setDelegate(observer_);
+    setDraggingViewOpacity(kDraggingViewOpacity);
     setTitle(platform::localized("DASHBOARD"));
     connect(&platform::SystemEvents::shared(), &platform::SystemEvents::localeDidChange, this,
             &QVDashboardViewController::localeDidChange);
@@ -60,6 +86,14 @@ QAbstractItemModel* QVDashboardViewController::table() const {
     return table_.get();
 }
 
+double QVDashboardViewController::rowHeight() const {
+    return QVDashboardTableViewCell::preferredCellHeight();
+}
+
+int QVDashboardViewController::numberOfRows() const {
+    return table_->rowCount();
+}
+
 QString QVDashboardViewController::emptyStateTitle() const {
     return platform::localized("DASHBOARD_EMPTY");
 }
@@ -68,6 +102,10 @@ QString QVDashboardViewController::emptyStateHelp() const {
 }
 QString QVDashboardViewController::importTitle() const {
     return platform::localized("IMPORT_ACTION");
+}
+
+QString QVDashboardViewController::moveHelp() const {
+    return platform::localized("CARD_MOVE_HELP");
 }
 
 double QVDashboardViewController::emptyStateHelpMargin(double screenWidth) {
@@ -84,12 +122,39 @@ void QVDashboardViewController::willAppear() {
 }
 
 void QVDashboardViewController::willDisappear() {
+    finishReordering();
     controllerManager_->dashboardDataUnitGroupsController().removeObserver(observer_.get());
 }
 
 void QVDashboardViewController::reloadDataUnitGroups() {
+    if (!placeholderRow_)
+        return takeDataUnitGroups(
+            controllerManager_->dashboardDataUnitGroupsController().dataUnitGroupsForDashboard());
+    // The list changed under a drag: what is in it comes from the change, the order stays the user's.
+    const Groups now = controllerManager_->dashboardDataUnitGroupsController().dataUnitGroupsForDashboard();
+    Groups groups = table_->groups();
+    std::erase_if(groups, [&now](const VSDataUnitGroup* group) { return !contains(now, group); });
+    groups.insert(groups.end(), now.begin(), now.end());
+    takeDataUnitGroupsDuringDrag(contains(now, draggedGroup()) ? std::move(groups) : now);
+}
+
+const VSDataUnitGroup* QVDashboardViewController::draggedGroup() const {
+    return table_->groups()[static_cast<size_t>(*placeholderRow_)];
+}
+
+void QVDashboardViewController::takeDataUnitGroupsDuringDrag(Groups groups) {
+    const VSDataUnitGroup* dragged = draggedGroup();
+    groups = withoutRepetition(groups);
+    const auto found = std::find(groups.begin(), groups.end(), dragged);
+    placeholderRow_.reset();
+    if (found != groups.end()) placeholderRow_ = static_cast<int>(found - groups.begin());
+    takeDataUnitGroups(std::move(groups));
+    rowsDidChange(placeholderRow_);
+}
+
+void QVDashboardViewController::takeDataUnitGroups(Groups groups) {
     QVControllerManager& manager = *controllerManager_;
-    dashboardDataUnitGroups_ = manager.dashboardDataUnitGroupsController().dataUnitGroupsForDashboard();
+    dashboardDataUnitGroups_ = std::move(groups);
     std::set<int> ids;
     for (const VSDataUnitGroup* group : dashboardDataUnitGroups_) ids.insert(group->dataUnitGroupID());
     std::erase_if(dashboardChartItems_, [&ids](const auto& entry) { return !ids.contains(entry.first); });
@@ -103,6 +168,60 @@ void QVDashboardViewController::reloadDataUnitGroups() {
     updateEmptyState();
     table_->setGroups(dashboardDataUnitGroups_);
     reloadTable();
+    applyScrollOffset();
+}
+
+// The order of the cards
+
+void QVDashboardViewController::reorderingDidBegin(int row) {
+    placeholderRow_ = row;
+    reloadTable();
+}
+
+void QVDashboardViewController::rowDidMove(int fromRow, int toRow) {
+    Groups groups = table_->groups();
+    std::swap(groups[static_cast<size_t>(fromRow)], groups[static_cast<size_t>(toRow)]);
+    if (placeholderRow_ == fromRow)
+        placeholderRow_ = toRow;
+    else if (placeholderRow_ == toRow)
+        placeholderRow_ = fromRow;
+    dashboardDataUnitGroups_ = std::move(groups);
+    table_->setGroups(dashboardDataUnitGroups_);
+    reloadTable();
+}
+
+void QVDashboardViewController::reorderingDidFinish() {
+    placeholderRow_.reset();
+    auto& controller = controllerManager_->dashboardDataUnitGroupsController();
+    // A card that was put back where it was changes nothing that is stored.
+    if (dashboardDataUnitGroups_ != controller.dataUnitGroupsForDashboard())
+        controller.setDataUnitGroupsForDashboard(dashboardDataUnitGroups_);
+    reloadTable();
+}
+
+void QVDashboardViewController::restoreRows() {
+    takeDataUnitGroupsDuringDrag(
+        controllerManager_->dashboardDataUnitGroupsController().dataUnitGroupsForDashboard());
+}
+
+QImage QVDashboardViewController::snapshotOfRow(int row) {
+    const int id = table_->groups()[static_cast<size_t>(row)]->dataUnitGroupID();
+    const auto& item = dashboardChartItems_.at(id);
+    const auto found = std::find_if(cells_.begin(), cells_.end(),
+                                    [&item](const auto& cell) { return cell && cell->chartItem() == item; });
+    return found == cells_.end() ? QImage() : (*found)->renderCard();
+}
+
+void QVDashboardViewController::moveCard(int row, int places) {
+    if (row < 0 || row >= numberOfRows() || isDragging()) return;
+    const QString name = table_->groups()[static_cast<size_t>(row)]->displayName();
+    const bool moved = moveRow(row, places);
+    const auto number = [](int value) {
+        return QVNumberFormatterWithFractionDigits(0)->stringFromNumber(value);
+    };
+    platform::announce(
+        platform::localized(moved ? "CARD_MOVED" : "CARD_STAYS",
+                            {name, number((moved ? row + places : row) + 1), number(numberOfRows())}));
 }
 
 void QVDashboardViewController::updateEmptyState() {
@@ -121,6 +240,9 @@ void QVDashboardViewController::reloadTable() {
 void QVDashboardViewController::prepareCell(QVDashboardTableViewCell& cell, int row) {
     if (row < 0 || row >= static_cast<int>(table_->groups().size())) return;
     const auto& item = dashboardChartItems_.at(table_->groups()[static_cast<size_t>(row)]->dataUnitGroupID());
+    std::erase_if(cells_, [&cell](const auto& known) { return !known || known == &cell; });
+    cells_.emplace_back(&cell);
+    cell.setContentHidden(row == placeholderRow_);
     // The cache is a member of the manager and lives as long.
     cell.setDateCache(std::shared_ptr<QVDateCache>(controllerManager_, &controllerManager_->dateCache()));
     cell.setTimeScope(controllerManager_->selectedTimeScopeController().selectedTimeScope());
@@ -131,6 +253,7 @@ void QVDashboardViewController::prepareCell(QVDashboardTableViewCell& cell, int 
 void QVDashboardViewController::selectRow(int row) {
     if (row < 0 || row >= static_cast<int>(table_->groups().size()) || !detailScreen_ || !navigationStack())
         return;
+    if (isDragging()) return;
     navigationStack()->push(detailScreen_(table_->groups()[static_cast<size_t>(row)]));
 }
 
@@ -157,4 +280,32 @@ void QVDashboardViewController::dataProviderOrderUpdated(const VSObjectType* dat
         changed = true;
     }
     if (changed) reloadTable();
+}
+
+// What a later session begins with
+
+void QVDashboardViewController::restoreTimeScope(QVTimeScope timeScope) {
+    if (!contains(timeScopeControl_->timeScopes(), timeScope)) return;
+    timeScopeControl_->setSelectedTimeScope(timeScope);
+    timeScopeDidChange();
+}
+
+double QVDashboardViewController::scrollOffset() const {
+    const QVTableGeometry geometry = tableGeometry();
+    return wantedScrollOffset_.value_or(geometry.restingOffset(geometry.contentOffset));
+}
+
+void QVDashboardViewController::restoreScrollOffset(double offset) {
+    wantedScrollOffset_ = offset;
+    applyScrollOffset();
+}
+
+void QVDashboardViewController::applyScrollOffset() {
+    const QVTableGeometry geometry = tableGeometry();
+    if (!wantedScrollOffset_ || isDragging() || geometry.visibleHeight <= 0 ||
+        !controllerManager_->dashboardDataUnitGroupsController().hasLoadedDashboard())
+        return;
+    const double offset = geometry.restingOffset(*wantedScrollOffset_);
+    wantedScrollOffset_.reset();
+    scrollTo(offset);
 }

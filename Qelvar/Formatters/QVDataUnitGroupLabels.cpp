@@ -14,7 +14,7 @@ namespace {
 struct EnumeratedGroup {
     int groupID;
     std::vector<std::pair<int, const char*>> labelKeys;
-    std::vector<int> stackingOrder;  // from the bottom to the top
+    std::vector<int> stackingOrder;  // rows from the top
 };
 
 const EnumeratedGroup* enumeratedGroup(const VSDataUnitGroup* group) {
@@ -75,6 +75,11 @@ int qv_stackedChartSectionsCount(const VSDataUnitGroup* group) {
         return 1;
     const auto* known = enumeratedGroup(group);
     return known ? static_cast<int>(known->labelKeys.size()) : 1;
+}
+
+bool qv_interactiveChartsDataSourceDependsOnTimeScope(const VSDataUnitGroup* group) {
+    const int id = group->dataUnitGroupID();
+    return id == VSGroupID::SleepAnalysis || id == VSGroupID::Workouts || id == VSGroupID::StandHours;
 }
 
 QString qv_dashboardChartBoundStringFromValue(const VSDataUnitGroup* group, double value,

@@ -52,8 +52,10 @@ std::array<StyledText, 3> QVDataUnitValueFormatter::quantityParts(double value,
     const VSDataUnit* dataUnit = dataUnitGroup->anyDataUnit();
     const QString text =
         QVStringFromNumberInDisplayRange(value, dataUnit, unitController, true, numberFormatter());
-    return QVValueAndUnitParts(text, unitController.displayNameForDataUnit(dataUnit, value), valueFont,
-                               unitFont, unitSpacing);
+    // A bare number has no unit to stand away from.
+    const QString unit = unitController.displayNameForDataUnit(dataUnit, value);
+    return QVValueAndUnitParts(text, unit.isEmpty() ? std::nullopt : std::optional(unit), valueFont, unitFont,
+                               unitSpacing);
 }
 
 StyledText QVQuantityDataUnitValueFormatter::attributedStringFromValue(double value,

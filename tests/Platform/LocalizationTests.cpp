@@ -37,6 +37,12 @@ TEST(Localization, TextOfTheUsersLanguageElseEnglishElseTheKey) {
         EXPECT_TRUE(platform::isRightToLeft());
     }
     {
+        test::FixedEnvironment hindi("2020-03-31T20:00", "Asia/Kolkata", "hi_IN");
+        EXPECT_EQ(localized("DAY"), QString::fromUtf8("दिन"));
+        EXPECT_EQ(localized(englishOnlyKey), englishText) << "key by key";
+        EXPECT_FALSE(platform::isRightToLeft());
+    }
+    {
         // Without a table the texts are English, and so is their direction.
         test::FixedEnvironment hebrew("2020-03-31T20:00", "Asia/Jerusalem", "he_IL");
         EXPECT_EQ(localized("DAY"), "Day");
@@ -62,6 +68,9 @@ TEST(Localization, PluralsFollowTheLanguage) {
     EXPECT_EQ(platform::localizedPlural("UNIT_NAME_STEPS", 2), QString::fromUtf8("خطوتان"));
     EXPECT_EQ(platform::localizedPlural("UNIT_NAME_STEPS", 5), QString::fromUtf8("خطوات"));
     EXPECT_EQ(platform::localizedPlural("UNIT_NAME_STEPS", 4711), QString::fromUtf8("خطوة"));
+    test::FixedEnvironment hindi("2020-03-31T20:00", "Asia/Kolkata", "hi_IN");
+    EXPECT_EQ(platform::localizedPlural("UNIT_NAME_FLOORS", 1), QString::fromUtf8("मंज़िल"));
+    EXPECT_EQ(platform::localizedPlural("UNIT_NAME_FLOORS", 12), QString::fromUtf8("मंज़िलें"));
 }
 
 TEST(Localization, LoadingSetsDirectionAndTextIdsOfTheApplication) {
@@ -118,19 +127,33 @@ QSet<QString> placeholders(const QStringList& forms) {
     return result;
 }
 
-TEST(Localization, EveryLanguageFillsThePlaceholdersOfTheEnglishText) {
+bool isLongText(const QString& key) {
+    return key.endsWith("_SUMMARY") || key.endsWith("_KEYWORDS") || key.endsWith("_CAUTION");
+}
+
+// All but the long texts are in every language, with the placeholders of the English text.
+TEST(Localization, EveryLanguageHasEveryText) {
     const auto english = fragments(QStringLiteral("en"));
     ASSERT_FALSE(english.empty());
-    for (const auto* language : {"ar", "de"}) {
-        for (const auto& [key, row] : fragments(QString::fromLatin1(language))) {
+    const QStringList languages = QDir(QStringLiteral(QELVAR_SOURCE_DIR "/Resources/translations"))
+                                      .entryList(QDir::Dirs | QDir::NoDotAndDotDot);
+    for (const char* language : {"ar", "de", "en", "hi"})
+        EXPECT_TRUE(languages.contains(language)) << language;
+    for (const QString& language : languages) {
+        const auto own = fragments(language);
+        for (const auto& [key, row] : english)
+            EXPECT_TRUE(own.contains(key) || isLongText(key))
+                << language.toStdString() << " has no text for " << key.toStdString();
+        for (const auto& [key, row] : own) {
+            const std::string place = row.place.toStdString();
+            for (const QString& form : row.forms) EXPECT_FALSE(form.trimmed().isEmpty()) << place;
             const auto source = english.find(key);
             if (source == english.end()) {
-                ADD_FAILURE() << row.place.toStdString() << ": " << key.toStdString()
-                              << " is no key of the English tables";
+                ADD_FAILURE() << place << ": " << key.toStdString() << " is no key of the English tables";
                 continue;
             }
-            EXPECT_EQ(placeholders(row.forms), placeholders(source->second.forms)) << row.place.toStdString();
-            EXPECT_EQ(row.forms.size() > 1, source->second.forms.size() > 1) << row.place.toStdString();
+            EXPECT_EQ(placeholders(row.forms), placeholders(source->second.forms)) << place;
+            EXPECT_EQ(row.forms.size() > 1, source->second.forms.size() > 1) << place;
         }
     }
 }

@@ -68,6 +68,7 @@ TEST(StyledText, PlainTextLeavesImagesAndSpacesOut) {
     const auto text = StyledText("72") + StyledText::spacer(2) + StyledText("bpm") + StyledText::spacer(0) +
                       StyledText::withImage(redSquare(8), 3);
     EXPECT_EQ(text.plainText(), "72bpm");
+    EXPECT_EQ(text.spokenText(), "72 bpm");
     EXPECT_EQ(text.runs().size(), 4u);
     EXPECT_TRUE(StyledText("").isEmpty());
     EXPECT_TRUE(StyledText::withImage({}, 1).isEmpty());

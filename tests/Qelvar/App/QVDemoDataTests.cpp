@@ -5,6 +5,7 @@
 #include <fstream>
 #include <iterator>
 #include <numeric>
+#include <set>
 
 #include "Platform/PropertyList.h"
 #include "QtTestSupport.h"
@@ -154,6 +155,33 @@ TEST_F(DemoSamples, ComeInBatches) {
     EXPECT_EQ(last, (std::vector<bool>{false, false, true}));
 }
 
+TEST_F(DemoSamples, AReadingAndItsValuesAreInOneBatch) {
+    VSValue::Array entries;
+    for (int i = 0; i < 50; ++i) {
+        for (const VSTypeCode code :
+             {VSCode::StepCount, VSCode::BloodPressureSystolic, VSCode::BloodPressureDiastolic})
+            entries.emplace_back(entry(code, 100, i));
+        entries.emplace_back(entry("VSCorrelationTypeIdentifierBloodPressure", 0, i));
+    }
+    for (const size_t batchSize : {1u, 2u, 3u, 5u, 7u, 1000u}) {
+        size_t objects = 0;
+        QVBuildDemoSamples(entries, date("2020-03-31"),
+                           {{type(VSCode::StepCount), VSUnit::fromString("count")},
+                            {type(VSCode::BloodPressureSystolic), VSUnit::fromString("mmHg")},
+                            {type(VSCode::BloodPressureDiastolic), VSUnit::fromString("mmHg")}},
+                           batchSize, [&](const std::vector<VSSamplePtr>& batch, bool) {
+                               const std::set<VSSamplePtr> together(batch.begin(), batch.end());
+                               for (const auto& sample : batch) {
+                                   const auto* reading = dynamic_cast<const VSCorrelation*>(sample.get());
+                                   for (size_t i = 0; reading && i < reading->objects().size(); ++i)
+                                       EXPECT_TRUE(together.contains(reading->objects()[i])) << batchSize;
+                               }
+                               objects += batch.size();
+                           });
+        EXPECT_EQ(objects, 200u) << batchSize;
+    }
+}
+
 class DemoReset : public testing::Test {
  protected:
     DemoReset() {
@@ -240,7 +268,9 @@ TEST_F(DemoReset, HappensOnceADayAndVariant) {
 }
 
 TEST_F(DemoReset, AFailedDeletionIsTriedAgain) {
-    auto readOnly = VSHealthStore::open(folder_.path() / "store", {.readOnly = true});
+    VSHealthStore::Options options;
+    options.readOnly = true;
+    auto readOnly = VSHealthStore::open(folder_.path() / "store", options);
     ASSERT_TRUE(readOnly.ok());
     const auto previous = VSSetLogSink([](VSLogLevel, std::string_view) {});
     {

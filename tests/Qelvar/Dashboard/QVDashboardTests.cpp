@@ -214,13 +214,17 @@ TEST_F(DashboardTest, ACardShowsWhatTheStoreHolds) {
     EXPECT_TRUE(cell->lastUpdatedText().contains("8:30")) << cell->lastUpdatedText().toStdString();
     EXPECT_TRUE(cell->secondaryText().contains("64") && cell->secondaryText().contains("72"))
         << cell->secondaryText().toStdString();
-    EXPECT_TRUE(cell->accessibleValue().contains(cell->valueText()) &&
-                cell->accessibleValue().contains(cell->lastUpdatedText()));
+    EXPECT_EQ(cell->accessibleValue(), "72 bpm, Min: 64 Max: 72, " + cell->lastUpdatedText())
+        << "what stands apart is said apart";
+    EXPECT_TRUE(cell->chartDescription().startsWith("Chart: Week, from "))
+        << cell->chartDescription().toStdString();
+    EXPECT_TRUE(cell->chartDescription().endsWith("to " + cell->chartBackground().maximumText()));
 
     auto empty = card(*screen, 0);
     ASSERT_TRUE(settle(*empty));
     EXPECT_EQ(empty->valueText(), platform::localized("NO_DATA"));
     EXPECT_EQ(empty->lastUpdatedText(), "");
+    EXPECT_EQ(empty->chartDescription(), "Chart: Week, no data");
 }
 
 TEST_F(DashboardTest, ACardFollowsTheStore) {

@@ -183,6 +183,9 @@ TEST_F(QVNumberFormattersTest, EveryStackedValueHasALabelAndEveryLabelItsPlace) 
             for (const auto& [value, label] : labels) values.push_back(value);
             EXPECT_EQ(order, values) << type->displayName().toStdString();
         }
+        const int id = type->dataUnitGroupID();
+        EXPECT_EQ(qv_interactiveChartsDataSourceDependsOnTimeScope(type), id == 58 || id == 72 || id == 75)
+            << id;
         const bool oneLine = type->chartingRules().chartStyleForTimeScope(1) == VSChartStyle::CenteredLine;
         EXPECT_EQ(qv_stackedChartSectionsCount(type),
                   oneLine || labels.empty() ? 1 : static_cast<int>(labels.size()));
