@@ -30,6 +30,8 @@ void QVPrintError(std::string_view message) {
 
 QVExitStatus QVFail(const VSError& error) {
     QVPrintError(error.message);
+    if (error.code == VSErrorCode::Corrupt)
+        QVPrintError("`qelvar salvage` may save what can be read; `qelvar salvage --help` tells how");
     return QVExitStatusForError(error);
 }
 

@@ -58,4 +58,4 @@ VSResult<VSDate> QVDateForArgument(std::string_view option, std::string_view tex
 VSResult<std::optional<VSDate>> QVDateOption(const QVCommandArguments& arguments, std::string_view option);
 
 extern const QVCommand QVImportCommand, QVStatisticsCommand, QVSamplesCommand, QVTypesCommand,
-    QVSourcesCommand, QVCheckCommand;
+    QVSourcesCommand, QVCheckCommand, QVBatchesCommand, QVUndoCommand, QVSalvageCommand;

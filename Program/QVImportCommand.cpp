@@ -4,10 +4,13 @@
 #include <atomic>
 #include <charconv>
 #include <cstdio>
+#include <cstdlib>
+#include <optional>
 
 #include "Program/QVCommand.h"
 #include "Program/QVTabOutput.h"
 #include "Qelvar/Import/QVRecordsImporter.h"
+#include "Vessa/VSStoreSchema.h"
 
 namespace {
 
@@ -28,7 +31,8 @@ void handleSignals() {
     sigaction(SIGTERM, &action, nullptr);
 }
 
-/// A line that is written over again and again on a terminal; a row each time when it was asked for.
+/// A line that is written over again and again on a terminal; a row each time when it was asked for. That an
+/// import waits for another program is told in any case.
 class ProgressLine {
  public:
     explicit ProgressLine(bool rows) : rows_(rows), line_(!rows && isatty(STDERR_FILENO)) {
@@ -37,8 +41,11 @@ class ProgressLine {
     ~ProgressLine() {
         if (line_) std::fputs("\r\033[K", stderr);
     }
-    bool isWanted() const { return rows_ || line_; }
     void show(const QVImportProgress& progress) const {
+        if (progress.isWaiting)
+            return QVPrintError(
+                "another program writes to the store; waiting until it has finished (Ctrl+C ends)");
+        if (!rows_ && !line_) return;
         const auto done = static_cast<unsigned long long>(progress.bytesDone),
                    total = static_cast<unsigned long long>(progress.bytesTotal);
         const auto records = static_cast<long long>(progress.records);
@@ -56,20 +63,23 @@ class ProgressLine {
     const bool line_;
 };
 
+void printReasons(const std::string& what, const std::map<std::string, int64_t>& reasons) {
+    std::string line;
+    for (const auto& [reason, count] : reasons)
+        line += (line.empty() ? what + ": " : "; ") + reason + " " + std::to_string(count);
+    if (!line.empty()) QVPrintError(line);
+}
+
 void printRefusals(const QVImportReport& report) {
     for (const auto& note : report.notes) QVPrintError(note);
     for (const auto& refusal : report.refusals) {
         QVPrintError(refusal.description());
         if (!refusal.excerpt.empty()) std::fprintf(stderr, "    %s\n", refusal.excerpt.c_str());
     }
-    if (report.refusalsByReason.empty()) return;
     if (report.refusalsNotListed() > 0)
         QVPrintError("and " + std::to_string(report.refusalsNotListed()) + " more");
-    std::string counts = "refused";
-    for (const auto& [reason, count] : report.refusalsByReason) {
-        counts += (counts.size() > 7 ? "; " : ": ") + reason + " " + std::to_string(count);
-    }
-    QVPrintError(counts);
+    printReasons("refused", report.refusalsByReason);
+    printReasons("parts refused without their record", report.partRefusalsByReason);
 }
 
 VSStatus printReport(const QVImportReport& report) {
@@ -98,6 +108,56 @@ VSResult<size_t> refusalsToList(const QVCommandArguments& arguments) {
     return number;
 }
 
+/// A folder for an empty store, as long as it is needed.
+class TrialFolder {
+ public:
+    TrialFolder() {
+        std::error_code error;
+        std::string pattern = (std::filesystem::temp_directory_path(error) / "qelvar-trial-XXXXXX").string();
+        if (!error && mkdtemp(pattern.data())) path_ = pattern;
+    }
+    ~TrialFolder() {
+        std::error_code ignored;
+        if (!path_.empty()) std::filesystem::remove_all(path_, ignored);
+    }
+    TrialFolder(const TrialFolder&) = delete;
+    TrialFolder& operator=(const TrialFolder&) = delete;
+    /// Empty: it could not be made.
+    const std::filesystem::path& path() const { return path_; }
+
+ private:
+    std::filesystem::path path_;
+};
+
+bool holdsStore(const std::filesystem::path& folder) {
+    std::error_code error;
+    for (const char* suffix : {"", "-wal"}) {
+        const auto status =
+            std::filesystem::status((folder / VSStoreSchema::fileName).string() + suffix, error);
+        // What cannot be told apart from a store is taken for one; then it fails to open.
+        if (status.type() != std::filesystem::file_type::not_found) return true;
+    }
+    return false;
+}
+
+using OpenedStore = VSResult<std::shared_ptr<VSHealthStore>>;
+
+/// Makes no store where there is none, and brings none to a newer form: that is not undone.
+OpenedStore openForTrial(const std::filesystem::path& folder, std::optional<TrialFolder>& trial) {
+    if (!holdsStore(folder)) {
+        trial.emplace();
+        if (trial->path().empty())
+            return VSError{VSErrorCode::NotAccessible, "a folder for the trial cannot be made; see TMPDIR"};
+        return VSHealthStore::open(trial->path());
+    }
+    VSHealthStore::Options options;
+    options.readOnly = true;
+    options.createIfMissing = false;
+    if (auto reading = VSHealthStore::open(folder, options); !reading) return reading.error();
+    options.readOnly = false;
+    return VSHealthStore::open(folder, options);
+}
+
 QVExitStatus run(const QVCommandContext& context) {
     const auto& words = context.arguments.words();
     if (words.empty()) return QVFailUsage("import", "import needs at least one file");
@@ -110,16 +170,18 @@ QVExitStatus run(const QVCommandContext& context) {
         if (!std::filesystem::exists(file, error))
             return QVFail({VSErrorCode::NotFound, file.string() + ": there is no such file"});
     }
-    auto store = VSHealthStore::open(context.storeFolder);
+    QVImportOptions options;
+    options.dryRun = context.arguments.has("dry-run");
+    std::optional<TrialFolder> trial;
+    auto store =
+        options.dryRun ? openForTrial(context.storeFolder, trial) : VSHealthStore::open(context.storeFolder);
     if (!store) return QVFail(store.error());
 
-    QVImportOptions options;
     options.cancel = &cancelled;
     options.listedRefusals = *listed;
     const auto report = [&] {
         const ProgressLine line(context.arguments.has("progress"));
-        if (line.isWanted())
-            options.progress = [&line](const QVImportProgress& progress) { line.show(progress); };
+        options.progress = [&line](const QVImportProgress& progress) { line.show(progress); };
         return QVRecordsImporter(*store).importFiles(files, options);
     }();
     if (!report) {
@@ -129,23 +191,27 @@ QVExitStatus run(const QVCommandContext& context) {
         return QVExitStatusForError(report.error());
     }
     if (const VSStatus status = printReport(*report); !status) return QVFail(status.error());
+    if (options.dryRun) QVPrintError("this was a trial; nothing of it is kept");
     return QVExitStatus::Success;
 }
 
-constexpr QVCommandOption kOptions[] = {{"progress", false}, {"refusals", true}};
+constexpr QVCommandOption kOptions[] = {{"progress", false}, {"refusals", true}, {"dry-run", false}};
 
 }  // namespace
 
 const QVCommand QVImportCommand{"import", "read records documents (.xml) and archives that hold them (.zip)",
-                                R"(Usage: qelvar import [--progress] [--refusals N] FILE...
+                                R"(Usage: qelvar import [--dry-run] [--progress] [--refusals N] FILE...
 
 Reads records documents, plain or inside .zip archives, into the store. All files are one transaction: when one
 of them cannot be read as a whole, or the import is interrupted (Ctrl+C), nothing of any is kept. Records that
 the store already has are not added again. A record that makes no sense is refused alone and told on standard
-error with its line; the others are kept.
+error with its line; the others are kept. While another program writes to the store, the import waits and says
+so. `qelvar undo` takes an import back.
 
 Standard output: type, read, added, already_had, refused; a row for each type and a row "total".
 
+  --dry-run       do and tell everything as in an import, and then keep nothing; refused for a store of an older
+                  version, which opening it for writing would change
   --refusals N    tell the first N refusals in full (20); all are counted by reason
   --progress      write progress as rows to standard error (bytes_done, bytes_total, records); without it a line
                   of progress is shown when standard error is a terminal

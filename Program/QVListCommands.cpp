@@ -88,7 +88,8 @@ QVExitStatus runCheck(const QVCommandContext& context) {
                 std::to_string(report->problems.size())});
     const QVExitStatus status = finish(output);
     for (const std::string& problem : report->problems) QVPrintError(problem);
-    return report->problems.empty() ? status : QVExitStatus::Corrupt;
+    if (report->problems.empty()) return status;
+    return QVFail({VSErrorCode::Corrupt, "the store in " + context.storeFolder.string() + " is damaged"});
 }
 
 constexpr QVCommandOption kTypesOptions[] = {{"recorded", false}};

@@ -11,7 +11,8 @@
 namespace {
 
 constexpr const QVCommand* kCommands[] = {&QVImportCommand, &QVStatisticsCommand, &QVSamplesCommand,
-                                          &QVTypesCommand,  &QVSourcesCommand,    &QVCheckCommand};
+                                          &QVTypesCommand,  &QVSourcesCommand,    &QVBatchesCommand,
+                                          &QVUndoCommand,   &QVCheckCommand,      &QVSalvageCommand};
 
 constexpr QVCommandOption kCommonOptions[] = {{"store", true}, {"now", true}, {"help", false}};
 constexpr QVCommandOption kProgramOptions[] = {{"store", true},    {"now", true},   {"help", false},

@@ -14,7 +14,7 @@ struct Request {
     std::optional<std::string> every;  // none: the range as a whole
     std::vector<std::string> columns;  // of sum, average, minimum, maximum, as asked for
     int options = 0;
-    bool bySource = false, emptyBuckets = false;
+    bool bySource = false, emptyBuckets = false, explain = false;
     std::vector<std::string> units;
 };
 
@@ -95,6 +95,9 @@ VSResult<Request> readRequest(const QVCommandArguments& arguments) {
         return usage("--every: " + *request.every + " is not one of hour, day, week, month, year");
     request.bySource = arguments.has("by-source");
     request.emptyBuckets = arguments.has("empty");
+    request.explain = arguments.has("explain");
+    if (request.explain && (request.bySource || request.emptyBuckets || arguments.has("options")))
+        return usage("--explain goes without --options, --by-source and --empty");
     request.units = arguments.values("unit");
     if (request.bySource) request.options |= VSStatisticsOptionSeparateBySource;
     return request;
@@ -119,6 +122,7 @@ class TypeStatistics {
     VSStatus write() {
         if (VSStatus status = findUnit(); !status) return status;
         if (from_ >= to_) return {};
+        if (request_.explain) return explain();
         if (!type_->isQuantityType()) return writeCounts();
         const auto predicate = VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionNone);
         if (!request_.every) {
@@ -217,6 +221,59 @@ class TypeStatistics {
         return {};
     }
 
+    /// Each interval with data, taken apart.
+    VSStatus explain() {
+        std::vector<std::pair<VSDate, VSDate>> intervals{{from_, to_}};
+        if (request_.every) {
+            const auto collection = store_.statisticsCollection(
+                type_, VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionNone), request_.options,
+                beginning_, intervalNamed(*request_.every)->length);
+            if (!collection) return collection.error();
+            intervals.clear();
+            for (const VSStatistics& one : (*collection)->statistics())
+                intervals.emplace_back(one.startDate, one.endDate);
+        }
+        for (const auto& [start, end] : intervals) {
+            const auto inside = VSPredicate::samplesWithStartDate(std::max(start, from_), std::min(end, to_),
+                                                                  VSQueryOptionNone);
+            const auto explanation = store_.explainStatistics(type_, inside, request_.options);
+            if (!explanation) return explanation.error();
+            for (const auto& contribution : explanation->contributions)
+                writeContribution(start, end, contribution);
+        }
+        return {};
+    }
+
+    void writeContribution(VSDate start, VSDate end,
+                           const VSStatisticsExplanation::Contribution& contribution) {
+        const auto fields = [&](std::vector<std::string> rest) {
+            std::vector<std::string> row;
+            if (request_.manyTypes) row.emplace_back(type_->name());
+            row.insert(row.end(), {output_.date(start), output_.date(end)});
+            appendSample(*contribution.sample, row);
+            row.insert(row.end(), rest.begin(), rest.end());
+            row.push_back(unit_ ? unit_->unitString() : "");
+            output_.row(row);
+        };
+        fields({contribution.startsInRange ? "1" : "0", amount(contribution.inRange),
+                amount(contribution.counted), "", "", "", "", "", "", ""});
+        for (const auto& taken : contribution.taken) {
+            std::vector<std::string> rest{
+                "", "", "", amount(taken.amount), output_.date(taken.from), output_.date(taken.to)};
+            appendSample(*taken.by, rest);
+            fields(std::move(rest));
+        }
+    }
+
+    std::string amount(double canonical) const { return unit_ ? value(canonical) : std::string(); }
+
+    void appendSample(const VSSample& sample, std::vector<std::string>& row) const {
+        const auto* quantity = dynamic_cast<const VSQuantitySample*>(&sample);
+        row.insert(row.end(),
+                   {sample.sourceRevision().source.name, output_.date(sample.startDate()),
+                    output_.date(sample.endDate()), quantity ? amount(quantity->quantity().value()) : ""});
+    }
+
     VSHealthStore& store_;
     const Request& request_;
     const VSObjectType* const type_;
@@ -230,6 +287,13 @@ void writeHeader(const Request& request, QVTabOutput& output) {
     std::vector<std::string> header;
     if (request.manyTypes) header.emplace_back("type");
     header.insert(header.end(), {"start", "end"});
+    if (request.explain) {
+        header.insert(header.end(), {"source", "record_start", "record_end", "value", "starts", "in_interval",
+                                     "counted", "taken", "taken_from", "taken_to", "by_source", "by_start",
+                                     "by_end", "by_value", "unit"});
+        output.row(header);
+        return;
+    }
     if (request.bySource) header.emplace_back("source");
     header.emplace_back("count");
     header.insert(header.end(), request.columns.begin(), request.columns.end());
@@ -276,14 +340,14 @@ QVExitStatus run(const QVCommandContext& context) {
 
 constexpr QVCommandOption kOptions[] = {{"from", true},    {"to", true},         {"every", true},
                                         {"options", true}, {"by-source", false}, {"unit", true},
-                                        {"empty", false}};
+                                        {"empty", false},  {"explain", false}};
 
 }  // namespace
 
 const QVCommand QVStatisticsCommand{
     "statistics", "sums, averages, minima and maxima per hour, day, week, month or year",
     R"(Usage: qelvar statistics TYPE|all [--from D] [--to D] [--every hour|day|week|month|year]
-                         [--options sum,average,minimum,maximum] [--by-source] [--unit U]... [--empty]
+                         [--options sum,average,minimum,maximum] [--by-source] [--unit U]... [--empty] [--explain]
 
 Average, minimum and maximum are over the records that start in the interval; a sum takes of each record the part
 that lies in the interval, in proportion to time. Records without a quantity (sleep, workouts ...) are counted only.
@@ -299,5 +363,11 @@ for each interval that has a value. A statistic of nothing is an empty field.
   --by-source        after each row, which counts no moment from two sources, a row for each source alone
   --unit U           by default the unit of the store; may be given several times, the first that fits the type is used
   --empty            rows for intervals without a value too
+  --explain          instead of the statistics, the records that they come from: of each interval with a value the
+                     records that lie in it. `value` is a record's own, `in_interval` the share of it that lies in the
+                     interval, `counted` what of that is in the sum, `starts` 1 when count, average, minimum and maximum
+                     have it. After a record stands a row for each part of it that does not count, since a record of
+                     another source, earlier in the order of sources, covers it: what was `taken`, between which times,
+                     and by which record
 )",
     kOptions, run};

@@ -1,10 +1,12 @@
 #pragma once
 
+#include <vector>
+
 #include "Vessa/VSObjectType.h"
 #include "Vessa/VSSource.h"
 
-/// What one application may do with the samples of one type. Sharing: write them into the store; reading: see
-/// those of others. The numbers are kept on disk and never change.
+/// What one application may do with the samples of one type (or with a characteristic). Sharing: write them
+/// into the store; reading: see those of others. The numbers are kept on disk and never change.
 enum class VSAuthorizationStatus : int {
     Undetermined = 100,  // asked for, not answered yet: neither
     SharingAndReading = 101,
@@ -32,3 +34,11 @@ struct VSAuthorizationRecord {
     VSAuthorizationStatus status = VSAuthorizationStatus::Undetermined;
     bool requestedReading = false, requestedSharing = false;
 };
+
+/// Whether a source reads and writes by permission: every program but this one. Devices and documents, whose
+/// records a person brought in, need none.
+bool vs_requiresAuthorization(const VSSource& source);
+/// Those that take part in authorization, in their order.
+std::vector<VSSource> vs_sourcesForAuthorization(const std::vector<VSSource>& sources);
+/// Those that wrote without needing permission, in their order.
+std::vector<VSSource> vs_sourcesForDevices(const std::vector<VSSource>& sources);

@@ -11,17 +11,13 @@
 
 namespace {
 
-int64_t steadyMicroseconds() {
-    return std::chrono::duration_cast<VSDuration>(std::chrono::steady_clock::now().time_since_epoch())
-        .count();
-}
-
 VSErrorCode errorCode(int code) {
     switch (code & 0xff) {
         case SQLITE_FULL:
             return VSErrorCode::DiskFull;
         case SQLITE_BUSY:
         case SQLITE_LOCKED:
+        case SQLITE_PROTOCOL:  // the locks of the log stayed taken
         case SQLITE_CANTOPEN:
         case SQLITE_READONLY:
         case SQLITE_PERM:
@@ -43,6 +39,7 @@ const char* meaning(int code) {
             return "the disk is full";
         case SQLITE_BUSY:
         case SQLITE_LOCKED:
+        case SQLITE_PROTOCOL:
             return "the store is held by another program";
         case SQLITE_CANTOPEN:
             return "the store cannot be opened";
@@ -62,10 +59,41 @@ const char* meaning(int code) {
     }
 }
 
+bool isWithoutRoom(int reason) {
+    return reason == EDQUOT || reason == EFBIG || reason == ENOSPC;
+}
+
+bool isHeld(int code) {
+    return (code & 0xff) == SQLITE_BUSY || (code & 0xff) == SQLITE_LOCKED || (code & 0xff) == SQLITE_PROTOCOL;
+}
+
+/// Whether a failure of the system is that of a disk without space. SQLite says so itself only of a write
+/// that got ENOSPC; a quota or a limit, a new file and the log's index are left to us.
+bool isFullDisk(int code, int reason) {
+    switch (code) {
+        case SQLITE_IOERR_WRITE:
+        case SQLITE_IOERR_FSYNC:
+        case SQLITE_IOERR_TRUNCATE:
+        case SQLITE_IOERR_SHMSIZE:
+        case SQLITE_IOERR_SHMMAP:
+        case SQLITE_IOERR_SHMOPEN:
+        case SQLITE_CANTOPEN:
+            return isWithoutRoom(reason);
+        default:
+            return false;
+    }
+}
+
 }  // namespace
 
+VSError VSErrorFromSystem(int reason, const std::string& what) {
+    return {isWithoutRoom(reason) ? VSErrorCode::DiskFull : VSErrorCode::NotAccessible,
+            what + ": " + std::strerror(reason)};
+}
+
 VSError VSErrorFromDatabaseCode(int code, const std::string& detail) {
-    return {errorCode(code), std::string(meaning(code)) + " (" + detail + ", " + std::to_string(code) + ")"};
+    return {errorCode(code), std::string(meaning(code)) + " (" + detail + ", " + std::to_string(code) + ")",
+            isHeld(code)};
 }
 
 // VSStatement
@@ -187,13 +215,20 @@ VSDatabase::VSDatabase(const std::filesystem::path& file, Mode mode, VSDuration 
         }
         name = "file:" + escaped + "?immutable=1";
     }
-    const int code = sqlite3_open_v2(name.c_str(), &handle_, flags, nullptr);
+    const char* locks = mode == Mode::ReadAlone ? "unix-none" : nullptr;
+    const int code = sqlite3_open_v2(name.c_str(), &handle_, flags, locks);
     if (code != SQLITE_OK) {
-        const VSError error = VSErrorFromDatabaseCode(code, handle_ ? sqlite3_errmsg(handle_) : "no memory");
+        const int reason = errno;
+        const VSError error =
+            isFullDisk(code, reason)
+                ? VSErrorFromDatabaseCode(SQLITE_FULL, std::strerror(reason))
+                : VSErrorFromDatabaseCode(code, handle_ ? sqlite3_errmsg(handle_) : "no memory");
         close();
         throw VSDatabaseFailure(error);
     }
     sqlite3_busy_handler(handle_, &VSDatabase::waitForLock, this);
+    if (mode == Mode::ReadAlone)
+        sqlite3_exec(handle_, "PRAGMA locking_mode = EXCLUSIVE", nullptr, nullptr, nullptr);
 }
 
 VSDatabase::~VSDatabase() {
@@ -211,22 +246,28 @@ void VSDatabase::close() {
 
 int VSDatabase::waitForLock(void* self, int attempt) {
     auto* database = static_cast<VSDatabase*>(self);
-    const int64_t now = steadyMicroseconds();
-    if (attempt == 0) database->waitingSince_ = now;
-    VSDuration patience = database->patience_;
-    if (database->hurry_ && database->hurry_->load())
-        patience = std::min<VSDuration>(patience, std::chrono::seconds(5));
-    if (now - database->waitingSince_ >= patience.count()) return 0;
+    if (database->giveUp_ && database->giveUp_->load()) return 0;
+    const auto now = std::chrono::steady_clock::now();
+    if (attempt == 0) {
+        database->waitingSince_ = now;
+        database->longWaitTold_ = false;
+    }
+    // In microseconds on both sides: the longest patience has no nanoseconds.
+    const auto waited = std::chrono::duration_cast<VSDuration>(now - database->waitingSince_);
+    if (database->longWaitBlock_ && !database->longWaitTold_ && waited >= database->longWait_) {
+        database->longWaitTold_ = true;
+        database->longWaitBlock_();
+    }
+    if (waited >= database->patience_) return 0;
+    if (database->deadline_ && now >= database->deadline_->load()) return 0;
     std::this_thread::sleep_for(std::chrono::milliseconds(std::min(1 + attempt, 20)));
     return 1;
 }
 
 void VSDatabase::fail(int code) const {
-    const int reason = errno;  // SQLite tells its own reasons only of a disk without space
-    VSError error = VSErrorFromDatabaseCode(code, sqlite3_errmsg(handle_));
-    // A quota or a limit is a full disk to its user.
-    if (code == SQLITE_IOERR_WRITE && (reason == EDQUOT || reason == EFBIG || reason == ENOSPC))
-        error = VSErrorFromDatabaseCode(SQLITE_FULL, std::strerror(reason));
+    const int reason = errno;  // SQLite keeps it for some of its calls only
+    VSError error = isFullDisk(code, reason) ? VSErrorFromDatabaseCode(SQLITE_FULL, std::strerror(reason))
+                                             : VSErrorFromDatabaseCode(code, sqlite3_errmsg(handle_));
     throw VSDatabaseFailure(std::move(error));
 }
 

@@ -1,9 +1,11 @@
 #pragma once
 
 #include <atomic>
+#include <chrono>
 #include <cstdint>
 #include <exception>
 #include <filesystem>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
@@ -73,7 +75,9 @@ class VSStatement {
 /// One connection to the database file. Used by one thread at a time. Everything throws VSDatabaseFailure.
 class VSDatabase {
  public:
-    enum class Mode { Write, Read, ReadImmutable };
+    /// The last two are for places where nobody can write: a file without a log, and one with a log, whose
+    /// index is then kept in memory.
+    enum class Mode { Write, Read, ReadImmutable, ReadAlone };
     /// `patience`: how long a lock held by others is waited for before NotAccessible.
     VSDatabase(const std::filesystem::path& file, Mode mode, VSDuration patience);
     ~VSDatabase();
@@ -87,8 +91,16 @@ class VSDatabase {
     int64_t integer(std::string_view sql);
     bool isReadOnly() const;
     void setPatience(VSDuration patience) { patience_ = patience; }
-    /// While *flag is true, locks are waited for five seconds at most. The flag outlives the connection.
-    void setHurry(const std::atomic<bool>* flag) { hurry_ = flag; }
+    /// After *deadline no lock is waited for. It outlives the connection.
+    using Deadline = std::atomic<std::chrono::steady_clock::time_point>;
+    void setDeadline(const Deadline* deadline) { deadline_ = deadline; }
+    /// Calls block() when a lock has been waited for that long: once a lock, while it goes on waiting.
+    void setLongWaitBlock(VSDuration after, std::function<void()> block) {
+        longWait_ = after;
+        longWaitBlock_ = std::move(block);
+    }
+    /// Once *flag is true, locks are not waited for. Null: no flag. The flag outlives the waiting.
+    void setGiveUp(const std::atomic<bool>* flag) { giveUp_ = flag; }
     /// Whether another connection has committed since the last call.
     bool othersHaveCommitted();
     int64_t changes() const;
@@ -101,9 +113,12 @@ class VSDatabase {
     void close();
 
     sqlite3* handle_ = nullptr;
-    VSDuration patience_;
-    const std::atomic<bool>* hurry_ = nullptr;
-    int64_t waitingSince_ = 0;  // microseconds of the steady clock
+    VSDuration patience_, longWait_{};
+    const Deadline* deadline_ = nullptr;
+    const std::atomic<bool>* giveUp_ = nullptr;
+    std::function<void()> longWaitBlock_;
+    std::chrono::steady_clock::time_point waitingSince_;
+    bool longWaitTold_ = false;  // of this lock
     std::optional<int64_t> dataVersion_;
     std::unordered_map<std::string, std::vector<sqlite3_stmt*>> statements_;  // those not lent out
 };
@@ -123,5 +138,8 @@ class VSTransaction {
     bool open_ = true;
 };
 
+/// The error of a failed call of the system: DiskFull where there is no room (also by a quota or a limit of
+/// the file's size), else NotAccessible. `reason` is its errno.
+VSError VSErrorFromSystem(int reason, const std::string& what);
 /// The error of an SQLite result code.
 VSError VSErrorFromDatabaseCode(int code, const std::string& detail);

@@ -1,6 +1,7 @@
 #include "Vessa/VSHealthStore.h"
 
 #include "Vessa/VSHealthStoreConnection.h"
+#include "Vessa/VSStoreSalvage.h"
 
 VSResult<std::shared_ptr<VSHealthStore>> VSHealthStore::open(const std::filesystem::path& folder,
                                                              Options options) {
@@ -9,6 +10,11 @@ VSResult<std::shared_ptr<VSHealthStore>> VSHealthStore::open(const std::filesyst
     return std::shared_ptr<VSHealthStore>(std::make_shared<VSHealthStoreConnection>(*core));
 }
 
-VSResult<VSSalvageReport> VSHealthStore::salvage(const std::filesystem::path&, const std::filesystem::path&) {
-    return VSError{VSErrorCode::Failed, "not there yet"};
+VSResult<VSSalvageReport> VSHealthStore::salvage(const std::filesystem::path& damaged,
+                                                 const std::filesystem::path& folder) {
+    try {
+        return VSSalvageStore(damaged, folder);
+    } catch (const VSDatabaseFailure& failure) {
+        return failure.error();
+    }
 }

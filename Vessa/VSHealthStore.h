@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <filesystem>
 #include <functional>
 #include <map>
@@ -44,23 +45,52 @@ struct VSSalvageReport {
 };
 
 /// A connection to the store of one folder. Several connections, in one process or many, may be open on the
-/// same folder. All operations may be called on any thread and return at once unless their comment says that
-/// they wait; completions run on the store's threads, in the order of the calls for writes. A completion may
-/// be empty. What was acknowledged survives a killed process and a lost power supply.
+/// same folder.
+///
+/// - Threads: all operations may be called on any thread and return at once unless their comment says that
+///   they wait. Completions run on the store's threads: those of changes one after another in the order of
+///   the calls, those of questions on others. A completion may be empty. A question with a completion
+///   sees the changes that were asked for before it on the same connection; where these wait for other
+///   programs that hold the store it gets NotAccessible after ten seconds at most (or `patience` if that is
+///   less), since the answer could be an old one. Queries and operations that wait see the changes that were
+///   acknowledged. An operation that waits is not for the main thread.
+/// - Ownership: the connection is its user's; its end stops queries, does the changes that were accepted, and
+///   may come in a handler. Arguments and answers are values; samples are immutable and shared.
+/// - Units: an object is saved in any unit that converts to its type's; what comes back is in the canonical
+///   unit of the type, bit for bit as it was stored. Dates and durations carry their own.
+/// - Failures: a change is done whole or not at all, and was not done when its completion tells an error. But
+///   where the disk failed at the very moment of the commit it may be there as a whole after a restart. Any
+///   operation may fail with NotAccessible (other programs hold the store for longer than `patience`, it
+///   cannot be reached, or a change is asked of a connection for reading), Corrupt (what is on disk is
+///   damaged), Failed (other trouble of the system); a change with DiskFull too. The comments name the rest.
+/// - Permissions: Refused is what programs other than the owner get for what they may not do. They need
+///   permission to read to see samples of a type or a characteristic, but not for samples that they saved
+///   themselves (a predicate whose sources are all their own); permission to share to save, under their own
+///   name, and they delete only what is theirs. A correlation is read with the permission of its own type and
+///   saved with those of its type and its members' types. Source orders, permissions, imports and the Medical
+///   ID are the owner's. This keeps honest programs apart; who may write the file may do anything.
+/// - What was acknowledged survives a killed process and a lost power supply.
 class VSHealthStore {
  public:
     struct Options {
         bool readOnly = false;
         bool createIfMissing = true;
-        std::string applicationIdentifier = "org.qelvar.Qelvar";  // whose default values are meant
+        /// Of the program that uses the connection: whose default values and permissions are meant. The
+        /// owner of the store is this application itself; others read and share what they were allowed to.
+        std::string applicationIdentifier = "org.qelvar.Qelvar";
+        std::string
+            applicationName;  // under which another program asks for permission; empty: its identifier
         /// False: a lost power supply may take the last saves with it, never more; a killed process loses
         /// nothing either way.
         bool survivesPowerLoss = true;
         /// How long an operation that changes something waits for other programs that hold the store.
         VSDuration patience = std::chrono::minutes(2);
     };
-    /// Waits. Opens or makes the database in the folder (made with mode 0700). Refused: a newer schema, not
-    /// our file. Corrupt: a damaged file (it is never changed). NotAccessible: cannot be locked or reached.
+    /// Waits. Opens or makes the database in the folder (made with mode 0700). A store of an older format is
+    /// brought to this one after a copy was kept beside it, which may take a while; NotAccessible while other
+    /// programs have it open, DiskFull where the copy has no room. Refused: a newer schema, an older one when
+    /// opened for reading, not our file. Corrupt: a damaged file (it is never changed). NotAccessible: cannot
+    /// be locked or reached.
     static VSResult<std::shared_ptr<VSHealthStore>> open(const std::filesystem::path& folder,
                                                          Options options);
     static VSResult<std::shared_ptr<VSHealthStore>> open(const std::filesystem::path& folder) {
@@ -76,17 +106,20 @@ class VSHealthStore {
 
     using Completion = std::function<void(const VSStatus&)>;
 
-    // Queries
+    // Queries: see VSQuery.h.
     virtual void executeQuery(std::shared_ptr<VSQuery> query) = 0;
     virtual void stopQuery(const std::shared_ptr<VSQuery>& query) = 0;
 
     // Writing: all or nothing. Invalid: an object that breaks its type's rules (the message says which and
     // why).
+    /// Gives each object its number; the objects given stay as they are. A correlation brings those of its
+    /// members that are not in the store yet. Without a creation date it is now.
     virtual void saveObjects(std::vector<VSSamplePtr> objects, Completion completion) = 0;
     void saveObject(VSSamplePtr object, Completion completion) {
         saveObjects({std::move(object)}, std::move(completion));
     }
-    /// A correlation or workout goes alone; its members stay. NotFound when one of them is not in the store.
+    /// A correlation or workout goes alone; its members stay unless they are in the list too. An object
+    /// without number means the newest equal one. NotFound: one of them is not in the store.
     virtual void deleteObjects(std::vector<VSSamplePtr> objects, Completion completion) = 0;
     void deleteObject(VSSamplePtr object, Completion completion) {
         deleteObjects({std::move(object)}, std::move(completion));
@@ -95,11 +128,13 @@ class VSHealthStore {
     virtual void deleteAllSamples(std::vector<const VSObjectType*> types,
                                   std::optional<std::string> sourceBundleIdentifier,
                                   Completion completion) = 0;
-    /// Relates samples to a saved workout, saving those that are not saved yet.
+    /// Relates samples to a saved workout, saving those that are not saved yet. NotFound: there is no such
+    /// workout.
     virtual void addSamplesToWorkout(std::vector<VSSamplePtr> samples, VSSamplePtr workout,
                                      Completion completion) = 0;
 
-    // Characteristics. They wait (one row); none: not set.
+    // Characteristics. The reading ones wait (one row); none: not set. Refused to programs without permission
+    // to read, or share, the characteristic's type.
     virtual VSResult<std::optional<VSBirthDate>> dateOfBirth() = 0;
     virtual VSResult<int> biologicalSex() = 0;        // 0 not set
     virtual VSResult<int> bloodType() = 0;            // 0 not set
@@ -108,13 +143,18 @@ class VSHealthStore {
     /// REQUIRES: an enumerated characteristic and one of its values.
     virtual void setCharacteristic(const VSObjectType* type, int value, Completion completion) = 0;
 
-    // Medical ID
+    // Medical ID. The owner's only.
+    /// A new, empty one; nothing is saved.
+    static VSMedicalIDData createMedicalIDData() { return {}; }
+    /// None: there is no Medical ID.
     virtual void fetchMedicalIDData(
         std::function<void(const VSResult<std::optional<VSMedicalIDData>>&)> completion) = 0;
+    /// Makes or replaces it.
     virtual void updateMedicalIDData(VSMedicalIDData data, Completion completion) = 0;
+    /// Also when there is none.
     virtual void deleteMedicalIDData(Completion completion) = 0;
 
-    // Default values of an application
+    // Default values of the application of the connection; each has its own. None: not set.
     virtual void setDefaultValue(VSValue value, std::string key, Completion completion) = 0;
     virtual void getDefaultValue(std::string key,
                                  std::function<void(const VSResult<std::optional<VSValue>>&)> handler) = 0;
@@ -125,14 +165,17 @@ class VSHealthStore {
     /// The devices of samples; only those with one of these local identifiers when any is given.
     virtual void devices(std::vector<std::string> localIdentifiers,
                          std::function<void(const VSResult<std::vector<VSDevice>>&)> completion) = 0;
-    /// The records of every application that asked for the type.
+    /// The records of every application that asked for the type (also a characteristic's) or was given a
+    /// status, by name.
     virtual void authorizationRecords(
         const VSObjectType* type,
         std::function<void(const VSResult<std::vector<VSAuthorizationRecord>>&)> completion) = 0;
-    /// Of one application; types that it did not ask for get a record that asks for nothing.
+    /// Of one application; types that it did not ask for get a record that asks for nothing. Running queries
+    /// of the types answer again. Invalid: the owner, who needs none.
     virtual void setAuthorizationStatuses(std::map<const VSObjectType*, VSAuthorizationStatus> statuses,
                                           std::string bundleIdentifier, Completion completion) = 0;
     /// Notes what the application of this connection wants; types that it asked for before keep their status.
+    /// Of the owner nothing is noted.
     virtual void requestAuthorization(std::vector<const VSObjectType*> toShare,
                                       std::vector<const VSObjectType*> toRead, Completion completion) = 0;
     /// The order in which sources of a type count: the user's, else this application's own entries first,
@@ -142,7 +185,7 @@ class VSHealthStore {
     virtual void setOrderedSources(std::vector<VSSource> sources, const VSObjectType* type,
                                    Completion completion) = 0;
 
-    // Waiting forms for the command line, the import and tests
+    // Waiting forms for the command line, the import and tests: they answer as the queries of VSQuery.h do.
     virtual VSResult<std::vector<VSSamplePtr>> samples(const VSObjectType* type, const VSPredicate& predicate,
                                                        int limit,
                                                        const std::vector<VSSortDescriptor>& sort) = 0;
@@ -190,15 +233,19 @@ class VSHealthStore {
         /// Commits and tells everyone, in all processes.
         virtual VSStatus commit() = 0;
     };
-    /// Waits for the writer, at most `patience`; NotAccessible when another process holds it longer.
+    /// Waits for the writer, at most `patience`; NotAccessible when another process holds it longer, and
+    /// soon after `giveUp` became true. It may be null, and must outlive the call.
     virtual VSResult<std::unique_ptr<ImportTransaction>> beginImport(
-        const std::string& name, VSDuration patience = std::chrono::seconds(30)) = 0;
+        const std::string& name, VSDuration patience = std::chrono::seconds(30),
+        const std::atomic<bool>* giveUp = nullptr) = 0;
 
     // Batches. They wait.
     /// The imports that were not taken back, oldest first.
     virtual VSResult<std::vector<VSBatch>> batches() = 0;
-    /// Takes an import back: what it added and no later import had as well is deleted (anchored queries get
-    /// it as deleted objects), the characteristics that it set are unset. NotFound: there is no such batch.
+    /// Takes an import back: what it added and no other import had as well is deleted (anchored queries get
+    /// it as deleted objects), and so is what only it still held of an import that was taken back before.
+    /// What was not imported is never touched. The characteristics that it set, that still have its value and
+    /// that no other import told are unset. NotFound: there is no such batch.
     virtual VSResult<VSUndoReport> undoBatch(int64_t batch) = 0;
 
     virtual VSResult<int64_t> databaseSizeInBytes() = 0;

@@ -1,15 +1,27 @@
 #include "Vessa/VSHealthStoreConnection.h"
-
 #include "Vessa/VSImportTransaction.h"
+#include "Vessa/VSStoreBatches.h"
 
 VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> VSHealthStoreConnection::beginImport(
-    const std::string& name, VSDuration patience) {
-    return VSImportTransaction::begin(core_, name, patience);
+    const std::string& name, VSDuration patience, const std::atomic<bool>* giveUp) {
+    if (auto objection = core_->access.objectionToManaging()) return *objection;
+    return VSImportTransaction::begin(core_, name, patience, giveUp);
 }
 
 VSResult<std::vector<VSBatch>> VSHealthStoreConnection::batches() {
-    return VSError{VSErrorCode::Failed, "not there yet"};
+    if (auto objection = core_->access.objectionToManaging()) return *objection;
+    return core_->readers.read([](VSStoreReader& reader) { return VSReadBatches(reader.database()); });
 }
-VSResult<VSUndoReport> VSHealthStoreConnection::undoBatch(int64_t) {
-    return VSError{VSErrorCode::Failed, "not there yet"};
+
+VSResult<VSUndoReport> VSHealthStoreConnection::undoBatch(int64_t batch) {
+    if (auto objection = core_->access.objectionToManaging()) return *objection;
+    VSUndoReport report;
+    const VSStatus status = core_->writeAndWait([&report, batch](VSStoreWriter& writer) {
+        auto undone = VSUndoBatch(writer, batch);
+        if (!undone) return VSStatus(undone.error());
+        report = *undone;
+        return VSStatus();
+    });
+    if (!status) return status.error();
+    return report;
 }

@@ -1,6 +1,7 @@
 #include "Vessa/VSHealthStoreConnection.h"
 
 #include <algorithm>
+#include <set>
 
 #include "Vessa/Base/VSEnvironment.h"
 #include "Vessa/VSStoreCheck.h"
@@ -8,34 +9,79 @@
 
 namespace {
 
-VSStatus insertAll(VSStoreWriter& writer, const std::vector<VSSamplePtr>& objects) {
+/// Whose a saved object is says the store, not the object.
+std::optional<VSError> objectionToChanging(VSStoreWriter& writer, const VSStoreAccess& access,
+                                           const VSMemberKey& key) {
+    VSSampleRow row;
+    if (access.isOwner() || !writer.matcher().row(key, row)) return std::nullopt;
+    return access.objectionToChanging(writer.provenances().provenance(row.provenance).revision->source);
+}
+
+VSMemberKey keyOf(const VSSample& sample, int64_t id) {
+    return {sample.sampleType(), sample.startDate().microseconds(), id};
+}
+
+/// What speaks against a sample that is to be saved, with those of its members that are in the store.
+std::optional<VSError> objectionToSaving(VSStoreWriter& writer, const VSStoreAccess& access,
+                                         const VSSample& sample) {
+    if (auto objection = VSStoreWriter::objection(sample)) return objection;
+    if (auto objection = access.objectionToSaving(writer.database(), sample)) return objection;
+    if (const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample)) {
+        for (const VSSamplePtr& member : correlation->objects()) {
+            const VSMemberKey key = keyOf(*member, VSObjectIDValue(member->dataID()));
+            if (auto objection = objectionToChanging(writer, access, key)) return objection;
+        }
+    }
+    return std::nullopt;
+}
+
+VSStatus insertAll(VSStoreWriter& writer, const VSStoreAccess& access,
+                   const std::vector<VSSamplePtr>& objects) {
     for (const VSSamplePtr& object : objects) {
         if (!object) return VSError{VSErrorCode::Invalid, "there is no object to save"};
-        if (auto objection = VSStoreWriter::objection(*object)) return *objection;
+        if (auto objection = objectionToSaving(writer, access, *object)) return *objection;
     }
     const VSDate now = VSEnvironment::current()->now();
     for (const VSSamplePtr& object : objects) writer.insert(*object, now);
     return {};
 }
 
-VSStatus removeAll(VSStoreWriter& writer, const std::vector<VSSamplePtr>& objects) {
-    for (const VSSamplePtr& object : objects) {
-        const int64_t id = object ? writer.find(*object) : 0;
-        if (!id || !writer.remove(object->sampleType(), object->startDate().microseconds(), id))
-            return VSError{VSErrorCode::NotFound, "an object to delete is not in the store"};
+/// Finds all before any is removed: a correlation is known by its members. Equal objects without number mean
+/// different ones of the store; one that is listed twice is meant once.
+VSStatus removeAll(VSStoreWriter& writer, const VSStoreAccess& access,
+                   const std::vector<VSSamplePtr>& objects) {
+    std::vector<VSMemberKey> keys;
+    std::set<int64_t> meant;
+    std::set<const VSSample*> seen;
+    for (const bool numbered : {true, false}) {
+        for (const VSSamplePtr& object : objects) {
+            if (object && (VSObjectIDValue(object->dataID()) != 0) != numbered) continue;
+            if (object && !seen.insert(object.get()).second) continue;
+            const int64_t id = object ? writer.find(*object, meant) : 0;
+            if (!id) return VSError{VSErrorCode::NotFound, "an object to delete is not in the store"};
+            if (!meant.insert(id).second) continue;
+            keys.push_back(keyOf(*object, id));
+            if (auto objection = objectionToChanging(writer, access, keys.back())) return *objection;
+        }
     }
+    for (const VSMemberKey& key : keys) writer.remove(key.type, key.start, key.id);
     return {};
 }
 
-VSStatus relate(VSStoreWriter& writer, const std::vector<VSSamplePtr>& samples, const VSSample& workout) {
+VSStatus relate(VSStoreWriter& writer, const VSStoreAccess& access, const std::vector<VSSamplePtr>& samples,
+                const VSSample& workout) {
     const int64_t parent = writer.find(workout);
     if (!parent) return VSError{VSErrorCode::NotFound, "the workout is not in the store"};
+    if (auto objection = access.objectionToSaving(writer.database(), workout)) return *objection;
+    if (auto objection = objectionToChanging(writer, access, keyOf(workout, parent))) return *objection;
     const VSDate now = VSEnvironment::current()->now();
     for (const VSSamplePtr& sample : samples) {
-        if (auto objection = VSStoreWriter::objection(*sample)) return *objection;
+        if (auto objection = objectionToSaving(writer, access, *sample)) return *objection;
         int64_t id = writer.find(*sample);
         if (!id) id = writer.insert(*sample, now);
-        writer.addToWorkout(parent, {sample->sampleType(), sample->startDate().microseconds(), id});
+        const VSMemberKey key = keyOf(*sample, id);
+        if (auto objection = objectionToChanging(writer, access, key)) return *objection;
+        writer.addToWorkout(parent, key);
     }
     writer.touch(workout.sampleType());
     return {};
@@ -44,17 +90,19 @@ VSStatus relate(VSStoreWriter& writer, const std::vector<VSSamplePtr>& samples, 
 }  // namespace
 
 void VSHealthStoreConnection::saveObjects(std::vector<VSSamplePtr> objects, Completion completion) {
-    core_->write([objects = std::move(objects)](VSStoreWriter& writer) { return insertAll(writer, objects); },
+    core_->write([&access = core_->access, objects = std::move(objects)](
+                     VSStoreWriter& writer) { return insertAll(writer, access, objects); },
                  std::move(completion));
 }
 
 VSStatus VSHealthStoreConnection::saveObjectsAndWait(std::vector<VSSamplePtr> objects) {
-    return core_->writeAndWait(
-        [objects = std::move(objects)](VSStoreWriter& writer) { return insertAll(writer, objects); });
+    return core_->writeAndWait([&access = core_->access, objects = std::move(objects)](
+                                   VSStoreWriter& writer) { return insertAll(writer, access, objects); });
 }
 
 void VSHealthStoreConnection::deleteObjects(std::vector<VSSamplePtr> objects, Completion completion) {
-    core_->write([objects = std::move(objects)](VSStoreWriter& writer) { return removeAll(writer, objects); },
+    core_->write([&access = core_->access, objects = std::move(objects)](
+                     VSStoreWriter& writer) { return removeAll(writer, access, objects); },
                  std::move(completion));
 }
 
@@ -62,7 +110,10 @@ void VSHealthStoreConnection::deleteAllSamples(std::vector<const VSObjectType*> 
                                                std::optional<std::string> sourceBundleIdentifier,
                                                Completion completion) {
     core_->write(
-        [types = std::move(types), source = std::move(sourceBundleIdentifier)](VSStoreWriter& writer) {
+        [&access = core_->access, types = std::move(types),
+         source = std::move(sourceBundleIdentifier)](VSStoreWriter& writer) {
+            if (auto objection = access.objectionToChanging({"", source.value_or("")}))
+                return VSStatus(*objection);
             for (const VSObjectType* type : types) writer.removeAll(type, source);
             return VSStatus();
         },
@@ -71,34 +122,44 @@ void VSHealthStoreConnection::deleteAllSamples(std::vector<const VSObjectType*> 
 
 void VSHealthStoreConnection::addSamplesToWorkout(std::vector<VSSamplePtr> samples, VSSamplePtr workout,
                                                   Completion completion) {
-    core_->write([samples = std::move(samples), workout = std::move(workout)](
-                     VSStoreWriter& writer) { return relate(writer, samples, *workout); },
+    core_->write([&access = core_->access, samples = std::move(samples), workout = std::move(workout)](
+                     VSStoreWriter& writer) { return relate(writer, access, samples, *workout); },
                  std::move(completion));
 }
 
 VSResult<std::vector<VSSamplePtr>> VSHealthStoreConnection::samples(
     const VSObjectType* type, const VSPredicate& predicate, int limit,
     const std::vector<VSSortDescriptor>& sort) {
-    return core_->readers.read(
-        [&](VSStoreReader& reader) { return reader.samples(type, predicate, limit, sort); });
+    return readOf(type, predicate,
+                  [&](VSStoreReader& reader) { return reader.samples(type, predicate, limit, sort); });
 }
 
 VSResult<VSCheckReport> VSHealthStoreConnection::check() {
+    if (auto objection = core_->access.objectionToManaging()) return *objection;
     return core_->readers.read([](VSStoreReader& reader) { return VSCheckStore(reader); });
 }
 
 VSResult<std::vector<VSHealthStore::TypeSummary>> VSHealthStoreConnection::typeSummaries() {
-    return core_->readers.read([](VSStoreReader& reader) {
+    return core_->readers.read([&access = core_->access](VSStoreReader& reader) {
         std::vector<TypeSummary> summaries;
-        auto rows = reader.database().use(
-            "SELECT type, sum(count), min(first_start), max(last_end) FROM type_sources GROUP BY type ORDER "
-            "BY type");
-        while (rows.step())
-            summaries.push_back({VSObjectType::dataTypeWithCode(static_cast<int>(rows.integer(0))),
-                                 rows.integer(1), VSDate::fromMicroseconds(rows.integer(2)),
-                                 VSDate::fromMicroseconds(rows.integer(3))});
+        for (const auto& [type, extent] : reader.extents()) {
+            if (access.mayRead(reader.database(), type, {}))
+                summaries.push_back({type, extent.count, VSDate::fromMicroseconds(extent.firstStart),
+                                     VSDate::fromMicroseconds(extent.lastEnd)});
+        }
+        std::sort(summaries.begin(), summaries.end(),
+                  [](const TypeSummary& a, const TypeSummary& b) { return a.type->code() < b.type->code(); });
         return summaries;
     });
+}
+
+void VSHealthStoreConnection::writeAsOwner(VSStoreCore::Change change, Completion completion) {
+    core_->write(
+        [&access = core_->access, change = std::move(change)](VSStoreWriter& writer) {
+            if (auto objection = access.objectionToManaging()) return VSStatus(*objection);
+            return change(writer);
+        },
+        std::move(completion));
 }
 
 VSResult<int64_t> VSHealthStoreConnection::databaseSizeInBytes() {

@@ -46,8 +46,8 @@ class VSHealthStoreConnection final : public VSHealthStore {
     VSResult<std::vector<SourceSummary>> sourceSummaries() override;
     VSResult<std::vector<TypeSummary>> typeSummaries() override;
     VSResult<VSCheckReport> check() override;
-    VSResult<std::unique_ptr<ImportTransaction>> beginImport(const std::string& name,
-                                                             VSDuration patience) override;
+    VSResult<std::unique_ptr<ImportTransaction>> beginImport(const std::string& name, VSDuration patience,
+                                                             const std::atomic<bool>* giveUp) override;
     VSResult<int64_t> databaseSizeInBytes() override;
     const std::filesystem::path& folder() const override { return core_->folder; }
     void allSources(std::function<void(const VSResult<std::vector<VSSource>>&)> completion) override;
@@ -67,6 +67,16 @@ class VSHealthStoreConnection final : public VSHealthStore {
     VSResult<VSUndoReport> undoBatch(int64_t batch) override;
 
  private:
+    /// Runs block(VSStoreReader&) in one snapshot, if this application may see such samples; else Refused.
+    template <typename Block>
+    auto readOf(const VSObjectType* type, const VSPredicate& predicate, Block block) {
+        return core_->readers.read([&](VSStoreReader& reader) {
+            core_->access.requireReading(reader.database(), type, predicate);
+            return block(reader);
+        });
+    }
+    /// A change that only the owner of the store may make.
+    void writeAsOwner(VSStoreCore::Change change, Completion completion);
     VSResult<int> characteristic(VSTypeCode code);
     void writeCharacteristic(const VSObjectType* type, std::optional<int64_t> value, Completion completion);
     const std::shared_ptr<VSStoreCore> core_;

@@ -3,9 +3,9 @@
 #include "Vessa/VSStoreCharacteristics.h"
 
 VSResult<std::optional<VSBirthDate>> VSHealthStoreConnection::dateOfBirth() {
-    return core_->readers.read([](VSStoreReader& reader) -> std::optional<VSBirthDate> {
-        const auto value =
-            VSReadCharacteristic(reader.database(), VSObjectType::dataTypeWithCode(VSCode::DateOfBirth));
+    const auto* type = VSObjectType::dataTypeWithCode(VSCode::DateOfBirth);
+    return readOf(type, {}, [type](VSStoreReader& reader) -> std::optional<VSBirthDate> {
+        const auto value = VSReadCharacteristic(reader.database(), type);
         if (!value) return std::nullopt;
         return VSBirthDateFromStored(*value);
     });
@@ -23,12 +23,16 @@ void VSHealthStoreConnection::setCharacteristic(const VSObjectType* type, int va
 
 void VSHealthStoreConnection::fetchMedicalIDData(
     std::function<void(const VSResult<std::optional<VSMedicalIDData>>&)> completion) {
-    core_->readLater([](VSStoreReader& reader) { return VSReadMedicalID(reader.database()); },
-                     std::move(completion));
+    core_->readLater(
+        [&access = core_->access](VSStoreReader& reader) {
+            if (auto objection = access.objectionToManaging()) throw VSDatabaseFailure(*objection);
+            return VSReadMedicalID(reader.database());
+        },
+        std::move(completion));
 }
 
 void VSHealthStoreConnection::updateMedicalIDData(VSMedicalIDData data, Completion completion) {
-    core_->write(
+    writeAsOwner(
         [data = std::move(data)](VSStoreWriter& writer) {
             VSWriteMedicalID(writer.database(), data);
             return VSStatus();
@@ -70,20 +74,34 @@ void VSHealthStoreConnection::getDefaultValue(
 }
 
 VSResult<int> VSHealthStoreConnection::characteristic(VSTypeCode code) {
-    return core_->readers.read([code](VSStoreReader& reader) {
-        return static_cast<int>(
-            VSReadCharacteristic(reader.database(), VSObjectType::dataTypeWithCode(code)).value_or(0));
+    const auto* type = VSObjectType::dataTypeWithCode(code);
+    return readOf(type, {}, [type](VSStoreReader& reader) {
+        return static_cast<int>(VSReadCharacteristic(reader.database(), type).value_or(0));
     });
 }
 
 void VSHealthStoreConnection::writeCharacteristic(const VSObjectType* type, std::optional<int64_t> value,
                                                   Completion completion) {
     core_->write(
-        [type, value](VSStoreWriter& writer) {
+        [&access = core_->access, type, value](VSStoreWriter& writer) {
+            if (auto objection = access.objectionToSharing(writer.database(), type))
+                return VSStatus(*objection);
             VSWriteCharacteristic(writer, type, value);
+            // What the person says is no import's any more, even where it is the same.
+            writer.database()
+                .use("DELETE FROM batch_characteristics WHERE type = ?")
+                .bind(1, VSTypeCodeValue(type->code()))
+                .run();
             return VSStatus();
         },
         std::move(completion));
 }
 
-void VSHealthStoreConnection::deleteMedicalIDData(Completion) {}
+void VSHealthStoreConnection::deleteMedicalIDData(Completion completion) {
+    writeAsOwner(
+        [](VSStoreWriter& writer) {
+            writer.database().use("DELETE FROM medical_id").run();
+            return VSStatus();
+        },
+        std::move(completion));
+}

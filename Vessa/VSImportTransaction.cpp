@@ -1,11 +1,15 @@
 #include "Vessa/VSImportTransaction.h"
 
+#include <algorithm>
+
 #include "Vessa/Base/VSEnvironment.h"
 #include "Vessa/VSStoreCharacteristics.h"
 #include "Vessa/VSStoreSchema.h"
 
 namespace {
 constexpr size_t typeCodes = 128;
+/// Opening waits for a migration at most; what writes to a store holds up nobody who opens it.
+constexpr VSDuration patienceToOpen = std::chrono::seconds(10);
 
 size_t codeOf(const VSSample& sample) {
     return static_cast<size_t>(VSTypeCodeValue(sample.sampleType()->code()));
@@ -23,13 +27,23 @@ void VSImportTransaction::Uses::set(int64_t id, Use use) {
     bits_[byte] = static_cast<uint8_t>(bits_[byte] | use << (id % 4 * 2));
 }
 
+VSNumberRanges VSImportTransaction::Uses::usedUpTo(int64_t last) const {
+    VSNumberRanges used;
+    for (int64_t id = 1; id <= last && static_cast<size_t>(id) / 4 < bits_.size(); ++id) {
+        if (has(id, TopLevel) || has(id, Member)) used.append({id, id});
+    }
+    return used;
+}
+
 VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> VSImportTransaction::begin(
-    std::shared_ptr<VSStoreCore> core, const std::string& name, VSDuration patience) {
+    std::shared_ptr<VSStoreCore> core, const std::string& name, VSDuration patience,
+    const std::atomic<bool>* giveUp) {
     if (core->options.readOnly)
         return VSError{VSErrorCode::NotAccessible, "the store was opened for reading only"};
     try {
-        auto database =
-            VSStoreSchema::openForWriting(core->folder, false, core->options.survivesPowerLoss, patience);
+        auto database = VSStoreSchema::openForWriting(core->folder, false, core->options.survivesPowerLoss,
+                                                      std::min(patience, patienceToOpen), giveUp);
+        database->setPatience(patience);
         database->execute("PRAGMA cache_size = -32768");
         return std::unique_ptr<ImportTransaction>(
             new VSImportTransaction(std::move(core), std::move(database), name));
@@ -49,6 +63,7 @@ VSImportTransaction::VSImportTransaction(std::shared_ptr<VSStoreCore> core,
       hadSamples_(typeCodes),
       hasNewTopLevel_(typeCodes),
       hasNewMembers_(typeCodes) {
+    database_->setGiveUp(nullptr);
     writer_.begin();
     lastBefore_ = writer_.lastNumber();
     auto types = database_->use("SELECT DISTINCT type FROM type_sources");
@@ -79,27 +94,34 @@ bool VSImportTransaction::mayBePresent(const VSSample& sample, Use use) const {
     return hadSamples_[type] || (use == TopLevel ? hasNewMembers_[type] : hasNewTopLevel_[type]);
 }
 
+int64_t VSImportTransaction::insert(const VSSample& sample) {
+    const int64_t id = writer_.insertAlone(sample, date_);
+    writer_.matcher().added(sample, id);
+    ++added_;
+    return id;
+}
+
 VSImportTransaction::Outcome VSImportTransaction::addRecord(const VSSample& sample) {
     if (mayBePresent(sample, TopLevel)) {
-        const int64_t found =
-            writer_.matcher().find(sample, [this](int64_t id) { return !uses_.has(id, TopLevel); });
+        const int64_t found = writer_.matcher().findAmongMany(
+            sample, TopLevel, [this](int64_t id) { return !uses_.has(id, TopLevel); });
         if (found) {
             uses_.set(found, TopLevel);
             return found <= lastBefore_ ? Outcome::AlreadyPresent : Outcome::Added;
         }
     }
-    const int64_t id = writer_.insertAlone(sample, date_);
+    const int64_t id = insert(sample);
     uses_.set(id, TopLevel);
     hasNewTopLevel_[codeOf(sample)] = true;
-    ++added_;
     return Outcome::Added;
 }
 
 VSImportTransaction::Outcome VSImportTransaction::addCorrelation(const VSCorrelation& correlation) {
-    const int64_t found =
-        !hadSamples_[codeOf(correlation)] ? 0 : writer_.matcher().find(correlation, [this](int64_t id) {
-            return id <= lastBefore_ && !uses_.has(id, TopLevel);
-        });
+    const int64_t found = !hadSamples_[codeOf(correlation)]
+                              ? 0
+                              : writer_.matcher().findAmongMany(correlation, TopLevel, [this](int64_t id) {
+                                    return id <= lastBefore_ && !uses_.has(id, TopLevel);
+                                });
     if (found) {
         uses_.set(found, TopLevel);
         for (const VSMemberKey& member : writer_.matcher().members(found)) uses_.set(member.id, Member);
@@ -107,9 +129,8 @@ VSImportTransaction::Outcome VSImportTransaction::addCorrelation(const VSCorrela
     }
     std::vector<VSMemberKey> members;
     for (const VSSamplePtr& object : correlation.objects()) members.push_back(addMember(*object));
-    const int64_t id = writer_.insertAlone(correlation, date_);
+    const int64_t id = insert(correlation);
     uses_.set(id, TopLevel);
-    ++added_;
     for (size_t index = 0; index < members.size(); ++index)
         writer_.insertMember(id, static_cast<int>(index), members[index]);
     return Outcome::Added;
@@ -118,11 +139,11 @@ VSImportTransaction::Outcome VSImportTransaction::addCorrelation(const VSCorrela
 VSMemberKey VSImportTransaction::addMember(const VSSample& member) {
     int64_t id = 0;
     if (mayBePresent(member, Member))
-        id = writer_.matcher().find(member, [this](int64_t row) { return !uses_.has(row, Member); });
+        id = writer_.matcher().findAmongMany(member, Member,
+                                             [this](int64_t row) { return !uses_.has(row, Member); });
     if (!id) {
-        id = writer_.insertAlone(member, date_);
+        id = insert(member);
         hasNewMembers_[codeOf(member)] = true;
-        ++added_;
     }
     uses_.set(id, Member);
     return {member.sampleType(), member.startDate().microseconds(), id};
@@ -135,9 +156,14 @@ VSResult<int> VSImportTransaction::setCharacteristicsIfUnset(std::optional<VSBir
         int set = 0;
         const auto setUnset = [&](VSTypeCode code, int64_t value) {
             const auto* type = VSObjectType::dataTypeWithCode(code);
-            if (!value || VSReadCharacteristic(*database_, type)) return;
-            VSWriteCharacteristic(writer_, type, value);
-            ++set;
+            if (!value) return;
+            const auto current = VSReadCharacteristic(*database_, type);
+            if (!current) {
+                VSWriteCharacteristic(writer_, type, value);
+                ++set;
+            }
+            if (current.value_or(value) == value)
+                characteristics_.try_emplace(VSTypeCodeValue(code), VSBatchCharacteristic{value, !current});
         };
         if (birthDate) setUnset(VSCode::DateOfBirth, VSStoredBirthDate(*birthDate));
         setUnset(VSCode::BiologicalSex, biologicalSex);
@@ -154,16 +180,13 @@ VSResult<int> VSImportTransaction::setCharacteristicsIfUnset(std::optional<VSBir
 VSStatus VSImportTransaction::commit() {
     if (!transaction_ || failure_) return ended();
     try {
-        if (added_) {
-            auto batch =
-                database_->use("INSERT INTO batches(name, date, first_id, last_id, added) VALUES (?, ?, ?, ?, ?)");
-            batch.bindText(1, name_)
-                .bind(2, date_.microseconds())
-                .bind(3, lastBefore_ + 1)
-                .bind(4, writer_.lastNumber())
-                .bind(5, added_)
-                .run();
-        }
+        const VSNewBatch batch{name_,
+                               date_,
+                               {lastBefore_ + 1, writer_.lastNumber()},
+                               added_,
+                               uses_.usedUpTo(lastBefore_),
+                               characteristics_};
+        if (!batch.isEmpty()) VSWriteBatch(*database_, batch);
         writer_.finish();
         transaction_->commit();
         transaction_.reset();

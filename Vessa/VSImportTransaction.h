@@ -1,17 +1,20 @@
 #pragma once
 
+#include <map>
 #include <memory>
 #include <vector>
 
 #include "Vessa/VSHealthStore.h"
+#include "Vessa/VSStoreBatches.h"
 #include "Vessa/VSStoreCore.h"
 
 /// An import into a store, on a writing connection of its own. Used by one thread.
 class VSImportTransaction final : public VSHealthStore::ImportTransaction {
  public:
-    /// Waits for the writer, at most `patience`.
+    /// Waits for the writer, at most `patience` and until *giveUp.
     static VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> begin(
-        std::shared_ptr<VSStoreCore> core, const std::string& name, VSDuration patience);
+        std::shared_ptr<VSStoreCore> core, const std::string& name, VSDuration patience,
+        const std::atomic<bool>* giveUp);
     ~VSImportTransaction() override;
 
     VSResult<Outcome> add(const VSSample& sample) override;
@@ -29,6 +32,8 @@ class VSImportTransaction final : public VSHealthStore::ImportTransaction {
      public:
         bool has(int64_t id, Use use) const;
         void set(int64_t id, Use use);
+        /// The rows up to this number that are used at all.
+        VSNumberRanges usedUpTo(int64_t last) const;
 
      private:
         std::vector<uint8_t> bits_;  // two bits a number, four numbers a byte
@@ -37,6 +42,7 @@ class VSImportTransaction final : public VSHealthStore::ImportTransaction {
     Outcome addRecord(const VSSample& sample);
     Outcome addCorrelation(const VSCorrelation& correlation);
     VSMemberKey addMember(const VSSample& member);
+    int64_t insert(const VSSample& sample);
     bool mayBePresent(const VSSample& sample, Use use) const;
     VSError ended() const;
 
@@ -51,6 +57,7 @@ class VSImportTransaction final : public VSHealthStore::ImportTransaction {
     std::vector<bool> hasNewTopLevel_, hasNewMembers_;  // by type: this import added such rows
     Uses uses_;
     int64_t added_ = 0;
+    std::map<int, VSBatchCharacteristic> characteristics_;  // by type code
     bool changedCharacteristics_ = false;
     std::optional<VSError> failure_;  // after the first one nothing goes on
 };

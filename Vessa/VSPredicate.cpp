@@ -1,7 +1,6 @@
 #include "Vessa/VSPredicate.h"
 
 #include <algorithm>
-#include <cassert>
 
 namespace {
 
@@ -12,14 +11,36 @@ void matchNothing(VSPredicate& predicate) {
     predicate.endDate = VSDate::distantFuture();
 }
 
-void joinDates(VSPredicate& a, const VSPredicate& b) {
+/// Says the same without options.
+void foldOptions(VSPredicate& predicate) {
+    if (predicate.startDate && (predicate.dateOptions & VSQueryOptionStrictStartDate))
+        predicate.startsFrom =
+            std::max(predicate.startsFrom.value_or(*predicate.startDate), *predicate.startDate);
+    if (predicate.endDate && (predicate.dateOptions & VSQueryOptionStrictEndDate))
+        predicate.endsBy = std::min(predicate.endsBy.value_or(*predicate.endDate), *predicate.endDate);
+    predicate.dateOptions = VSQueryOptionNone;
+}
+
+void joinLater(std::optional<VSDate>& a, const std::optional<VSDate>& b) {
+    if (b) a = std::max(a.value_or(*b), *b);
+}
+void joinEarlier(std::optional<VSDate>& a, const std::optional<VSDate>& b) {
+    if (b) a = std::min(a.value_or(*b), *b);
+}
+
+void joinDates(VSPredicate& a, VSPredicate b) {
     const bool hasRange = a.startDate || a.endDate, otherHasRange = b.startDate || b.endDate;
-    assert(!hasRange || !otherHasRange || a.dateOptions == b.dateOptions);
-    if (otherHasRange) a.dateOptions |= b.dateOptions;
-    if (b.startDate) a.startDate = a.startDate ? std::max(*a.startDate, *b.startDate) : *b.startDate;
-    if (b.endDate) a.endDate = a.endDate ? std::min(*a.endDate, *b.endDate) : *b.endDate;
-    if (b.startsBefore)
-        a.startsBefore = a.startsBefore ? std::min(*a.startsBefore, *b.startsBefore) : *b.startsBefore;
+    if (!hasRange) {
+        a.dateOptions = otherHasRange ? b.dateOptions : VSQueryOptionNone;
+    } else if (otherHasRange && a.dateOptions != b.dateOptions) {
+        foldOptions(a);
+        foldOptions(b);
+    }
+    joinLater(a.startDate, b.startDate);
+    joinEarlier(a.endDate, b.endDate);
+    joinEarlier(a.startsBefore, b.startsBefore);
+    joinLater(a.startsFrom, b.startsFrom);
+    joinEarlier(a.endsBy, b.endsBy);
 }
 
 /// Whether both want the same of what a sample has one of; afterwards `a` wants it too.
@@ -43,6 +64,8 @@ bool joinSources(std::vector<VSSource>& a, const std::vector<VSSource>& b) {
 
 bool matchesDates(const VSPredicate& predicate, VSDate start, VSDate end) {
     if (predicate.startsBefore && start >= *predicate.startsBefore) return false;
+    if (predicate.startsFrom && start < *predicate.startsFrom) return false;
+    if (predicate.endsBy && end > *predicate.endsBy) return false;
     if (predicate.endDate && start >= *predicate.endDate) return false;
     if (predicate.startDate && end <= *predicate.startDate &&
         !(start == end && start == *predicate.startDate))
@@ -94,8 +117,8 @@ VSPredicate VSPredicate::withCategoryValue(int value) {
 }
 
 bool VSPredicate::isDateRangeOnly() const {
-    return dateOptions == VSQueryOptionNone && !startsBefore && sources.empty() && !device &&
-           metadata.empty() && metadataKeys.empty() && !categoryValue && !noCorrelation;
+    return dateOptions == VSQueryOptionNone && !startsBefore && !startsFrom && !endsBy && sources.empty() &&
+           !device && metadata.empty() && metadataKeys.empty() && !categoryValue && !noCorrelation;
 }
 
 bool VSPredicate::matches(const VSSample& sample) const {

@@ -20,9 +20,11 @@ enum VSQueryOptions : int {
 struct VSPredicate {
     std::optional<VSDate> startDate, endDate;
     int dateOptions = VSQueryOptionNone;
-    /// The sample starts before this moment (exclusive); beside the range above.
-    std::optional<VSDate> startsBefore;
-    std::vector<VSSource> sources;  // of one of these; empty: of any
+    // Beside the range above:
+    std::optional<VSDate> startsBefore;  // the sample starts before this moment
+    std::optional<VSDate> startsFrom;    // starts at this moment or later
+    std::optional<VSDate> endsBy;        // ends at this moment or earlier
+    std::vector<VSSource> sources;       // of one of these; empty: of any
     std::optional<VSDevice> device;
     std::vector<std::pair<std::string, VSValue>> metadata;  // each key has this value
     std::vector<std::string> metadataKeys;                  // each key is present
@@ -37,7 +39,8 @@ struct VSPredicate {
     /// Nothing but (perhaps) a date range with options 0: what statistics answer from rollups.
     bool isDateRangeOnly() const;
     bool matches(const VSSample& sample) const;  // all but noCorrelation, which only the store knows
-    /// What matches both. Conditions that contradict each other (two category values) become a date range in
-    /// the distant future. REQUIRES: the date options are equal when both have a date range.
+    /// What matches both, whatever they ask. Conditions that contradict each other (two category values)
+    /// become a date range in the distant future; two ranges with different options become one without, and
+    /// what the options asked stands in startsFrom and endsBy.
     friend VSPredicate operator&(VSPredicate a, const VSPredicate& b);
 };

@@ -4,8 +4,13 @@
 
 namespace {
 constexpr size_t idleAtMost = 4;
-constexpr VSDuration readersPatience = std::chrono::seconds(10);
 }  // namespace
+
+VSError VSErrorNamingStore(VSError error, const std::filesystem::path& folder) {
+    if (error.code == VSErrorCode::Corrupt && error.message.find(folder.string()) == std::string::npos)
+        error.message = folder.string() + ": " + error.message;
+    return error;
+}
 
 std::unique_ptr<VSReaderPool::Connection> VSReaderPool::borrow() {
     {
@@ -16,7 +21,7 @@ std::unique_ptr<VSReaderPool::Connection> VSReaderPool::borrow() {
             return connection;
         }
     }
-    return std::make_unique<Connection>(VSStoreSchema::openForReading(folder_, readersPatience));
+    return std::make_unique<Connection>(VSStoreSchema::openForReading(folder_, patience_));
 }
 
 void VSReaderPool::giveBack(std::unique_ptr<Connection> connection) {

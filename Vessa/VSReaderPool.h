@@ -8,10 +8,15 @@
 #include "Vessa/Base/VSError.h"
 #include "Vessa/VSStoreReader.h"
 
+/// Of a damaged store: the same, with its folder in the message.
+VSError VSErrorNamingStore(VSError error, const std::filesystem::path& folder);
+
 /// Reading connections, lent to one user at a time. Any thread.
 class VSReaderPool {
  public:
-    explicit VSReaderPool(std::filesystem::path folder) : folder_(std::move(folder)) {}
+    /// `patience`: how long a store that is held by others is waited for.
+    VSReaderPool(std::filesystem::path folder, VSDuration patience)
+        : folder_(std::move(folder)), patience_(patience) {}
 
     /// Runs `block(VSStoreReader&)` in one snapshot of the store and answers what it returned, or the
     /// failure.
@@ -25,7 +30,7 @@ class VSReaderPool {
             giveBack(std::move(connection));
             return answer;
         } catch (const VSDatabaseFailure& failure) {
-            return failure.error();  // the connection is not used again
+            return VSErrorNamingStore(failure.error(), folder_);  // the connection is not used again
         }
     }
 
@@ -43,6 +48,7 @@ class VSReaderPool {
     void giveBack(std::unique_ptr<Connection> connection);
 
     const std::filesystem::path folder_;
+    const VSDuration patience_;
     std::mutex mutex_;
     std::vector<std::unique_ptr<Connection>> idle_;  // guarded by mutex_
 };

@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <bit>
+#include <cstring>
+#include <optional>
 
 #include "Vessa/VSStoreProvenances.h"
 #include "Vessa/VSStoreSchema.h"
@@ -10,17 +12,54 @@ static_assert(std::endian::native == std::endian::little, "the rollups on disk a
 
 namespace {
 
-constexpr size_t entriesKept = 1024;  // 4 MB
+constexpr size_t entriesKept = 512;  // 4 MB
 constexpr int dayBits = 28, sourceBits = 20;
 constexpr int64_t dayOffset = int64_t{1} << (dayBits - 1);
+constexpr size_t bitmapSize = VSQuartersPerDay / 8;
 
-struct Quarters {
-    int64_t first, last;
-};  // counted from 1970, both included
+// The first byte of a quarter on disk: what follows, and what follows from it.
+enum Form : unsigned {
+    Starts = 1,             // samples start in it
+    AllStart = 2,           // as many as touch it
+    ShareIsSum = 4,         // the share equals the sum of those that start
+    OneValue = 8,           // the greatest value is the least
+    CountsOfTwoBytes = 16,  // else of one
+    CountsOfFourBytes = 32
+};
 
-Quarters quartersOf(int64_t start, int64_t duration) {
-    const int64_t first = VSFloorDivide(start, VSQuarterMicroseconds);
-    return {first, duration == 0 ? first : VSFloorDivide(start + duration - 1, VSQuarterMicroseconds)};
+template <typename Number>
+void append(std::string& bytes, Number number, size_t size = sizeof(Number)) {
+    bytes.append(reinterpret_cast<const char*>(&number), size);
+}
+
+/// Reads an unsigned number of so many bytes, 8 at most.
+uint64_t take(const char*& next, const char* end, size_t size) {
+    uint64_t number = 0;
+    if (end - next >= 8) {  // a load of fixed size, which is fast
+        std::memcpy(&number, next, 8);
+        number = size < 8 ? number & ((uint64_t{1} << (8 * size)) - 1) : number;
+    } else {
+        if (end - next < static_cast<ptrdiff_t>(size)) VSThrowCorruptRollup();
+        std::memcpy(&number, next, size);
+    }
+    next += size;
+    return number;
+}
+
+/// How many bytes of a double are kept: those at the lower end that are 0 are not.
+size_t bytesOf(double number) {
+    const auto bits = std::bit_cast<uint64_t>(number);
+    return bits ? 8 - static_cast<size_t>(std::countr_zero(bits)) / 8 : 0;
+}
+
+void appendDouble(std::string& bytes, double number, size_t size) {
+    bytes.append(reinterpret_cast<const char*>(&number) + (8 - size), size);
+}
+
+double takeDouble(const char*& next, const char* end, size_t size) {
+    if (size == 0) return 0;
+    if (size > 8) VSThrowCorruptRollup();
+    return std::bit_cast<double>(take(next, end, size) << (64 - 8 * size));
 }
 
 }  // namespace
@@ -42,6 +81,66 @@ int VSRollupTypeOfSlot(int64_t slot) {
     return static_cast<int>(slot >> (dayBits + sourceBits));
 }
 
+VSQuarterRange VSQuartersOfSpan(int64_t start, int64_t duration) {
+    const int64_t first = VSFloorDivide(start, VSQuarterMicroseconds);
+    return {first, duration == 0 ? first : VSFloorDivide(start + duration - 1, VSQuarterMicroseconds)};
+}
+
+VSQuarterBits VSQuartersPresent(std::string_view bytes) {
+    if (bytes.size() < bitmapSize) VSThrowCorruptRollup();
+    VSQuarterBits bits = 0;
+    std::memcpy(&bits, bytes.data(), bitmapSize);
+    return bits;
+}
+
+void VSAppendQuarterBits(VSQuarterBits bits, std::string& bytes) {
+    append(bytes, bits, bitmapSize);
+}
+
+// VSRollupQuarter
+
+void VSRollupQuarter::appendTo(std::string& bytes) const {
+    unsigned form = 0;
+    if (starting) form |= Starts;
+    if (starting == touching) form |= AllStart;
+    if (share == startingSum) form |= ShareIsSum;
+    if (std::bit_cast<uint64_t>(minimum) == std::bit_cast<uint64_t>(maximum)) form |= OneValue;
+    if (touching > UINT16_MAX)
+        form |= CountsOfFourBytes;
+    else if (touching > UINT8_MAX)
+        form |= CountsOfTwoBytes;
+    const size_t countSize = form & CountsOfFourBytes ? 4 : form & CountsOfTwoBytes ? 2 : 1;
+    append(bytes, static_cast<uint8_t>(form));
+    append(bytes, touching, countSize);
+    if (form & Starts) {
+        if (!(form & AllStart)) append(bytes, starting, countSize);
+        startingSum.appendTo(bytes);
+        const size_t ofMinimum = bytesOf(minimum), ofMaximum = form & OneValue ? 0 : bytesOf(maximum);
+        append(bytes, static_cast<uint8_t>(ofMinimum | ofMaximum << 4));
+        appendDouble(bytes, minimum, ofMinimum);
+        appendDouble(bytes, maximum, ofMaximum);
+    }
+    if (!(form & ShareIsSum)) share.appendTo(bytes);
+}
+
+void VSRollupQuarter::readFrom(const char*& next, const char* end) {
+    const auto form = take(next, end, 1);
+    const size_t countSize = form & CountsOfFourBytes ? 4 : form & CountsOfTwoBytes ? 2 : 1;
+    touching = static_cast<uint32_t>(take(next, end, countSize));
+    if (form & Starts) {
+        starting = form & AllStart ? touching : static_cast<uint32_t>(take(next, end, countSize));
+        if (!startingSum.readFrom(next, end)) VSThrowCorruptRollup();
+        const auto sizes = take(next, end, 1);
+        minimum = takeDouble(next, end, sizes & 15);
+        maximum = takeDouble(next, end, sizes >> 4);
+        if (form & OneValue) maximum = minimum;
+    }
+    if (form & ShareIsSum)
+        share = startingSum;
+    else if (!share.readFrom(next, end))
+        VSThrowCorruptRollup();
+}
+
 // VSDayRollup
 
 bool VSDayRollup::isEmpty() const {
@@ -51,33 +150,35 @@ bool VSDayRollup::isEmpty() const {
 
 void VSDayRollup::add(int64_t day, int64_t start, int64_t duration, double value) {
     if (duration > VSStoreSchema::longSpan.count()) return;
-    const auto [first, last] = quartersOf(start, duration);
+    const auto [first, last] = VSQuartersOfSpan(start, duration);
     const int64_t dayStart = day * VSQuartersPerDay;
     const int64_t from = std::max(first, dayStart), to = std::min(last, dayStart + VSQuartersPerDay - 1);
+    std::optional<VSExactSpan> span;
+    if (first != last) span.emplace(value, duration);
     for (int64_t index = from; index <= to; ++index) {
         VSRollupQuarter& quarter = quarters[static_cast<size_t>(index - dayStart)];
         ++quarter.touching;
-        if (first == last) {
-            quarter.share += value;
-        } else {
-            const int64_t begin = std::max(start, index * VSQuarterMicroseconds);
-            const int64_t end = std::min(start + duration, (index + 1) * VSQuarterMicroseconds);
-            quarter.share += value * (static_cast<double>(end - begin) / static_cast<double>(duration));
-        }
+        quarter.share += span ? span->part(std::max<int64_t>(index * VSQuarterMicroseconds - start, 0),
+                                           std::min((index + 1) * VSQuarterMicroseconds - start, duration))
+                              : VSExactSum(value);
         if (index != first) continue;
-        quarter.minimum = quarter.starting ? std::min(quarter.minimum, value) : value;
-        quarter.maximum = quarter.starting ? std::max(quarter.maximum, value) : value;
+        const double plain = value + 0.0;  // no minus zero: it would depend on the order
+        quarter.minimum = quarter.starting ? std::min(quarter.minimum, plain) : plain;
+        quarter.maximum = quarter.starting ? std::max(quarter.maximum, plain) : plain;
         ++quarter.starting;
-        quarter.startingSum += value;
+        quarter.startingSum += VSExactSum(value);
     }
 }
 
 std::string VSDayRollup::encoded() const {
-    std::string bytes(VSQuartersPerDay / 8, '\0');
-    for (size_t index = 0; index < quarters.size(); ++index) {
-        if (quarters[index].touching == 0) continue;
-        bytes[index / 8] = static_cast<char>(bytes[index / 8] | 1 << (index % 8));
-        bytes.append(reinterpret_cast<const char*>(&quarters[index]), sizeof(VSRollupQuarter));
+    VSQuarterBits present = 0;
+    for (int index = 0; index < VSQuartersPerDay; ++index) {
+        if (quarters[static_cast<size_t>(index)].touching) present |= VSQuarterBit(index);
+    }
+    std::string bytes;
+    VSAppendQuarterBits(present, bytes);
+    for (const VSRollupQuarter& quarter : quarters) {
+        if (quarter.touching) quarter.appendTo(bytes);
     }
     return bytes;
 }
@@ -107,50 +208,57 @@ VSRollupWriter::Entry& VSRollupWriter::entry(int64_t slot) {
     return *lastEntry_;
 }
 
-void VSRollupWriter::add(int type, int64_t source, int64_t start, int64_t duration, double value) {
-    if (duration > VSStoreSchema::longSpan.count()) return;
-    const auto [first, last] = quartersOf(start, duration);
+/// Calls block(day, first quarter, last quarter) for each day that a span touches.
+template <typename Block>
+static void forEachDay(int64_t start, int64_t duration, Block block) {
+    const auto [first, last] = VSQuartersOfSpan(start, duration);
     for (int64_t day = VSFloorDivide(first, VSQuartersPerDay); day <= VSFloorDivide(last, VSQuartersPerDay);
          ++day) {
-        entry(VSRollupSlot(type, source, day)).rollup.add(day, start, duration, value);
+        const int64_t dayStart = day * VSQuartersPerDay;
+        block(day, static_cast<int>(std::max<int64_t>(first - dayStart, 0)),
+              static_cast<int>(std::min<int64_t>(last - dayStart, VSQuartersPerDay - 1)));
     }
+}
+
+void VSRollupWriter::add(int type, int64_t source, int64_t start, int64_t duration, double value) {
+    if (duration > VSStoreSchema::longSpan.count()) return;
+    forEachDay(start, duration, [&](int64_t day, int first, int last) {
+        Entry& changing = entry(VSRollupSlot(type, source, day));
+        changing.rollup.add(day, start, duration, value);
+        changing.changed.include(first, last);
+    });
 }
 
 void VSRollupWriter::rebuild(int type, int64_t source, int64_t start, int64_t duration) {
     if (duration > VSStoreSchema::longSpan.count()) return;
-    const auto [first, last] = quartersOf(start, duration);
-    for (int64_t day = VSFloorDivide(first, VSQuartersPerDay); day <= VSFloorDivide(last, VSQuartersPerDay);
-         ++day) {
-        rebuild_.insert(VSRollupSlot(type, source, day));
-    }
+    forEachDay(start, duration, [&](int64_t day, int first, int last) {
+        rebuild_[VSRollupSlot(type, source, day)].include(first, last);
+    });
 }
 
 void VSRollupWriter::write(int64_t slot, const VSDayRollup& rollup) {
-    if (rollup.isEmpty()) {
-        database_.use("DELETE FROM rollups WHERE slot = ?").bind(1, slot).run();
-        return;
-    }
-    const std::string bytes = rollup.encoded();
-    database_
-        .use(
-            "INSERT INTO rollups(slot, quarters) VALUES (?1, ?2) ON CONFLICT(slot) DO UPDATE SET quarters = "
-            "?2")
-        .bind(1, slot)
-        .bindBlob(2, bytes.data(), bytes.size())
-        .run();
+    VSWriteRollupRow(database_, slot, rollup.isEmpty() ? std::string() : rollup.encoded());
+}
+
+void VSRollupWriter::note(int64_t slot, const Changed& changed) {
+    changes_[{VSRollupTypeOfSlot(slot), VSRollupDayOfSlot(slot)}].include(changed.first, changed.last);
 }
 
 void VSRollupWriter::writeEntries() {
-    for (const auto& [slot, entry] : entries_) write(slot, entry->rollup);
+    for (const auto& [slot, entry] : entries_) {
+        write(slot, entry->rollup);
+        note(slot, entry->changed);
+    }
     entries_.clear();
     lastEntry_ = nullptr;
 }
 
 void VSRollupWriter::flush(VSStoreProvenances& provenances) {
     writeEntries();
-    for (int64_t slot : rebuild_) {
+    for (const auto& [slot, changed] : rebuild_) {
         write(slot, VSRollupFromSamples(database_, provenances, VSRollupTypeOfSlot(slot),
                                         VSRollupSourceOfSlot(slot), VSRollupDayOfSlot(slot)));
+        note(slot, changed);
     }
     rebuild_.clear();
 }
@@ -159,30 +267,37 @@ void VSRollupWriter::clear() {
     entries_.clear();
     lastEntry_ = nullptr;
     rebuild_.clear();
+    changes_.clear();
+}
+
+void VSWriteRollupRow(VSDatabase& database, int64_t slot, const std::string& bytes) {
+    if (bytes.empty()) {
+        database.use("DELETE FROM rollups WHERE slot = ?").bind(1, slot).run();
+        return;
+    }
+    database
+        .use(
+            "INSERT INTO rollups(slot, quarters) VALUES (?1, ?2) ON CONFLICT(slot) DO UPDATE SET quarters = "
+            "?2")
+        .bind(1, slot)
+        .bindBlob(2, bytes.data(), bytes.size())
+        .run();
 }
 
 VSDayRollup VSRollupFromSamples(VSDatabase& database, VSStoreProvenances& provenances, int type,
                                 int64_t source, int64_t day) {
-    struct Row {
-        int64_t id, start, duration;
-        double value;
-    };
-    std::vector<Row> rows;
     auto statement = database.use(
-        "SELECT id, start, duration, value, provenance FROM samples WHERE type = ?1 AND start >= ?2 AND "
+        "SELECT start, duration, value, provenance FROM samples WHERE type = ?1 AND start >= ?2 AND "
         "start < ?3"
         " AND start + duration >= ?4 AND duration <= " VS_LONG_SPAN_SQL);
     const int64_t dayStart = day * VSDayMicroseconds;
     auto longest = database.use("SELECT longest FROM types WHERE type = ?");
     const int64_t back = longest.bind(1, type).step() ? longest.integer(0) : VSStoreSchema::longSpan.count();
     statement.bind(1, type).bind(2, dayStart - back).bind(3, dayStart + VSDayMicroseconds).bind(4, dayStart);
-    while (statement.step()) {
-        if (provenances.sourceOfProvenance(statement.integer(4)) != source) continue;
-        rows.push_back({statement.integer(0), statement.integer(1), statement.integer(2), statement.real(3)});
-    }
-    // In the order of insertion, as they were added one by one: floating-point sums depend on it.
-    std::sort(rows.begin(), rows.end(), [](const Row& a, const Row& b) { return a.id < b.id; });
     VSDayRollup rollup;
-    for (const Row& row : rows) rollup.add(day, row.start, row.duration, row.value);
+    while (statement.step()) {
+        if (provenances.sourceOfProvenance(statement.integer(3)) == source)
+            rollup.add(day, statement.integer(0), statement.integer(1), statement.real(2));
+    }
     return rollup;
 }

@@ -1,17 +1,16 @@
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <cstdint>
-#include <cstring>
 #include <map>
 #include <memory>
-#include <set>
 #include <string>
 #include <string_view>
-#include <vector>
+#include <utility>
 
 #include "Vessa/VSDatabase.h"
-#include "Vessa/VSObject.h"
+#include "Vessa/VSExactSum.h"
 
 class VSStoreProvenances;
 
@@ -27,19 +26,28 @@ constexpr int64_t VSCeilingDivide(int64_t a, int64_t b) {
     return a / b + (a % b > 0 ? 1 : 0);
 }
 
-/// What one quarter of an hour holds of one type and source. The layout is that on disk (little-endian).
+/// A bit for each quarter of a day, the first one lowest.
+__extension__ using VSQuarterBits = unsigned __int128;
+constexpr VSQuarterBits VSQuarterBit(int index) {
+    return VSQuarterBits{1} << index;
+}
+
+/// What one quarter of an hour holds of one type and source.
 struct VSRollupQuarter {
-    uint32_t starting = 0;   // samples that start in it
-    uint32_t touching = 0;   // samples that have a part of their span, or their moment, in it
-    double startingSum = 0;  // of the values of those that start in it
-    double share = 0;        // of each span the part of its value that falls into it, in proportion to time
+    uint32_t starting = 0;            // samples that start in it
+    uint32_t touching = 0;            // samples that have a part of their span, or their moment, in it
+    VSExactSum startingSum;           // of the values of those that start in it
+    VSExactSum share;                 // of each span the part of its value that falls into it
     double minimum = 0, maximum = 0;  // of those that start in it; 0 when none does
 
+    void appendTo(std::string& bytes) const;
+    /// Reads what appendTo wrote. Throws VSDatabaseFailure (Corrupt).
+    void readFrom(const char*& next, const char* end);
     friend bool operator==(const VSRollupQuarter&, const VSRollupQuarter&) = default;
 };
-static_assert(sizeof(VSRollupQuarter) == 40);
 
-/// The quarters of one day (UTC) of one type and source.
+/// The quarters of one day (UTC) of one type and source. What it holds does not depend on the order in which
+/// samples are added.
 struct VSDayRollup {
     std::array<VSRollupQuarter, VSQuartersPerDay> quarters;
 
@@ -54,10 +62,24 @@ struct VSDayRollup {
     friend bool operator==(const VSDayRollup&, const VSDayRollup&) = default;
 };
 
-/// The quarters of an encoded day without making them all: calls block(index, quarter) for each that holds
-/// something, ascending. Throws as VSDayRollup::decoded.
+/// Which quarters an encoded day holds. Throws VSDatabaseFailure (Corrupt).
+VSQuarterBits VSQuartersPresent(std::string_view bytes);
+void VSAppendQuarterBits(VSQuarterBits bits, std::string& bytes);
+
+/// The parts of an encoded day without making it: calls block(index, part) for each quarter that holds
+/// something, ascending. Throws VSDatabaseFailure (Corrupt).
+template <typename Part, typename Block>
+void VSForEachQuarter(std::string_view bytes, Block block);
 template <typename Block>
-void VSForEachRollupQuarter(std::string_view bytes, Block block);
+void VSForEachRollupQuarter(std::string_view bytes, Block block) {
+    VSForEachQuarter<VSRollupQuarter>(bytes, block);
+}
+
+/// The first and the last quarter that a span touches, counted from 1970.
+struct VSQuarterRange {
+    int64_t first, last;
+};
+VSQuarterRange VSQuartersOfSpan(int64_t start, int64_t duration);
 
 /// The row of a day: type, source and day in one number, in this order.
 int64_t VSRollupSlot(int type, int64_t source, int64_t day);
@@ -79,40 +101,59 @@ class VSRollupWriter {
     /// Forgets what was not flushed (a transaction that is rolled back).
     void clear();
 
+    /// By type and day, the first and last quarter of the day of which the rollup of any source changed.
+    struct Changed {
+        int first = VSQuartersPerDay, last = -1;
+        void include(int from, int to) {
+            first = std::min(first, from);
+            last = std::max(last, to);
+        }
+    };
+    using Changes = std::map<std::pair<int, int64_t>, Changed>;
+    /// Since the last call. REQUIRES: flushed.
+    Changes takeChanges() { return std::exchange(changes_, {}); }
+
  private:
     struct Entry {
         VSDayRollup rollup;
+        Changed changed;
     };
     Entry& entry(int64_t slot);
     void write(int64_t slot, const VSDayRollup& rollup);
     void writeEntries();
+    void note(int64_t slot, const Changed& changed);
 
     VSDatabase& database_;
     std::map<int64_t, std::unique_ptr<Entry>> entries_;
     int64_t lastSlot_ = 0;
     Entry* lastEntry_ = nullptr;
-    std::set<int64_t> rebuild_;
+    std::map<int64_t, Changed> rebuild_;
+    Changes changes_;
 };
+
+/// Writes a row of `rollups`, or removes it when there are no bytes.
+void VSWriteRollupRow(VSDatabase& database, int64_t slot, const std::string& bytes);
 
 /// The rollup of a day made anew from its samples: what `rollups` must hold, bit for bit.
 VSDayRollup VSRollupFromSamples(VSDatabase& database, VSStoreProvenances& provenances, int type,
                                 int64_t source, int64_t day);
 
+/// Makes all rollups, merged rows and noted orders of the store anew from its samples, in one pass, inside a
+/// writing transaction. REQUIRES: `type_sources` and `source_order` are right. Throws VSDatabaseFailure.
+void VSRebuildAllRollups(VSDatabase& database);
+
 [[noreturn]] void VSThrowCorruptRollup();
 
-template <typename Block>
-void VSForEachRollupQuarter(std::string_view bytes, Block block) {
-    constexpr size_t bitmapSize = VSQuartersPerDay / 8;
-    if (bytes.size() < bitmapSize) VSThrowCorruptRollup();
-    const char* next = bytes.data() + bitmapSize;
+template <typename Part, typename Block>
+void VSForEachQuarter(std::string_view bytes, Block block) {
+    const char* next = bytes.data() + VSQuartersPerDay / 8;
     const char* end = bytes.data() + bytes.size();
+    const VSQuarterBits present = VSQuartersPresent(bytes);
     for (int index = 0; index < VSQuartersPerDay; ++index) {
-        if (!(static_cast<unsigned char>(bytes[static_cast<size_t>(index / 8)]) >> (index % 8) & 1)) continue;
-        if (end - next < static_cast<ptrdiff_t>(sizeof(VSRollupQuarter))) VSThrowCorruptRollup();
-        VSRollupQuarter quarter;
-        std::memcpy(&quarter, next, sizeof quarter);
-        next += sizeof quarter;
-        block(index, quarter);
+        if (!(present & VSQuarterBit(index))) continue;
+        Part part;
+        part.readFrom(next, end);
+        block(index, part);
     }
     if (next != end) VSThrowCorruptRollup();
 }

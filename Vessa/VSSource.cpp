@@ -6,6 +6,8 @@
 
 namespace {
 
+const std::string kImportedPrefix = "import.";
+
 struct DeviceField {
     std::string_view name;
     std::optional<std::string> VSDevice::*value;
@@ -89,7 +91,11 @@ const VSSource& VSSource::application() {
 }
 
 VSSource VSSource::forImportedName(const std::string& name) {
-    return name == application().name ? application() : VSSource{name, "import." + name};
+    return name == application().name ? application() : VSSource{name, kImportedPrefix + name};
+}
+
+bool VSSource::isImported() const {
+    return bundleIdentifier == kImportedPrefix + name;
 }
 
 std::string VSDevice::description() const {

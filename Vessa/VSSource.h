@@ -17,6 +17,8 @@ struct VSSource {
     /// The source of a document's `sourceName`: the application's own when it has that name.
     static VSSource forImportedName(const std::string& name);
     bool isApplication() const { return *this == application(); }
+    /// Whether it stands for a document's `sourceName`.
+    bool isImported() const;
 };
 
 struct VSSourceRevision {

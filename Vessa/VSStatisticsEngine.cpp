@@ -2,7 +2,6 @@
 
 #include <algorithm>
 
-#include "Vessa/VSRollup.h"
 #include "Vessa/VSStoreSchema.h"
 
 namespace {
@@ -10,16 +9,25 @@ namespace {
 /// Beyond this many partial quarters one pass over the samples is cheaper than rollups with a look at each.
 constexpr size_t partialSegmentsAtMost = 16;
 
+void requirePositive(const VSDateComponents& interval) {
+    const int parts[] = {interval.years, interval.months,  interval.days,
+                         interval.hours, interval.minutes, interval.seconds};
+    if (interval.isZero() ||
+        std::any_of(std::begin(parts), std::end(parts), [](int part) { return part < 0; }))
+        throw VSDatabaseFailure({VSErrorCode::Invalid, "the interval of the buckets is not positive"});
+}
+
 }  // namespace
 
-void VSStatisticsEngine::Gathered::addStarting(int64_t samples, double total, double low, double high) {
+void VSStatisticsEngine::Gathered::addStarting(int64_t samples, const VSExactSum& total, double low,
+                                               double high) {
     minimum = count ? std::min(minimum, low) : low;
     maximum = count ? std::max(maximum, high) : high;
     count += samples;
     startingSum += total;
 }
 
-void VSStatisticsEngine::Gathered::addShare(double share) {
+void VSStatisticsEngine::Gathered::addShare(const VSExactSum& share) {
     touched = true;
     sum += share;
 }
@@ -34,6 +42,9 @@ class VSStatisticsEngine::RollupCursor {
         next();
     }
     void next() { valid = rows_.step(); }
+    void skipTo(int64_t wanted) {
+        while (valid && day() < wanted) next();
+    }
     int64_t day() const { return VSRollupDayOfSlot(rows_.integer(0)); }
     std::string_view quarters() const { return rows_.blob(1); }
 
@@ -42,45 +53,6 @@ class VSStatisticsEngine::RollupCursor {
 
  private:
     VSStatement rows_;
-};
-
-/// Moments that samples of earlier sources cover, as separate spans in ascending order.
-class VSStatisticsEngine::Cover {
- public:
-    bool contains(int64_t moment) const {
-        const auto next = after(moment);
-        return next != spans_.begin() && moment < std::prev(next)->second;
-    }
-    /// Calls block(from, to) for each part of [from, to) that is not covered.
-    template <typename Block>
-    void forEachGap(int64_t from, int64_t to, Block block) const {
-        auto next = after(from);
-        if (next != spans_.begin()) from = std::max(from, std::prev(next)->second);
-        for (; next != spans_.end() && next->first < to; ++next) {
-            if (from < next->first) block(from, next->first);
-            from = std::max(from, next->second);
-        }
-        if (from < to) block(from, to);
-    }
-    void add(std::vector<std::pair<int64_t, int64_t>> spans) {
-        spans_.insert(spans_.end(), spans.begin(), spans.end());
-        std::sort(spans_.begin(), spans_.end());
-        size_t kept = 0;
-        for (const auto& span : spans_) {
-            if (kept && span.first <= spans_[kept - 1].second)
-                spans_[kept - 1].second = std::max(spans_[kept - 1].second, span.second);
-            else
-                spans_[kept++] = span;
-        }
-        spans_.resize(kept);
-    }
-
- private:
-    std::vector<std::pair<int64_t, int64_t>>::const_iterator after(int64_t moment) const {
-        return std::upper_bound(spans_.begin(), spans_.end(), moment,
-                                [](int64_t value, const auto& span) { return value < span.first; });
-    }
-    std::vector<std::pair<int64_t, int64_t>> spans_;
 };
 
 VSStatisticsEngine::VSStatisticsEngine(VSStoreReader& reader, const VSObjectType* type,
@@ -94,7 +66,7 @@ VSStatisticsEngine::VSStatisticsEngine(VSStoreReader& reader, const VSObjectType
 
 bool VSStatisticsEngine::findRange() {
     sources_ = reader_.orderedSources(type_);
-    const auto extent = reader_.extent(type_);
+    const auto extent = extentOfSources();
     if (!extent.count) return false;
     from_ = extent.firstStart;
     to_ = extent.lastEnd + 1;  // a sample without length lies at its end
@@ -102,6 +74,22 @@ bool VSStatisticsEngine::findRange() {
     if (predicate_.endDate) to_ = std::min(to_, predicate_.endDate->microseconds());
     merging_ = sources_.size() > 1 && type_->isCumulative() && (options_ & VSStatisticsOptionCumulativeSum);
     return from_ < to_;
+}
+
+/// Of those that the predicate asks for: when others began and ended is not its business.
+VSStoreReader::Extent VSStatisticsEngine::extentOfSources() const {
+    const auto& wanted = predicate_.sources;
+    if (wanted.empty()) return reader_.extent(type_);
+    VSStoreReader::Extent extent;
+    for (int64_t source : sources_) {
+        if (std::find(wanted.begin(), wanted.end(), reader_.provenances().source(source)) == wanted.end())
+            continue;
+        const auto own = reader_.extent(type_, source);
+        extent.count += own.count;
+        extent.firstStart = std::min(extent.firstStart, own.firstStart);
+        extent.lastEnd = std::max(extent.lastEnd, own.lastEnd);
+    }
+    return extent;
 }
 
 VSStatistics VSStatisticsEngine::statistics() {
@@ -119,12 +107,14 @@ VSStatistics VSStatisticsEngine::statistics() {
 
 std::vector<VSStatistics> VSStatisticsEngine::buckets(VSDate anchor, const VSDateComponents& interval,
                                                       const VSCalendar& calendar) {
+    requirePositive(interval);
     std::vector<VSStatistics> result;
     if (!findRange()) return result;
     std::vector<int64_t> borders;
     for (VSDate border : calendar.bucketBoundaries(anchor, interval, VSDate::fromMicroseconds(from_),
                                                    VSDate::fromMicroseconds(to_)))
         borders.push_back(border.microseconds());
+    if (borders.size() < 2) return result;
     gather(std::move(borders));
     const bool countsOnly = (options_ & ~VSStatisticsOptionSeparateBySource) == 0;
     for (size_t bucket = 0; bucket < gathered_.size(); ++bucket) {
@@ -196,6 +186,10 @@ void VSStatisticsEngine::gatherRollups(const Segment& segment) {
                                                          VSRollupSlot(type, sources_[rank], firstDay),
                                                          VSRollupSlot(type, sources_[rank], lastDay)));
     }
+    RollupCursor merged(reader_.database(), 0, VSRollupSlot(type, VSMergedSource, firstDay),
+                        VSRollupSlot(type, VSMergedSource, lastDay));
+    // Rows that were merged in another order are of no use.
+    if (!merging_ || VSOrderOfMergedRows(reader_.database(), type) != sources_) merged.valid = false;
     std::vector<RollupCursor*> today;
     for (;;) {
         int64_t day = INT64_MAX;
@@ -207,50 +201,54 @@ void VSStatisticsEngine::gatherRollups(const Segment& segment) {
         for (const auto& cursor : cursors) {
             if (cursor->valid && cursor->day() == day) today.push_back(cursor.get());
         }
-        gatherDay(day, today, segment, conflicts);
+        merged.skipTo(day);
+        gatherDay(day, today, merged, segment, conflicts);
         for (RollupCursor* cursor : today) cursor->next();
     }
     cursors.clear();
-    std::sort(conflicts.begin(), conflicts.end(),
-              [](const Segment& a, const Segment& b) { return a.from < b.from; });
-    Segment pending{INT64_MIN, INT64_MIN, false};
-    for (const Segment& conflict : conflicts) {
-        if (conflict.from > pending.to) {
-            if (pending.from < pending.to) gatherSamples(pending, Merged);
-            pending = conflict;
-        }
-        pending.to = std::max(pending.to, conflict.to);
-    }
-    if (pending.from < pending.to) gatherSamples(pending, Merged);
+    for (const Segment& conflict : united(std::move(conflicts))) gatherSamples(conflict, Merged);
 }
 
-void VSStatisticsEngine::gatherDay(int64_t day, std::vector<RollupCursor*>& cursors, const Segment& segment,
+/// The same moments in separate segments, ascending.
+std::vector<VSStatisticsEngine::Segment> VSStatisticsEngine::united(std::vector<Segment> segments) {
+    std::sort(segments.begin(), segments.end(),
+              [](const Segment& a, const Segment& b) { return a.from < b.from; });
+    std::vector<Segment> result;
+    for (const Segment& segment : segments) {
+        if (!result.empty() && segment.from <= result.back().to)
+            result.back().to = std::max(result.back().to, segment.to);
+        else
+            result.push_back(segment);
+    }
+    return result;
+}
+
+void VSStatisticsEngine::gatherDay(int64_t day, const std::vector<RollupCursor*>& cursors,
+                                   const RollupCursor& merged, const Segment& segment,
                                    std::vector<Segment>& conflicts) {
     const int64_t dayStart = day * VSDayMicroseconds;
-    std::array<uint8_t, VSQuartersPerDay> sourcesIn{};
+    VSQuarterBits once = 0, twice = 0, metByLongSpans = 0;  // quarters with samples of one source, of several
     if (merging_) {
-        if (cursors.size() > 1) {
-            for (RollupCursor* cursor : cursors)
-                VSForEachRollupQuarter(cursor->quarters(), [&](int index, const VSRollupQuarter&) {
-                    uint8_t& count = sourcesIn[static_cast<size_t>(index)];
-                    count = static_cast<uint8_t>(std::min(count + 1, 2));
-                });
+        for (const RollupCursor* cursor : cursors) {
+            const VSQuarterBits present = VSQuartersPresent(cursor->quarters());
+            twice |= once & present;
+            once |= present;
         }
-        // The first conflicts of the list are long spans: theirs are all quarters that they meet.
-        const size_t longSpans = conflicts.size();
         for (int index = 0; index < VSQuartersPerDay; ++index) {
-            uint8_t& count = sourcesIn[static_cast<size_t>(index)];
             const int64_t start = dayStart + index * VSQuarterMicroseconds;
-            if (start < segment.from || start >= segment.to) continue;
-            if (count > 1) {
-                if (conflicts.size() > longSpans && conflicts.back().to == start)
-                    conflicts.back().to += VSQuarterMicroseconds;
-                else
-                    conflicts.push_back({start, start + VSQuarterMicroseconds, false});
-            }
+            if (start < segment.from || start >= segment.to) twice &= ~VSQuarterBit(index);
+            if (isLongConflict(start)) metByLongSpans |= VSQuarterBit(index);
+        }
+        // The samples of quarters that long spans meet are asked for anyway.
+        const VSQuarterBits missing = gatherMergedDay(dayStart, twice & ~metByLongSpans, merged);
+        for (int index = 0; index < VSQuartersPerDay; ++index) {
+            const int64_t start = dayStart + index * VSQuarterMicroseconds;
+            if (missing & VSQuarterBit(index))
+                conflicts.push_back({start, start + VSQuarterMicroseconds, false});
         }
     }
-    for (RollupCursor* cursor : cursors) {
+    const VSQuarterBits answeredElsewhere = twice | metByLongSpans;
+    for (const RollupCursor* cursor : cursors) {
         VSForEachRollupQuarter(cursor->quarters(), [&](int index, const VSRollupQuarter& quarter) {
             const int64_t start = dayStart + index * VSQuarterMicroseconds;
             if (start < segment.from || start >= segment.to) return;
@@ -258,8 +256,7 @@ void VSStatisticsEngine::gatherDay(int64_t day, std::vector<RollupCursor*>& curs
             Gathered& gathered = gathered_[bucket];
             if (quarter.starting)
                 gathered.addStarting(quarter.starting, quarter.startingSum, quarter.minimum, quarter.maximum);
-            if (!merging_ || (sourcesIn[static_cast<size_t>(index)] < 2 && !isLongConflict(start)))
-                gathered.addShare(quarter.share);
+            if (!(answeredElsewhere & VSQuarterBit(index))) gathered.addShare(quarter.share);
             if (!separate_) return;
             Gathered& own = ofSource_[bucket][cursor->rank];
             if (quarter.starting)
@@ -269,32 +266,42 @@ void VSStatisticsEngine::gatherDay(int64_t day, std::vector<RollupCursor*>& curs
     }
 }
 
+/// Adds what the merged row of a day has of the wanted quarters; returns those that it lacks.
+VSQuarterBits VSStatisticsEngine::gatherMergedDay(int64_t dayStart, VSQuarterBits wanted,
+                                                  const RollupCursor& merged) {
+    if (!wanted || !merged.valid || merged.day() * VSDayMicroseconds != dayStart) return wanted;
+    VSForEachQuarter<VSMergedQuarter>(merged.quarters(), [&](int index, const VSMergedQuarter& quarter) {
+        if (!(wanted & VSQuarterBit(index))) return;
+        gathered_[bucketOf(dayStart + index * VSQuarterMicroseconds)].addShare(quarter.share);
+        wanted &= ~VSQuarterBit(index);
+    });
+    return wanted;
+}
+
 /// Spans over 48 hours, which no rollup holds.
 void VSStatisticsEngine::gatherLongSpans(const Segment& segment, std::vector<Segment>& conflicts) {
     auto rows = reader_.database().use("SELECT " VS_SAMPLE_COLUMNS
                                        " FROM samples INDEXED BY samples_long WHERE type = ? AND start < ?"
                                        " AND duration > " VS_LONG_SPAN_SQL);
     rows.bind(1, VSTypeCodeValue(type_->code())).bind(2, segment.to);
-    longConflicts_.clear();
     while (rows.step()) {
         const VSSampleRow row = VSReadSampleRow(rows);
         if (row.end() <= segment.from) continue;
         const size_t rank = rankOf(row.provenance);
-        if (row.start >= segment.from) addStarting(row.start, rank, 1, row.value, row.value, row.value);
+        if (row.start >= segment.from) addStarting(row, rank);
         const int64_t from = std::max(row.start, segment.from), to = std::min(row.end(), segment.to);
-        addShare(from, to, row.duration, row.value, rank, merging_ ? Own : Own | Merged);
-        if (merging_) {
-            const Segment met{VSFloorDivide(from, VSQuarterMicroseconds) * VSQuarterMicroseconds,
-                              VSCeilingDivide(to, VSQuarterMicroseconds) * VSQuarterMicroseconds, false};
-            conflicts.push_back(met);
-            longConflicts_.push_back(met);
-        }
+        addShare({row.start, row.duration, row.value, rank}, from, to, merging_ ? Own : Own | Merged);
+        if (merging_)
+            conflicts.push_back({VSFloorDivide(from, VSQuarterMicroseconds) * VSQuarterMicroseconds,
+                                 VSCeilingDivide(to, VSQuarterMicroseconds) * VSQuarterMicroseconds, false});
     }
+    longConflicts_ = conflicts = united(std::move(conflicts));
 }
 
 bool VSStatisticsEngine::isLongConflict(int64_t moment) const {
-    return std::any_of(longConflicts_.begin(), longConflicts_.end(),
-                       [&](const Segment& span) { return moment >= span.from && moment < span.to; });
+    const auto next = std::upper_bound(longConflicts_.begin(), longConflicts_.end(), moment,
+                                       [](int64_t value, const Segment& span) { return value < span.from; });
+    return next != longConflicts_.begin() && moment < std::prev(next)->to;
 }
 
 void VSStatisticsEngine::gatherSamples(const Segment& segment, int parts) {
@@ -302,64 +309,42 @@ void VSStatisticsEngine::gatherSamples(const Segment& segment, int parts) {
     predicate.startDate = VSDate::fromMicroseconds(segment.from);
     predicate.endDate = VSDate::fromMicroseconds(segment.to);
     if (fromRollups_) predicate.dateOptions = VSQueryOptionNone;
-    std::vector<RankedRow> merged;
+    std::vector<VSRankedSpan> merged;
     const int shareParts = parts & (merging_ ? Own : Own | Merged);
     reader_.scan(type_, predicate, true, [&](const VSSampleRow& row) {
         const size_t rank = rankOf(row.provenance);
-        if ((parts & Starting) && row.start >= segment.from && row.start < segment.to)
-            addStarting(row.start, rank, 1, row.value, row.value, row.value);
-        if (shareParts) {
-            if (row.duration == 0)
-                addShare(row.start, row.start, 0, row.value, rank, shareParts);
-            else
-                addShare(std::max(row.start, segment.from), std::min(row.end(), segment.to), row.duration,
-                         row.value, rank, shareParts);
-        }
-        if (merging_ && (parts & Merged)) merged.push_back({rank, row});
+        const VSRankedSpan span{row.start, row.duration, row.value, rank};
+        if ((parts & Starting) && row.start >= segment.from && row.start < segment.to) addStarting(row, rank);
+        if (shareParts)
+            addShare(span, std::max(row.start, segment.from),
+                     row.duration ? std::min(row.end(), segment.to) : row.start, shareParts);
+        if (merging_ && (parts & Merged)) merged.push_back(span);
         return true;
     });
-    if (!merged.empty()) gatherMerged(merged, segment);
+    if (merged.empty()) return;
+    VSForEachCountedPart(
+        merged, segment.from, segment.to,
+        [&](const VSRankedSpan& span, int64_t from, int64_t to) { addShare(span, from, to, Merged); });
 }
 
-void VSStatisticsEngine::gatherMerged(const std::vector<RankedRow>& rows, const Segment& segment) {
-    std::vector<size_t> order(rows.size());
-    for (size_t index = 0; index < order.size(); ++index) order[index] = index;
-    std::stable_sort(order.begin(), order.end(),
-                     [&](size_t a, size_t b) { return rows[a].rank < rows[b].rank; });
-    Cover cover;
-    std::vector<std::pair<int64_t, int64_t>> ofThisSource;
-    for (size_t place = 0; place < order.size(); ++place) {
-        const auto& [rank, row] = rows[order[place]];
-        if (place && rank != rows[order[place - 1]].rank) {
-            cover.add(std::exchange(ofThisSource, {}));
-        }
-        if (row.duration == 0) {
-            if (!cover.contains(row.start)) addShare(row.start, row.start, 0, row.value, rank, Merged);
-            continue;
-        }
-        const int64_t from = std::max(row.start, segment.from), to = std::min(row.end(), segment.to);
-        cover.forEachGap(
-            from, to, [&](int64_t a, int64_t b) { addShare(a, b, row.duration, row.value, rank, Merged); });
-        ofThisSource.emplace_back(from, to);
-    }
+void VSStatisticsEngine::addStarting(const VSSampleRow& row, size_t rank) {
+    const size_t bucket = bucketOf(row.start);
+    const VSExactSum value(row.value);
+    gathered_[bucket].addStarting(1, value, row.value, row.value);
+    if (separate_) ofSource_[bucket][rank].addStarting(1, value, row.value, row.value);
 }
 
-void VSStatisticsEngine::addStarting(int64_t moment, size_t rank, int64_t count, double sum, double low,
-                                     double high) {
-    const size_t bucket = bucketOf(moment);
-    gathered_[bucket].addStarting(count, sum, low, high);
-    if (separate_) ofSource_[bucket][rank].addStarting(count, sum, low, high);
-}
-
-void VSStatisticsEngine::addShare(int64_t from, int64_t to, int64_t duration, double value, size_t rank,
-                                  int parts) {
+void VSStatisticsEngine::addShare(const VSRankedSpan& span, int64_t from, int64_t to, int parts) {
     size_t bucket = bucketOf(from);
+    std::optional<VSExactSpan> exact;
     do {
         const int64_t end = std::min(to, borders_[bucket + 1]);
-        const double share =
-            duration == 0 ? value : value * (static_cast<double>(end - from) / static_cast<double>(duration));
+        const bool isWhole = from == span.start && end == span.end();
+        if (!isWhole && !exact) exact.emplace(span.value, span.duration);
+        const VSExactSum share =
+            isWhole ? VSExactSum(span.value) : exact->part(from - span.start, end - span.start);
         if (parts & Merged) gathered_[bucket].addShare(share);
-        if ((parts & Own) && separate_) ofSource_[bucket][rank].addShare(share);
+        if ((parts & Own) && separate_) ofSource_[bucket][span.rank].addShare(share);
         from = end;
         ++bucket;
     } while (from < to);
@@ -384,10 +369,11 @@ size_t VSStatisticsEngine::rankOf(int64_t provenance) {
 VSStatistics VSStatisticsEngine::finished(size_t bucket) const {
     const auto fill = [&](auto& target, const Gathered& gathered) {
         target.count = gathered.count;
-        if (gathered.touched && (options_ & VSStatisticsOptionCumulativeSum)) target.sum = gathered.sum;
+        if (gathered.touched && (options_ & VSStatisticsOptionCumulativeSum))
+            target.sum = gathered.sum.value();
         if (!gathered.count) return;
         if (options_ & VSStatisticsOptionDiscreteAverage)
-            target.average = gathered.startingSum / static_cast<double>(gathered.count);
+            target.average = gathered.startingSum.dividedBy(static_cast<uint64_t>(gathered.count));
         if (options_ & VSStatisticsOptionDiscreteMin) target.minimum = gathered.minimum;
         if (options_ & VSStatisticsOptionDiscreteMax) target.maximum = gathered.maximum;
     };

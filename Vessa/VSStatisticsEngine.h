@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "Vessa/Base/VSCalendar.h"
+#include "Vessa/VSMergedRollup.h"
 #include "Vessa/VSStatistics.h"
 #include "Vessa/VSStoreReader.h"
 
@@ -20,7 +21,7 @@ class VSStatisticsEngine {
                        int options);
 
     VSStatistics statistics();
-    /// The buckets with data, ascending.
+    /// The buckets with data, ascending. Invalid: the interval is not positive.
     std::vector<VSStatistics> buckets(VSDate anchor, const VSDateComponents& interval,
                                       const VSCalendar& calendar);
 
@@ -28,36 +29,34 @@ class VSStatisticsEngine {
     /// What a bucket gathers, in all or of one source.
     struct Gathered {
         int64_t count = 0;
-        double startingSum = 0, minimum = 0, maximum = 0;
+        VSExactSum startingSum;
+        double minimum = 0, maximum = 0;
         bool touched = false;  // there is a sum
-        double sum = 0;
-        void addStarting(int64_t samples, double total, double low, double high);
-        void addShare(double share);
+        VSExactSum sum;
+        void addStarting(int64_t samples, const VSExactSum& total, double low, double high);
+        void addShare(const VSExactSum& share);
     };
     struct Segment {
         int64_t from, to;
         bool rolledUp;
     };  // [from, to) in microseconds
-    struct RankedRow {
-        size_t rank;
-        VSSampleRow row;
-    };
     enum Parts { Starting = 1, Own = 2, Merged = 4, All = 7 };
     class RollupCursor;
-    class Cover;
 
     bool findRange();
+    VSStoreReader::Extent extentOfSources() const;
     void gather(std::vector<int64_t> borders);
     std::vector<Segment> segments() const;
+    static std::vector<Segment> united(std::vector<Segment> segments);
     void gatherRollups(const Segment& segment);
-    void gatherDay(int64_t day, std::vector<RollupCursor*>& cursors, const Segment& segment,
-                   std::vector<Segment>& conflicts);
+    void gatherDay(int64_t day, const std::vector<RollupCursor*>& cursors, const RollupCursor& merged,
+                   const Segment& segment, std::vector<Segment>& conflicts);
+    VSQuarterBits gatherMergedDay(int64_t dayStart, VSQuarterBits wanted, const RollupCursor& merged);
     void gatherLongSpans(const Segment& segment, std::vector<Segment>& conflicts);
     void gatherSamples(const Segment& segment, int parts);
-    void gatherMerged(const std::vector<RankedRow>& rows, const Segment& segment);
-    void addStarting(int64_t moment, size_t rank, int64_t count, double sum, double low, double high);
-    /// Spreads the part [from, to) of a span of this duration and value over the buckets.
-    void addShare(int64_t from, int64_t to, int64_t duration, double value, size_t rank, int parts);
+    void addStarting(const VSSampleRow& row, size_t rank);
+    /// Spreads the part [from, to) of a span over the buckets.
+    void addShare(const VSRankedSpan& span, int64_t from, int64_t to, int parts);
     size_t bucketOf(int64_t moment);
     size_t rankOf(int64_t provenance);
     bool isLongConflict(int64_t moment) const;

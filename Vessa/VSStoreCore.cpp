@@ -1,5 +1,6 @@
 #include "Vessa/VSStoreCore.h"
 
+#include <algorithm>
 #include <future>
 
 #include "Vessa/VSStoreSchema.h"
@@ -7,9 +8,10 @@
 namespace {
 
 constexpr int readingThreadCount = 3;
-constexpr VSDuration patienceToOpen = std::chrono::seconds(10);
-/// A save waits for an import of another process.
-constexpr VSDuration patienceToWrite = std::chrono::minutes(2);
+/// A store that is written to can be opened and read at once: whoever keeps others from that keeps all of it.
+constexpr VSDuration mostPatienceToRead = std::chrono::seconds(10);
+/// For all locks together that the last writes need.
+constexpr auto patienceToClose = std::chrono::seconds(5);
 
 }  // namespace
 
@@ -22,13 +24,14 @@ struct VSStoreCore::Writer {
 VSResult<std::shared_ptr<VSStoreCore>> VSStoreCore::open(const std::filesystem::path& folder,
                                                          const VSHealthStore::Options& options) {
     try {
+        const VSDuration patience = std::min(options.patience, mostPatienceToRead);
         std::unique_ptr<VSDatabase> database;
         if (options.readOnly) {
-            VSStoreSchema::openForReading(folder, patienceToOpen);  // says now what is wrong with it
+            VSStoreSchema::openForReading(folder, patience);  // says now what is wrong with it
         } else {
             database = VSStoreSchema::openForWriting(folder, options.createIfMissing,
-                                                     options.survivesPowerLoss, patienceToOpen);
-            database->setPatience(patienceToWrite);
+                                                     options.survivesPowerLoss, patience);
+            database->setPatience(options.patience);
         }
         std::shared_ptr<VSStoreCore> core(new VSStoreCore(folder, options, std::move(database)));
         core->notifier.start(core);
@@ -47,11 +50,15 @@ VSStoreCore::VSStoreCore(const std::filesystem::path& storeFolder, const VSHealt
                          std::unique_ptr<VSDatabase> database)
     : folder(storeFolder),
       options(storeOptions),
-      readers(folder),
-      queries(readers, readingThreads),
+      access(options.applicationIdentifier, options.applicationName),
+      readers(folder, std::min(options.patience, mostPatienceToRead)),
+      queries(readers, readingThreads, access),
       notifier(folder, readers, [this](const auto& changes) { queries.typesChanged(changes); }) {
     if (!database) return;
-    database->setHurry(&closing_);
+    closingDeadline_ = std::chrono::steady_clock::time_point::max();
+    database->setDeadline(&closingDeadline_);
+    database->setLongWaitBlock(std::min(options.patience, mostPatienceToRead),
+                               [this] { setWriterIsHeld(true); });
     writer_ = std::make_unique<Writer>(std::move(database));
 }
 
@@ -62,7 +69,7 @@ VSStoreCore::~VSStoreCore() {
 
 void VSStoreCore::close() {
     queries.stopAll();
-    closing_ = true;
+    closingDeadline_ = std::chrono::steady_clock::now() + patienceToClose;
     writing_.finish();
     notifier.finish();
     readingThreads.finish();
@@ -94,6 +101,7 @@ VSStatus VSStoreCore::apply(const Change& change) {
     VSStoreWriter& writer = writer_->writer;
     try {
         VSTransaction transaction(*writer_->database, VSTransaction::Kind::Write);
+        setWriterIsHeld(false);
         writer.begin();
         if (VSStatus status = change(writer); !status) {
             writer.abandon();
@@ -102,9 +110,49 @@ VSStatus VSStoreCore::apply(const Change& change) {
         writer.finish();
         transaction.commit();
     } catch (const VSDatabaseFailure& failure) {
+        setWriterIsHeld(false);  // the next write waits anew
         writer.abandon();
-        return failure.error();
+        return VSErrorNamingStore(failure.error(), folder);
     }
     committed();
     return {};
+}
+
+void VSStoreCore::ask(Question question) {
+    if (writing_.isIdle()) {
+        readingThreads.enqueue([question = std::move(question)] { question(nullptr); });
+        return;
+    }
+    int64_t number = 0;
+    {
+        std::lock_guard lock(questionsMutex_);
+        if (writerIsHeld_) return refuse(std::move(question));
+        number = ++lastQuestion_;
+        questions_.emplace(number, std::move(question));
+    }
+    const bool taken = writing_.enqueue([this, number] {
+        std::lock_guard lock(questionsMutex_);
+        auto asked = questions_.extract(number);
+        if (asked) readingThreads.enqueue([question = std::move(asked.mapped())] { question(nullptr); });
+    });
+    std::lock_guard lock(questionsMutex_);
+    if (!taken) questions_.erase(number);
+}
+
+void VSStoreCore::refuse(Question question) {
+    readingThreads.enqueue([question = std::move(question)] {
+        const VSError error{VSErrorCode::NotAccessible,
+                            "the store is held by another program, and a change that was asked for before "
+                            "waits for it",
+                            true};
+        question(&error);
+    });
+}
+
+void VSStoreCore::setWriterIsHeld(bool isHeld) {
+    std::lock_guard lock(questionsMutex_);
+    writerIsHeld_ = isHeld;
+    if (!isHeld) return;
+    for (auto& [number, question] : questions_) refuse(std::move(question));
+    questions_.clear();
 }

@@ -1,13 +1,17 @@
 #pragma once
 
-#include <atomic>
+#include <cstdint>
 #include <filesystem>
+#include <functional>
+#include <map>
 #include <memory>
+#include <mutex>
 
 #include "Vessa/VSChangeNotifier.h"
 #include "Vessa/VSHealthStore.h"
 #include "Vessa/VSQueryRunner.h"
 #include "Vessa/VSReaderPool.h"
+#include "Vessa/VSStoreAuthorizations.h"
 #include "Vessa/VSStoreWriter.h"
 #include "Vessa/VSWorkQueue.h"
 
@@ -29,23 +33,22 @@ class VSStoreCore : public std::enable_shared_from_this<VSStoreCore> {
     void write(Change change, VSHealthStore::Completion completion);
     VSStatus writeAndWait(Change change);
     /// A question, and its answer's handler on a reading thread, after the writes that were accepted before
-    /// it.
+    /// it. While one of these has waited for other programs as long as a reader would, the answer is
+    /// NotAccessible: what is committed is not what the asker asked for, and may be written back.
     template <typename Block, typename Handler>
     void readLater(Block block, Handler handler) {
-        auto ask = [this, block = std::move(block), handler = std::move(handler)] {
-            const auto answer = readers.read(block);
+        ask([this, block = std::move(block), handler = std::move(handler)](const VSError* refusal) {
+            using Answer = decltype(readers.read(block));
+            const Answer answer = refusal ? Answer(*refusal) : readers.read(block);
             if (handler) handler(answer);
-        };
-        if (writing_.isIdle())
-            readingThreads.enqueue(std::move(ask));
-        else
-            writing_.enqueue([this, ask = std::move(ask)] { readingThreads.enqueue(ask); });
+        });
     }
     /// Tells the queries of all processes.
     void committed() { notifier.announce(); }
 
     const std::filesystem::path folder;
     const VSHealthStore::Options options;
+    const VSStoreAccess access;  // of the options' application
     VSReaderPool readers;
     VSWorkQueue readingThreads;
     VSQueryRunner queries;
@@ -56,8 +59,18 @@ class VSStoreCore : public std::enable_shared_from_this<VSStoreCore> {
     VSStoreCore(const std::filesystem::path& storeFolder, const VSHealthStore::Options& storeOptions,
                 std::unique_ptr<VSDatabase> database);
     VSStatus apply(const Change& change);
+    /// Answers, or hands on the error that is given. On a reading thread.
+    using Question = std::function<void(const VSError* refusal)>;
+    void ask(Question question);
+    void refuse(Question question);
+    /// Of the writer's thread: whether it has waited too long for others.
+    void setWriterIsHeld(bool isHeld);
 
     VSWorkQueue writing_;
-    std::atomic<bool> closing_ = false;
-    std::unique_ptr<Writer> writer_;  // of the writer's thread; null when opened for reading
+    VSDatabase::Deadline closingDeadline_;
+    std::mutex questionsMutex_;
+    std::map<int64_t, Question> questions_;  // that follow writes; guarded by questionsMutex_
+    int64_t lastQuestion_ = 0;               // guarded by questionsMutex_
+    bool writerIsHeld_ = false;              // guarded by questionsMutex_
+    std::unique_ptr<Writer> writer_;         // of the writer's thread; null when opened for reading
 };

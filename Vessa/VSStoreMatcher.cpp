@@ -1,7 +1,10 @@
 #include "Vessa/VSStoreMatcher.h"
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
+
+#include "Vessa/VSRollup.h"
 
 namespace {
 
@@ -15,9 +18,29 @@ bool sameTotal(const std::optional<VSQuantity>& total, const VSUnit& unit, const
     return !row.isNull(column) && VSSameStoredValue(inUnit(*total, unit), row.real(column));
 }
 
+/// Searches that met no more rows than these need no help.
+constexpr int fewRows = 64;
+constexpr size_t mostCrowded = 1'000'000;  // places kept, two a row
+constexpr int64_t kSecond = 1'000'000;
+
+int codeOf(const VSSample& sample) {
+    return VSTypeCodeValue(sample.sampleType()->code());
+}
+
+/// Values that are the same but for rounding lie in the same bucket or in neighbouring ones.
+int64_t valueBucket(double value) {
+    constexpr int roundedBits = 14;  // 38 of 52 are left: steps of at least 1.8e-12
+    return value == 0 ? 0 : std::bit_cast<int64_t>(value) >> roundedBits;
+}
+
+size_t originHash(const VSSourceRevision& revision) {
+    const std::hash<std::string> hash;
+    return hash(revision.source.bundleIdentifier) * 31 + hash(revision.source.name) * 7 +
+           hash(revision.version);
+}
+
 /// Whether a row was created when the sample says. Documents give whole seconds and cut off the rest.
 bool sameCreation(const VSSampleRow& row, VSDate sought) {
-    constexpr int64_t kSecond = 1'000'000;
     const int64_t created = row.start + row.created, wanted = sought.microseconds();
     if (created == wanted) return true;
     const int64_t rest = (created % kSecond + kSecond) % kSecond;
@@ -25,6 +48,19 @@ bool sameCreation(const VSSampleRow& row, VSDate sought) {
 }
 
 }  // namespace
+
+bool VSCanHaveMembers(const VSObjectType* type) {
+    return type->kind() == VSTypeKind::Correlation || type->kind() == VSTypeKind::Workout;
+}
+
+std::string VSTypesWithMembers() {
+    std::string codes;
+    for (const VSObjectType* type : VSObjectType::allTypes()) {
+        if (VSCanHaveMembers(type))
+            codes += (codes.empty() ? "" : ", ") + std::to_string(VSTypeCodeValue(type->code()));
+    }
+    return codes;
+}
 
 double VSStoredValue(const VSSample& sample) {
     if (const auto* quantity = dynamic_cast<const VSQuantitySample*>(&sample))
@@ -38,24 +74,115 @@ bool VSSameStoredValue(double a, double b) {
     return a == b || std::abs(a - b) <= 1e-12 * std::max(std::abs(a), std::abs(b));
 }
 
-int64_t VSStoreMatcher::find(const VSSample& sample, const std::function<bool(int64_t id)>& accept) {
-    const auto metadata = metadata_.find(sample.provenance().metadata);
-    if (!metadata) return 0;
+template <typename Visit>
+void VSStoreMatcher::forEachRow(const VSSample& sample, Visit visit) {
     auto rows =
         database_.use("SELECT " VS_SAMPLE_COLUMNS " FROM samples WHERE type = ? AND start = ? ORDER BY id");
-    rows.bind(1, VSTypeCodeValue(sample.sampleType()->code())).bind(2, sample.startDate().microseconds());
-    while (rows.step()) {
-        const VSSampleRow row = VSReadSampleRow(rows);
-        if (!sameRow(sample, *metadata, row)) continue;
-        if (const auto* workout = dynamic_cast<const VSWorkout*>(&sample);
-            workout && !sameWorkout(*workout, row.id))
-            continue;
-        if (const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample);
-            correlation && !sameMembers(*correlation, row.id))
-            continue;
-        if (accept(row.id)) return row.id;
+    rows.bind(1, codeOf(sample)).bind(2, sample.startDate().microseconds());
+    while (rows.step() && visit(VSReadSampleRow(rows))) {
     }
-    return 0;
+}
+
+int64_t VSStoreMatcher::find(const VSSample& sample, const Accept& accept) {
+    const auto metadata = metadata_.find(sample.provenance().metadata);
+    if (!metadata) return 0;
+    int64_t found = 0;
+    forEachRow(sample, [&](const VSSampleRow& row) {
+        if (same(sample, *metadata, row) && accept(row.id)) found = row.id;
+        return !found;
+    });
+    return found;
+}
+
+int64_t VSStoreMatcher::findAmongMany(const VSSample& sample, int purpose, const Accept& accept) {
+    const auto metadata = metadata_.find(sample.provenance().metadata);
+    if (!metadata) return 0;
+    const auto place = crowds_.find({codeOf(sample), sample.startDate().microseconds(), purpose});
+    VSCrowdedStart* known = place == crowds_.end() ? nullptr : &place->second;
+    if (!known) {
+        int64_t found = 0;
+        int seen = 0;
+        forEachRow(sample, [&](const VSSampleRow& row) {
+            if (++seen > fewRows) return false;
+            if (same(sample, *metadata, row) && accept(row.id)) found = row.id;
+            return !found;
+        });
+        if (found || seen <= fewRows) return found;
+        known = &makeCrowd(sample, purpose);
+    }
+    const VSSourceRevision revision = sample.sourceRevision();
+    Traits traits{(sample.endDate() - sample.startDate()).count(), *metadata,
+                  valueBucket(VSStoredValue(sample)), originHash(revision)};
+    std::optional<int64_t> second;
+    if (sample.creationDate()) second = VSFloorDivide(sample.creationDate()->microseconds(), kSecond);
+    std::vector<uint64_t> fingerprints;
+    for (const int64_t bucket : {traits.bucket - 1, traits.bucket, traits.bucket + 1}) {
+        Traits near = traits;
+        near.bucket = bucket;
+        fingerprints.push_back(near.fingerprint(second));
+    }
+    using Verdict = VSCrowdedStart::Verdict;
+    return known->find(fingerprints, [&](int64_t id) {
+        if (!accept(id)) return Verdict::NeverAgain;
+        VSSampleRow stored;
+        const bool there = row({sample.sampleType(), sample.startDate().microseconds(), id}, stored);
+        return there && same(sample, *metadata, stored) ? Verdict::Wanted : Verdict::NotThis;
+    });
+}
+
+bool VSStoreMatcher::same(const VSSample& sample, int64_t metadata, const VSSampleRow& row) {
+    if (!sameRow(sample, metadata, row)) return false;
+    if (const auto* workout = dynamic_cast<const VSWorkout*>(&sample)) return sameWorkout(*workout, row.id);
+    const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample);
+    return !correlation || sameMembers(*correlation, row.id);
+}
+
+void VSStoreMatcher::added(const VSSample& sample, int64_t id) {
+    if (crowds_.empty()) return;
+    const CrowdKey first{codeOf(sample), sample.startDate().microseconds(), 0};
+    for (auto place = crowds_.lower_bound(first); place != crowds_.end(); ++place) {
+        const auto& [type, start, purpose] = place->first;
+        if (type != std::get<0>(first) || start != std::get<1>(first)) return;
+        VSSampleRow stored;
+        if (row({sample.sampleType(), start, id}, stored)) addTo(place->second, stored);
+    }
+}
+
+VSCrowdedStart& VSStoreMatcher::makeCrowd(const VSSample& sample, int purpose) {
+    if (crowdsSize_ > mostCrowded) {
+        crowds_.clear();
+        crowdsSize_ = 0;
+    }
+    VSCrowdedStart& made = crowds_[{codeOf(sample), sample.startDate().microseconds(), purpose}];
+    forEachRow(sample, [&](const VSSampleRow& row) {
+        addTo(made, row);
+        return true;
+    });
+    return made;
+}
+
+void VSStoreMatcher::addTo(VSCrowdedStart& crowd, const VSSampleRow& row) {
+    const Traits traits{row.duration, row.metadata, valueBucket(row.value), originOf(row.provenance)};
+    crowd.add(traits.fingerprint(VSFloorDivide(row.start + row.created, kSecond)), row.id);
+    crowd.add(traits.fingerprint(std::nullopt), row.id);
+    crowdsSize_ += 2;
+}
+
+size_t VSStoreMatcher::originOf(int64_t provenance) {
+    const auto [place, isNew] = origins_.try_emplace(provenance, 0);
+    if (isNew) place->second = originHash(*provenances_.provenance(provenance).revision);
+    return place->second;
+}
+
+uint64_t VSStoreMatcher::Traits::fingerprint(std::optional<int64_t> second) const {
+    uint64_t hash = second ? 1 : 2;
+    for (const auto part :
+         {static_cast<uint64_t>(duration), static_cast<uint64_t>(metadata), static_cast<uint64_t>(bucket),
+          static_cast<uint64_t>(origin), static_cast<uint64_t>(second.value_or(0))}) {
+        hash = (hash ^ part) * 0x9E3779B97F4A7C15;
+        hash ^= hash >> 32;
+    }
+    return hash;
 }
 
 bool VSStoreMatcher::sameRow(const VSSample& sample, int64_t metadata, const VSSampleRow& row) {

@@ -1,8 +1,13 @@
 #pragma once
 
 #include <functional>
+#include <map>
+#include <optional>
+#include <tuple>
+#include <unordered_map>
 #include <vector>
 
+#include "Vessa/VSCrowdedStart.h"
 #include "Vessa/VSObject.h"
 #include "Vessa/VSSampleRow.h"
 #include "Vessa/VSStoreProvenances.h"
@@ -11,6 +16,11 @@
 double VSStoredValue(const VSSample& sample);
 /// Whether two stored values are the same number but for the rounding of a unit conversion.
 bool VSSameStoredValue(double a, double b);
+
+/// Correlations and workouts have members.
+bool VSCanHaveMembers(const VSObjectType* type);
+/// The codes of such types, as a list for SQL.
+std::string VSTypesWithMembers();
 
 /// A member of a saved correlation, by its key.
 struct VSMemberKey {
@@ -28,12 +38,33 @@ class VSStoreMatcher {
     VSStoreMatcher(VSDatabase& database, VSStoreProvenances& provenances, VSStoreMetadata& metadata)
         : database_(database), provenances_(provenances), metadata_(metadata) {}
 
+    using Accept = std::function<bool(int64_t id)>;
     /// Calls accept(id) for each equal row, oldest first, until it returns true; returns that id, or 0.
-    int64_t find(const VSSample& sample, const std::function<bool(int64_t id)>& accept);
+    int64_t find(const VSSample& sample, const Accept& accept);
+    /// The same, for many searches of one transaction: however many rows share a start, a search looks at few
+    /// of them. `purpose` tells searches of different acceptance apart. REQUIRES: what was not accepted once
+    /// never is for the same purpose; every row added meanwhile is told with `added`.
+    int64_t findAmongMany(const VSSample& sample, int purpose, const Accept& accept);
+    void added(const VSSample& sample, int64_t id);
     std::vector<VSMemberKey> members(int64_t parent);
     bool row(const VSMemberKey& key, VSSampleRow& row);
 
  private:
+    using CrowdKey = std::tuple<int, int64_t, int>;  // type, start, purpose
+    /// What a row or a sample says, without its exact value: equal ones have a fingerprint in common.
+    struct Traits {
+        int64_t duration, metadata, bucket;
+        size_t origin;
+        /// The creation's second; none: any.
+        uint64_t fingerprint(std::optional<int64_t> second) const;
+    };
+
+    template <typename Visit>
+    void forEachRow(const VSSample& sample, Visit visit);
+    bool same(const VSSample& sample, int64_t metadata, const VSSampleRow& row);
+    VSCrowdedStart& makeCrowd(const VSSample& sample, int purpose);
+    void addTo(VSCrowdedStart& crowd, const VSSampleRow& row);
+    size_t originOf(int64_t provenance);
     bool sameRow(const VSSample& sample, int64_t metadata, const VSSampleRow& row);
     bool sameWorkout(const VSWorkout& workout, int64_t id);
     bool sameMembers(const VSCorrelation& correlation, int64_t id);
@@ -41,4 +72,7 @@ class VSStoreMatcher {
     VSDatabase& database_;
     VSStoreProvenances& provenances_;
     VSStoreMetadata& metadata_;
+    std::map<CrowdKey, VSCrowdedStart> crowds_;
+    size_t crowdsSize_ = 0;
+    std::unordered_map<int64_t, size_t> origins_;  // by provenance
 };

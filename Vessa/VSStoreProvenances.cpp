@@ -43,6 +43,14 @@ const VSSource& VSStoreProvenances::source(int64_t id) {
     return *entry;
 }
 
+std::vector<VSDevice> VSStoreProvenances::allDevices() {
+    std::vector<VSDevice> devices;
+    auto rows = database_.use(
+        "SELECT name, manufacturer, model, hardware, firmware, software, local, udi FROM devices");
+    while (rows.step()) devices.push_back(readDevice(rows, 0));
+    return devices;
+}
+
 std::shared_ptr<const VSDevice> VSStoreProvenances::device(int64_t id) {
     auto& entry = devices_[id];
     if (entry) return entry;

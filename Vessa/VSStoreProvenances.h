@@ -29,6 +29,8 @@ class VSStoreProvenances {
     int64_t sourceOfProvenance(int64_t id) { return provenance(id).source; }
     /// Valid while this lives.
     const VSSource& source(int64_t id);
+    /// Those of all objects that ever were.
+    std::vector<VSDevice> allDevices();
     /// None: no object ever came from it.
     std::optional<int64_t> findSource(const VSSource& source);
 

@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <queue>
 
-#include "Vessa/VSRollup.h"
+#include "Vessa/VSMergedRollup.h"
 #include "Vessa/VSStoreSchema.h"
 
 namespace {
@@ -47,16 +47,20 @@ void refuseUnknownKeys(const std::vector<VSSortDescriptor>& sort) {
 
 }  // namespace
 
-VSDateFilter::VSDateFilter(const VSPredicate& predicate)
-    : strictStart_(predicate.dateOptions & VSQueryOptionStrictStartDate),
-      strictEnd_(predicate.dateOptions & VSQueryOptionStrictEndDate) {
-    if (predicate.startDate) start_ = predicate.startDate->microseconds();
-    if (predicate.endDate) {
-        end_ = predicate.endDate->microseconds();
-        startsBefore_ = end_;
-    }
-    if (predicate.startsBefore)
-        startsBefore_ = std::min(startsBefore_, predicate.startsBefore->microseconds());
+VSDateFilter::VSDateFilter(const VSPredicate& predicate) {
+    const auto later = [](int64_t& bound, const std::optional<VSDate>& date) {
+        if (date) bound = std::max(bound, date->microseconds());
+    };
+    const auto earlier = [](int64_t& bound, const std::optional<VSDate>& date) {
+        if (date) bound = std::min(bound, date->microseconds());
+    };
+    later(start_, predicate.startDate);
+    later(startsFrom_, predicate.startsFrom);
+    if (predicate.dateOptions & VSQueryOptionStrictStartDate) later(startsFrom_, predicate.startDate);
+    earlier(startsBefore_, predicate.endDate);
+    earlier(startsBefore_, predicate.startsBefore);
+    earlier(endsBy_, predicate.endsBy);
+    if (predicate.dateOptions & VSQueryOptionStrictEndDate) earlier(endsBy_, predicate.endDate);
 }
 
 class VSStoreReader::Conditions {
@@ -137,9 +141,9 @@ void VSStoreReader::scan(const VSObjectType* type, const VSPredicate& predicate,
         return !filter.matches(row.start, row.duration) || !conditions.match(row) || block(row);
     };
     // Long spans that began before the part of the table that is read come from their own index.
-    const int64_t from = filter.strictStart() ? filter.start() : lowerSum(filter.start(), longest(type));
+    const int64_t from = std::max(filter.startsFrom(), lowerSum(filter.start(), longest(type)));
     const auto scanLong = [&] {
-        if (filter.strictStart() || from == INT64_MIN) return true;
+        if (from == filter.startsFrom()) return true;
         auto rows =
             database_.use(ascending ? "SELECT " VS_SAMPLE_COLUMNS
                                       " FROM samples INDEXED BY samples_long WHERE type = ? AND start < ?"
@@ -357,25 +361,7 @@ std::vector<VSSource> VSStoreReader::sources(const VSObjectType* type, const VSP
 }
 
 std::vector<int64_t> VSStoreReader::orderedSources(const VSObjectType* type) {
-    std::vector<int64_t> order;
-    auto chosen = database_.use(
-        "SELECT source FROM source_order WHERE type = ?1 AND source IN (SELECT source FROM type_sources "
-        "WHERE type = ?1) ORDER BY position");
-    chosen.bind(1, codeOf(type));
-    while (chosen.step()) order.push_back(chosen.integer(0));
-    const bool userChose = !order.empty();
-    std::vector<int64_t> others;
-    auto rest = database_.use("SELECT source FROM type_sources WHERE type = ? ORDER BY first_start, source");
-    rest.bind(1, codeOf(type));
-    while (rest.step()) {
-        if (std::find(order.begin(), order.end(), rest.integer(0)) == order.end())
-            others.push_back(rest.integer(0));
-    }
-    if (!userChose)
-        std::stable_partition(others.begin(), others.end(),
-                              [&](int64_t id) { return provenances_.source(id).isApplication(); });
-    order.insert(order.end(), others.begin(), others.end());
-    return order;
+    return VSOrderedSources(database_, provenances_, codeOf(type));
 }
 
 VSStoreReader::Extent VSStoreReader::extent(const VSObjectType* type, int64_t source) {
@@ -390,6 +376,17 @@ VSStoreReader::Extent VSStoreReader::extent(const VSObjectType* type) {
         database_.use("SELECT sum(count), min(first_start), max(last_end) FROM type_sources WHERE type = ?");
     if (!row.bind(1, codeOf(type)).step() || row.isNull(0)) return {};
     return {row.integer(0), row.integer(1), row.integer(2)};
+}
+
+std::map<const VSObjectType*, VSStoreReader::Extent> VSStoreReader::extents() {
+    std::map<const VSObjectType*, Extent> extents;
+    auto rows = database_.use(
+        "SELECT type, sum(count), min(first_start), max(last_end) FROM type_sources GROUP BY type");
+    while (rows.step()) {
+        if (const auto* type = VSObjectType::dataTypeWithCode(static_cast<int>(rows.integer(0))))
+            extents[type] = {rows.integer(1), rows.integer(2), rows.integer(3)};
+    }
+    return extents;
 }
 
 std::map<int, int64_t> VSStoreReader::typeChanges() {

@@ -18,19 +18,18 @@ class VSDateFilter {
  public:
     explicit VSDateFilter(const VSPredicate& predicate);
     bool matches(int64_t start, int64_t duration) const {
-        if (start >= startsBefore_ || (strictEnd_ && start + duration > end_)) return false;
-        if (strictStart_) return start >= start_;
-        return start + duration > start_ || (duration == 0 && start >= start_);
+        return start >= startsFrom_ && start < startsBefore_ && start + duration <= endsBy_ &&
+               (start + duration > start_ || (duration == 0 && start >= start_));
     }
     /// Samples that start earlier match only by a span that reaches so far.
     int64_t start() const { return start_; }
-    bool strictStart() const { return strictStart_; }
+    /// No sample that starts before this matches.
+    int64_t startsFrom() const { return startsFrom_; }
     /// No sample that starts here or later matches.
     int64_t startsBefore() const { return startsBefore_; }
 
  private:
-    int64_t start_ = INT64_MIN, end_ = INT64_MAX, startsBefore_ = INT64_MAX;
-    bool strictStart_ = false, strictEnd_ = false;
+    int64_t start_ = INT64_MIN, startsFrom_ = INT64_MIN, startsBefore_ = INT64_MAX, endsBy_ = INT64_MAX;
 };
 
 /// Answers from one connection. Every public operation is one snapshot when called inside a read transaction.
@@ -53,6 +52,8 @@ class VSStoreReader {
     /// Of one source of a type; a count of 0: it has none.
     Extent extent(const VSObjectType* type, int64_t source);
     Extent extent(const VSObjectType* type);
+    /// Of each type that has samples.
+    std::map<const VSObjectType*, Extent> extents();
 
     /// Calls block(row) for every sample that matches, in ascending or descending order of its start (and
     /// number), until it returns false.

@@ -4,9 +4,11 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
-#include <cstring>
 #include <string>
+
+#include "Vessa/VSStoreMigration.h"
 
 namespace {
 
@@ -114,7 +116,8 @@ CREATE TABLE batches(
     date INTEGER NOT NULL,
     first_id INTEGER NOT NULL,
     last_id INTEGER NOT NULL,
-    added INTEGER NOT NULL);
+    added INTEGER NOT NULL,
+    undone INTEGER NOT NULL);
 CREATE TABLE batch_claims(
     batch INTEGER NOT NULL,
     first_id INTEGER NOT NULL,
@@ -124,6 +127,7 @@ CREATE TABLE batch_characteristics(
     batch INTEGER NOT NULL,
     type INTEGER NOT NULL,
     value INTEGER NOT NULL,
+    given INTEGER NOT NULL,
     PRIMARY KEY (batch, type)) WITHOUT ROWID;
 
 CREATE TABLE authorizations(
@@ -164,13 +168,23 @@ constexpr const char* tableNames[] = {"state",          "types",         "source
     throw VSDatabaseFailure({code, std::move(message)});
 }
 
-void makeFolder(const std::filesystem::path& folder) {
+/// What was made in a folder is surely there after a lost power supply only when the folder is synced.
+void syncFolder(const std::filesystem::path& folder) {
+    const int descriptor = ::open(folder.empty() ? "." : folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (descriptor < 0) return;  // a folder that may be used but not listed: as far as it goes
+    ::fsync(descriptor);
+    ::close(descriptor);
+}
+
+void makeFolder(const std::filesystem::path& given) {
+    const auto folder = given.has_filename() ? given : given.parent_path();
     std::error_code error;
-    if (std::filesystem::is_directory(folder, error)) return;
-    if (folder.has_parent_path()) std::filesystem::create_directories(folder.parent_path(), error);
+    if (folder.empty() || std::filesystem::is_directory(folder, error)) return;
+    makeFolder(folder.parent_path());
     if (::mkdir(folder.c_str(), 0700) != 0 && errno != EEXIST)
-        refuse(VSErrorCode::NotAccessible,
-               "the folder " + folder.string() + " cannot be made: " + std::strerror(errno));
+        throw VSDatabaseFailure(
+            VSErrorFromSystem(errno, "the folder " + folder.string() + " cannot be made"));
+    syncFolder(folder.parent_path());
 }
 
 /// SQLite gives its other files the rights of this one.
@@ -178,11 +192,10 @@ void makeFile(const std::filesystem::path& file) {
     const int descriptor = ::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600);
     if (descriptor >= 0) {
         ::close(descriptor);
+        syncFolder(file.parent_path());
         return;
     }
-    const int reason = errno;
-    refuse(reason == ENOSPC ? VSErrorCode::DiskFull : VSErrorCode::NotAccessible,
-           "the store " + file.string() + " cannot be made: " + std::strerror(reason));
+    throw VSDatabaseFailure(VSErrorFromSystem(errno, "the store " + file.string() + " cannot be made"));
 }
 
 bool fileExists(const std::filesystem::path& file) {
@@ -190,12 +203,33 @@ bool fileExists(const std::filesystem::path& file) {
     return std::filesystem::exists(file, error);
 }
 
-/// 0: a database without tables, which may become ours; else its schema version.
+uintmax_t sizeOf(const std::filesystem::path& file) {
+    std::error_code error;
+    const uintmax_t size = std::filesystem::file_size(file, error);
+    return error ? 0 : size;
+}
+
+/// An empty file is a store about to be made, but not beside a log, which SQLite would throw away, nor where
+/// a store was in use before.
+void refuseLostFile(const std::filesystem::path& folder) {
+    const auto file = folder / VSStoreSchema::fileName;
+    const uintmax_t log = sizeOf(file.string() + "-wal");
+    const bool used = fileExists(folder / VSStoreSchema::noticeFileName);
+    if (sizeOf(file) > 0) return;
+    if (log > 0)
+        refuse(VSErrorCode::Corrupt, file.string() + " is missing or empty, but its log is still there");
+    if (used && fileExists(file))
+        refuse(VSErrorCode::Corrupt, file.string() + " is empty, though it held a store");
+}
+
+/// 0: an empty database, which may become ours; else its schema version.
 int versionOf(VSDatabase& database, const std::filesystem::path& file) {
     const int64_t identity = database.integer("PRAGMA application_id");
     const int64_t version = database.integer("PRAGMA user_version");
-    const int64_t count = database.integer("SELECT count(*) FROM sqlite_master");
-    if (identity == 0 && version == 0 && count == 0) return 0;
+    // A writing transaction makes the first page; a store has one for every table.
+    if (identity == 0 && version == 0 && database.integer("PRAGMA page_count") <= 1 &&
+        database.integer("SELECT count(*) FROM sqlite_master") == 0)
+        return 0;
     if (identity != VSStoreSchema::applicationID)
         refuse(VSErrorCode::Refused, file.string() + " is a database of another program");
     if (version > VSStoreSchema::currentVersion)
@@ -239,10 +273,23 @@ void createTables(VSDatabase& database, const std::filesystem::path& file) {
     }
 }
 
-/// Migrations to come stand here: step n brings version n to n + 1.
-void migrate(VSDatabase&, const std::filesystem::path& file, int version) {
-    refuse(VSErrorCode::Refused,
-           file.string() + " has the format " + std::to_string(version) + ", which nothing migrates");
+/// Opens the file and says its version. While another process brings it to a newer format nobody gets in.
+std::unique_ptr<VSDatabase> openOfAnyVersion(const std::filesystem::path& file, VSDuration patience,
+                                             const std::atomic<bool>* giveUp, int& version) {
+    const bool migrating = VSStoreMigration::mayBeUnderWay(file);
+    const auto open = [&](VSDuration most) {
+        auto database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::Write, most);
+        database->setGiveUp(giveUp);
+        version = versionOf(*database, file);
+        database->setPatience(patience);
+        return database;
+    };
+    try {
+        return open(patience);
+    } catch (const VSDatabaseFailure& failure) {
+        if (!failure.error().isHeldByOthers || !(migrating || VSStoreMigration::mayBeUnderWay(file))) throw;
+    }
+    return open(std::max(patience, VSStoreMigration::patienceForOthers));
 }
 
 void configure(VSDatabase& database) {
@@ -259,22 +306,28 @@ void configureForWriting(VSDatabase& database, bool survivesPowerLoss) {
 
 std::unique_ptr<VSDatabase> VSStoreSchema::openForWriting(const std::filesystem::path& folder,
                                                           bool createIfMissing, bool survivesPowerLoss,
-                                                          VSDuration patience) {
+                                                          VSDuration patience,
+                                                          const std::atomic<bool>* giveUp) {
     const auto file = folder / fileName;
+    refuseLostFile(folder);
     if (!fileExists(file)) {
         if (!createIfMissing) refuse(VSErrorCode::NotAccessible, "there is no store in " + folder.string());
         makeFolder(folder);
         makeFile(file);
     }
-    auto database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::Write, patience);
+    int version = 0;
+    auto database = openOfAnyVersion(file, patience, giveUp, version);
     if (database->isReadOnly())
         refuse(VSErrorCode::NotAccessible, "the store " + file.string() + " cannot be written to");
-    int version = versionOf(*database, file);
     if (version == 0) {
         createTables(*database, file);
-        version = currentVersion;
+    } else if (version < currentVersion) {
+        database.reset();
+        VSStoreMigration::migrate(file, patience);
+        database = openOfAnyVersion(file, patience, giveUp, version);
+    } else {
+        VSStoreMigration::clearUp(file);
     }
-    if (version < currentVersion) migrate(*database, file, version);
     checkTables(*database, file);
     if (auto mode = database->use("PRAGMA journal_mode"); !mode.step() || mode.text(0) != "wal") {
         mode.reset();
@@ -293,26 +346,26 @@ std::unique_ptr<VSDatabase> VSStoreSchema::openForWriting(const std::filesystem:
 std::unique_ptr<VSDatabase> VSStoreSchema::openForReading(const std::filesystem::path& folder,
                                                           VSDuration patience) {
     const auto file = folder / fileName;
+    refuseLostFile(folder);
     if (!fileExists(file)) refuse(VSErrorCode::NotAccessible, "there is no store in " + folder.string());
     auto database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::Read, patience);
     int version = 0;
     try {
         version = versionOf(*database, file);
     } catch (const VSDatabaseFailure& failure) {
-        // A write-ahead log needs its index file. Where the folder cannot be written to and no log is left,
-        // the file alone is complete and nobody can change it.
-        std::error_code ignored;
-        const bool emptyLog = !fileExists(file.string() + "-wal") ||
-                              std::filesystem::file_size(file.string() + "-wal", ignored) == 0;
-        if (failure.error().code != VSErrorCode::NotAccessible || ::access(folder.c_str(), W_OK) == 0 ||
-            !emptyLog)
-            throw;
-        database = std::make_unique<VSDatabase>(file, VSDatabase::Mode::ReadImmutable, patience);
+        // A write-ahead log needs its index file. Where the folder cannot be written to nobody changes the
+        // store: without a log the file alone is complete, with one the index can be in our memory.
+        if (failure.error().code != VSErrorCode::NotAccessible || ::access(folder.c_str(), W_OK) == 0) throw;
+        const bool logged = sizeOf(file.string() + "-wal") > 0;
+        database = std::make_unique<VSDatabase>(
+            file, logged ? VSDatabase::Mode::ReadAlone : VSDatabase::Mode::ReadImmutable, patience);
         version = versionOf(*database, file);
     }
     if (version == 0) refuse(VSErrorCode::NotAccessible, "the store in " + folder.string() + " is empty");
     if (version < currentVersion)
-        refuse(VSErrorCode::Refused, file.string() + " has an older format; open it once for writing");
+        refuse(VSErrorCode::Refused, file.string() +
+                                         " has an older format; it gets this program's when it is next "
+                                         "opened for writing (by the window or an import)");
     checkTables(*database, file);
     configure(*database);
     return database;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <filesystem>
 #include <memory>
 
@@ -28,9 +29,10 @@ inline constexpr VSDate latestDate = VSDate::fromSeconds(253'402'300'799);
 /// Makes the folder and the empty database file (readable by the user only) where they are missing, then
 /// opens the file, makes the tables of a new one, migrates an older one. Throws VSDatabaseFailure: Refused
 /// for another program's or a newer database, Corrupt for a damaged file, NotAccessible where it cannot be
-/// opened for writing.
+/// opened for writing, also soon after *giveUp became true (null: no flag; it outlives the connection).
 std::unique_ptr<VSDatabase> openForWriting(const std::filesystem::path& folder, bool createIfMissing,
-                                           bool survivesPowerLoss, VSDuration patience);
+                                           bool survivesPowerLoss, VSDuration patience,
+                                           const std::atomic<bool>* giveUp = nullptr);
 /// The same without any change to the disk.
 std::unique_ptr<VSDatabase> openForReading(const std::filesystem::path& folder, VSDuration patience);
 

@@ -7,6 +7,9 @@
 
 namespace {
 
+/// Sums are exact as long as no value is so great; no measure of a person comes near it.
+constexpr double absurdValue = 0x1p47;
+
 int codeOf(const VSObjectType* type) {
     return VSTypeCodeValue(type->code());
 }
@@ -37,7 +40,9 @@ std::optional<VSError> objectionToContent(const VSSample& sample) {
         if (!object->quantity().isCompatibleWith(type.canonicalUnit()))
             return invalid("the unit " + object->quantity().unit().unitString() + " does not convert to " +
                            type.canonicalUnit().unitString());
-        if (!std::isfinite(VSStoredValue(sample))) return invalid("the value is not a finite number");
+        const double value = VSStoredValue(sample);
+        if (!std::isfinite(value)) return invalid("the value is not a finite number");
+        if (std::fabs(value) >= absurdValue) return invalid("the value is absurdly large");
         return std::nullopt;
     }
     if (type.isCategoryType()) {
@@ -102,6 +107,7 @@ void VSStoreWriter::finish() {
     metadata_.flush();
     rollups_.flush(provenances_);
     writeTypeSources();
+    updateMergedRollups();
     database_.use("UPDATE state SET last = ?").bind(1, last_).run();
 }
 
@@ -206,7 +212,7 @@ void VSStoreWriter::insertWorkout(int64_t id, const VSWorkout& workout) {
     }
 }
 
-int64_t VSStoreWriter::find(const VSSample& sample) {
+int64_t VSStoreWriter::find(const VSSample& sample, const std::set<int64_t>& others) {
     const int64_t id = VSObjectIDValue(sample.dataID());
     if (id) {
         VSSampleRow row;
@@ -214,64 +220,10 @@ int64_t VSStoreWriter::find(const VSSample& sample) {
     }
     int64_t newest = 0;
     matcher_.find(sample, [&](int64_t found) {
-        newest = found;
+        if (!others.contains(found)) newest = found;
         return false;
     });
     return newest;
-}
-
-bool VSStoreWriter::remove(const VSObjectType* type, int64_t start, int64_t id) {
-    VSSampleRow row;
-    if (!matcher_.row({type, start, id}, row)) return false;
-    database_.use("DELETE FROM samples WHERE type = ? AND start = ? AND id = ?")
-        .bind(1, codeOf(type))
-        .bind(2, start)
-        .bind(3, id)
-        .run();
-    removeDetails(id);
-    metadata_.release(row.metadata);
-    const int64_t change = ++last_;
-    database_.use("INSERT INTO deleted(change, type, id) VALUES (?, ?, ?)")
-        .bind(1, change)
-        .bind(2, codeOf(type))
-        .bind(3, id)
-        .run();
-    types_[static_cast<size_t>(codeOf(type))].change = change;
-    const int64_t source = provenances_.sourceOfProvenance(row.provenance);
-    SourceChange& summary = sourceChange(codeOf(type), source);
-    --summary.count;
-    summary.removed = true;
-    rollups_.rebuild(codeOf(type), source, start, row.duration);
-    return true;
-}
-
-void VSStoreWriter::removeDetails(int64_t id) {
-    // Members stay, but being a member was a property of theirs that queries ask for.
-    for (const VSMemberKey& member : matcher_.members(id)) touch(member.type);
-    database_.use("DELETE FROM members WHERE parent = ?").bind(1, id).run();
-    database_.use("DELETE FROM members WHERE member = ?").bind(1, id).run();
-    database_.use("DELETE FROM workouts WHERE workout = ?").bind(1, id).run();
-    database_.use("DELETE FROM workout_events WHERE workout = ?").bind(1, id).run();
-}
-
-int64_t VSStoreWriter::removeAll(const VSObjectType* type, std::optional<std::string> bundleIdentifier) {
-    struct Key {
-        int64_t start, id;
-    };
-    std::vector<Key> keys;
-    {
-        auto rows = database_.use("SELECT start, id, provenance FROM samples WHERE type = ?");
-        rows.bind(1, codeOf(type));
-        while (rows.step()) {
-            if (bundleIdentifier &&
-                provenances_.provenance(rows.integer(2)).revision->source.bundleIdentifier !=
-                    *bundleIdentifier)
-                continue;
-            keys.push_back({rows.integer(0), rows.integer(1)});
-        }
-    }
-    for (const Key& key : keys) remove(type, key.start, key.id);
-    return static_cast<int64_t>(keys.size());
 }
 
 void VSStoreWriter::addToWorkout(int64_t workout, const VSMemberKey& sample) {
@@ -284,6 +236,16 @@ void VSStoreWriter::addToWorkout(int64_t workout, const VSMemberKey& sample) {
 
 void VSStoreWriter::touch(const VSObjectType* type) {
     types_[static_cast<size_t>(codeOf(type))].change = ++last_;
+}
+
+void VSStoreWriter::updateMergedRollups() {
+    std::map<int, std::map<int64_t, VSRollupWriter::Changed>> byType;
+    for (const auto& [key, changed] : rollups_.takeChanges()) byType[key.first][key.second] = changed;
+    VSMergedRollups merged(database_, provenances_);
+    for (int type = 0; type < static_cast<int>(typeCodes); ++type) {
+        if (types_[static_cast<size_t>(type)].change && VSTypeIsMerged(type))
+            merged.update(type, byType[type]);
+    }
 }
 
 VSStoreWriter::SourceChange& VSStoreWriter::sourceChange(int type, int64_t source) {

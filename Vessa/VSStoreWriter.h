@@ -1,6 +1,7 @@
 #pragma once
 
 #include <array>
+#include <functional>
 #include <map>
 #include <optional>
 #include <set>
@@ -8,8 +9,9 @@
 #include <unordered_map>
 #include <vector>
 
+#include "Vessa/VSMergedRollup.h"
+#include "Vessa/VSNumberRanges.h"
 #include "Vessa/VSObject.h"
-#include "Vessa/VSRollup.h"
 #include "Vessa/VSSampleRow.h"
 #include "Vessa/VSStoreMatcher.h"
 #include "Vessa/VSStoreProvenances.h"
@@ -36,13 +38,17 @@ class VSStoreWriter {
     /// A sample of any kind without its members.
     int64_t insertAlone(const VSSample& sample, VSDate now);
     void insertMember(int64_t parent, int position, const VSMemberKey& member);
-    /// The saved object that is meant: the one of its number, or without a number the newest equal one. 0:
-    /// none.
-    int64_t find(const VSSample& sample);
-    /// False: there is no such object.
+    /// The saved object that is meant: the one of its number, or without a number the newest equal one that
+    /// is none of the others. 0: none.
+    int64_t find(const VSSample& sample, const std::set<int64_t>& others = {});
+    /// With a correlation's last member goes the correlation. False: there is no such object.
     bool remove(const VSObjectType* type, int64_t start, int64_t id);
-    /// Of one source, or of all; returns how many.
+    /// Of one source, or of all; returns how many, with the correlations that went with their last members.
     int64_t removeAll(const VSObjectType* type, std::optional<std::string> bundleIdentifier);
+    /// Those of the type with these numbers that are accepted (all without `accept`); returns how many, with
+    /// the correlations that went with their last members.
+    int64_t removeNumbers(const VSObjectType* type, const VSNumberRanges& numbers,
+                          const std::function<bool(const VSSampleRow&)>& accept = nullptr);
     /// Relates a saved sample to a saved workout, once.
     void addToWorkout(int64_t workout, const VSMemberKey& sample);
     /// Notes a change of something that queries of the type watch.
@@ -67,9 +73,17 @@ class VSStoreWriter {
     int64_t insertOnce(const VSSample& sample, VSDate now);
     SourceChange& sourceChange(int type, int64_t source);
     void insertWorkout(int64_t id, const VSWorkout& workout);
+    /// Without what hangs on it.
+    void removeRow(const VSObjectType* type, const VSSampleRow& row);
     void removeDetails(int64_t id);
+    int64_t leaveParents(int64_t id);
+    int64_t loseMember(const VSObjectType* type, const VSSampleRow& parent);
+    /// Some rows of the type from the number `next` on, which becomes that of the next ones or 0.
+    std::vector<VSSampleRow> rowsNumbered(const VSObjectType* type, const VSNumberRanges& numbers,
+                                          int64_t& next);
     void writeTypes();
     void writeTypeSources();
+    void updateMergedRollups();
     void measureAgain(int type, int64_t source);
 
     VSDatabase& database_;

@@ -28,14 +28,14 @@ class VSUnit::Definition::Table {
         return *table;
     }
 
-    const Definition* spelled(std::string_view text) const {
+    const Definition* spelled(std::string_view spelling) const {
         std::shared_lock lock(mutex_);
-        const auto known = spellings_.find(text);
+        const auto known = spellings_.find(spelling);
         return known == spellings_.end() ? nullptr : known->second;
     }
 
     /// Null when the table is full: only a hostile document has so many units.
-    const Definition* intern(std::string_view text, const VSUnitParser::Unit& unit) {
+    const Definition* intern(std::string_view spelling, const VSUnitParser::Unit& unit) {
         std::string canonical = VSUnitParser::canonicalText(unit);
         std::lock_guard lock(mutex_);
         auto& definition = definitions_[canonical];
@@ -46,7 +46,7 @@ class VSUnit::Definition::Table {
             }
             definition = std::make_unique<Definition>(make(std::move(canonical), unit));
         }
-        if (spellings_.size() < 2 * kMostUnits) spellings_.emplace(text, definition.get());
+        if (spellings_.size() < 2 * kMostUnits) spellings_.emplace(spelling, definition.get());
         return definition.get();
     }
 

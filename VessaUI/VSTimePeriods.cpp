@@ -72,25 +72,3 @@ std::vector<VSDurationInBucket> VSCalculateTotalDurations(const std::vector<VSTi
     }
     return totals;
 }
-
-std::shared_ptr<VSQuery> VSQueryForFetchingCountStatistics(
-    const VSObjectType* type, VSDate start, VSDate end, const VSDateComponents& interval,
-    std::function<void(const VSResult<std::vector<VSCountInBucket>>&)> handler) {
-    return std::make_shared<VSSampleQuery>(
-        type, VSPredicate::samplesWithStartDate(start, end, VSQueryOptionStrictStartDate),
-        VSObjectQueryNoLimit, std::vector<VSSortDescriptor>{{VSSampleSortIdentifierStartDate, true}},
-        [=, handler = std::move(handler)](const VSResult<std::vector<VSSamplePtr>>& answer) {
-            if (!answer) return handler(answer.error());
-            const std::vector<VSDate> borders =
-                VSCalendar::current().bucketBoundaries(start, interval, start, end);
-            std::vector<VSCountInBucket> counts;
-            size_t bucket = 0;
-            for (const VSSamplePtr& sample : *answer) {
-                while (bucket + 2 < borders.size() && sample->startDate() >= borders[bucket + 1]) ++bucket;
-                const VSTimeSpan span{borders[bucket], borders[bucket + 1]};
-                if (counts.empty() || !(counts.back().bucket == span)) counts.push_back({span, 0});
-                ++counts.back().count;
-            }
-            handler(std::move(counts));
-        });
-}

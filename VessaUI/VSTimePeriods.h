@@ -1,12 +1,10 @@
 #pragma once
 
-#include <functional>
-#include <memory>
 #include <optional>
 #include <vector>
 
 #include "Vessa/Base/VSCalendar.h"
-#include "Vessa/VSQuery.h"
+#include "Vessa/VSObject.h"
 
 // Arithmetic of spans of time, for display types whose samples last (sleep, workouts) or merely happen. Pure
 // functions; any thread. Calendar steps are those of the calendar given.
@@ -36,16 +34,6 @@ struct VSDurationInBucket {
 std::vector<VSDurationInBucket> VSCalculateTotalDurations(const std::vector<VSTimeSpan>& spans, VSDate start,
                                                           VSDate end, const VSDateComponents& interval,
                                                           bool noonDays, const VSCalendar& calendar);
-
-struct VSCountInBucket {
-    VSTimeSpan bucket;
-    int count = 0;
-};
-/// A query for how many samples of the type start in each bucket of [start, end), counted from `start`. Only
-/// buckets with samples, ascending. The handler runs on the store's threads. REQUIRES: as above.
-std::shared_ptr<VSQuery> VSQueryForFetchingCountStatistics(
-    const VSObjectType* type, VSDate start, VSDate end, const VSDateComponents& interval,
-    std::function<void(const VSResult<std::vector<VSCountInBucket>>&)> handler);
 
 /// Days of the same kind follow each other when no more than this lies between the end of one record and the
 /// start of the next: from a morning to the evening of the next day.

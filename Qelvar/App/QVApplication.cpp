@@ -1,12 +1,17 @@
 #include "Qelvar/App/QVApplication.h"
 
+#include <QEventLoop>
 #include <QGuiApplication>
 #include <QIcon>
 #include <QQmlEngine>
 #include <QQuickView>
+#include <QTimer>
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <memory>
+#include <optional>
+#include <thread>
 
 #include "Platform/Icons.h"
 #include "Platform/Localization.h"
@@ -33,18 +38,69 @@ void chooseGraphics(const QVApplicationOptions& options) {
     QQuickWindow::setGraphicsApi(QSGRendererInterface::Software);
 }
 
+/// A window in place of the application's.
+std::unique_ptr<QQuickView> messageWindow(const QVApplicationOptions& options, const QString& title,
+                                          const QString& message, const QString& buttonTitle) {
+    auto window = std::make_unique<QQuickView>();
+    window->setTitle(QStringLiteral("Qelvar"));
+    window->setResizeMode(QQuickView::SizeRootObjectToView);
+    window->resize(options.size.isValid() ? options.size : QSize(375, 667));
+    window->setInitialProperties({{QStringLiteral("title"), title},
+                                  {QStringLiteral("message"), message},
+                                  {QStringLiteral("buttonTitle"), buttonTitle}});
+    window->setSource(QUrl(QStringLiteral("qrc:/Qelvar/QVStartMessage.qml")));
+    window->show();
+    return window;
+}
+
+/// Opens the store on a thread of its own: it may have to wait for other programs, or bring an older store up
+/// to date. When that takes a while a window says so.
+VSResult<std::shared_ptr<VSHealthStore>> openWaiting(const std::filesystem::path& folder,
+                                                     const QVApplicationOptions& options) {
+    std::optional<VSResult<std::shared_ptr<VSHealthStore>>> answer;
+    QEventLoop loop;
+    std::thread opener([&] {
+        auto opened = VSHealthStore::open(folder);
+        QMetaObject::invokeMethod(
+            &loop,
+            [&answer, &loop, opened = std::move(opened)] {
+                answer = opened;
+                loop.quit();
+            },
+            Qt::QueuedConnection);
+    });
+    std::unique_ptr<QQuickView> window;
+    QGuiApplication::setQuitOnLastWindowClosed(false);
+    QTimer::singleShot(std::chrono::milliseconds(400), &loop, [&] {
+        if (options.screenshots) return;
+        window = messageWindow(options, platform::localized("START_WAITING_TITLE"),
+                               platform::localized("START_WAITING_TEXT"), {});
+        QObject::connect(window.get(), &QWindow::visibleChanged, &loop, [&loop](bool visible) {
+            if (!visible) loop.quit();
+        });
+    });
+    loop.exec();
+    // The person closed the window: what the opening was doing is left as after a kill, which hurts nothing.
+    if (!answer) std::_Exit(1);
+    opener.join();
+    window.reset();
+    QGuiApplication::setQuitOnLastWindowClosed(true);
+    return std::move(*answer);
+}
+
 /// The store of the folder; an error names the place.
-VSResult<std::shared_ptr<VSHealthStore>> openStore(const std::filesystem::path& folder, bool demo) {
+VSResult<std::shared_ptr<VSHealthStore>> openStore(const std::filesystem::path& folder,
+                                                   const QVApplicationOptions& options) {
     std::error_code error;
     const std::filesystem::path parent = std::filesystem::absolute(folder).parent_path();
     std::filesystem::create_directories(parent, error);
     if (error) return VSError{VSErrorCode::NotAccessible, parent.string() + ": " + error.message()};
-    auto store = VSHealthStore::open(folder);
+    auto store = openWaiting(folder, options);
     if (!store) return store;
     platform::UserDefaults::setStandard(
         std::make_unique<platform::UserDefaults>(folder / "user-defaults.json"));
     auto& defaults = platform::UserDefaults::standard();
-    if (demo && !defaults.boolean("UseDemoData")) {
+    if (options.demo && !defaults.boolean("UseDemoData")) {
         // The demonstration replaces all records, so it never begins where a person's may be.
         const auto types = (*store)->typeSummaries();
         if (!types) return types.error();
@@ -89,19 +145,19 @@ int runWindow(QGuiApplication& application, QVAppDelegate& app, const QVApplicat
     return QGuiApplication::exec();
 }
 
-/// Says in a window what keeps the application from starting, for those who did not start it from a terminal.
-void showStartFailure(const QString& message) {
-    QQuickView window;
-    window.setTitle(QStringLiteral("Qelvar"));
-    window.setResizeMode(QQuickView::SizeRootObjectToView);
-    window.resize(375, 667);
-    window.setInitialProperties({{QStringLiteral("title"), platform::localized("START_FAILED_TITLE")},
-                                 {QStringLiteral("message"), message},
-                                 {QStringLiteral("buttonTitle"), platform::localized("CLOSE")}});
-    QObject::connect(window.engine(), &QQmlEngine::quit, &QGuiApplication::quit);
-    window.setSource(QUrl(QStringLiteral("qrc:/Qelvar/QVStartFailure.qml")));
-    window.show();
-    QGuiApplication::exec();
+/// Says in a window what keeps the application from starting, for those who did not start it from a terminal;
+/// or in a picture.
+void showStartFailure(const QString& message, const QVApplicationOptions& options) {
+    const auto window = messageWindow(options, platform::localized("START_FAILED_TITLE"), message,
+                                      platform::localized("CLOSE"));
+    QObject::connect(window->engine(), &QQmlEngine::quit, &QGuiApplication::quit);
+    if (!options.screenshots) {
+        QGuiApplication::exec();
+        return;
+    }
+    std::error_code ignored;
+    std::filesystem::create_directories(*options.screenshots, ignored);
+    window->grabWindow().save(QString::fromStdString((*options.screenshots / "start-failure.png").string()));
 }
 
 }  // namespace
@@ -133,10 +189,13 @@ int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options)
     platform::SystemEvents::shared().start();
 
     const std::filesystem::path folder = options.store.empty() ? QVStoreFolder(options.demo) : options.store;
-    auto store = openStore(folder, options.demo);
+    auto store = openStore(folder, options);
     if (!store) {
         std::fprintf(stderr, "qelvar: the store cannot be opened: %s\n", store.error().message.c_str());
-        if (!options.screenshots) showStartFailure(QString::fromStdString(store.error().message));
+        std::string message = store.error().message;
+        if (store.error().code == VSErrorCode::Corrupt)
+            message += "\n\n`qelvar salvage` in a terminal may save what can be read.";
+        showStartFailure(QString::fromStdString(message), options);
         return 1;
     }
     QVStartupTrace::note("store open");

@@ -102,7 +102,16 @@ class SampleBuilder {
     void addObject(VSSamplePtr object) {
         batch_.push_back(std::move(object));
         if (batch_.size() < batchSize_) return;
-        handler_(std::exchange(batch_, {}), false);
+        // A reading and its values are saved together: values that wait for their reading stay here.
+        const auto waiting =
+            std::stable_partition(batch_.begin(), batch_.end(), [&](const VSSamplePtr& sample) {
+                return std::find(pendingPressures_.begin(), pendingPressures_.end(), sample) ==
+                       pendingPressures_.end();
+            });
+        std::vector<VSSamplePtr> next(waiting, batch_.end());
+        batch_.erase(waiting, batch_.end());
+        if (!batch_.empty()) handler_(std::exchange(batch_, {}), false);
+        batch_ = std::move(next);
     }
 
     void addQuantity(const VSValue& entry, const VSObjectType* type) {

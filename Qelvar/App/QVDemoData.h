@@ -25,7 +25,8 @@ using QVDemoUnits = std::map<const VSObjectType*, VSUnit>;
 QVDemoUnits QVMakeDemoUnits(const VSUnitController& unitController);
 
 /// Makes the samples of the document's entries, relative to `anchor` (the start of today), and hands them
-/// over in batches of `batchSize`, the last one perhaps smaller or empty. Entries of unknown types and
+/// over in batches of `batchSize`, or somewhat smaller to keep the values of a blood pressure with it; the
+/// last one may be empty. Entries of unknown types and
 /// without a usable value are passed over. Any thread.
 void QVBuildDemoSamples(const VSValue::Array& entries, VSDate anchor, const QVDemoUnits& units,
                         size_t batchSize,

@@ -1,6 +1,6 @@
 import QtQuick
 
-// In place of the application, when its store cannot be opened.
+// In place of the application: what keeps it from starting, or what it waits for (then there is no button).
 Rectangle {
     id: root
     property string title
@@ -33,6 +33,7 @@ Rectangle {
             Accessible.name: text
         }
         SystemButton {
+            visible: root.buttonTitle !== ""
             anchors.horizontalCenter: parent.horizontalCenter
             filled: true
             focus: true

@@ -4,7 +4,6 @@
 #include "Qelvar/DataProviders/QVHealthStoreExtensions.h"
 #include "Qelvar/Formatters/QVDateFormatters.h"
 #include "Qelvar/Formatters/QVNumberFormatters.h"
-#include "VessaUI/VSTimePeriods.h"
 
 void QVCountDataProvider::restartQueries() {
     QVDataProvider::restartQueries();
@@ -76,15 +75,15 @@ void QVCountDataProvider::updateHistoricalData(const Range& range, const Error& 
         intake().updateHistoricalData({}, range.timeScope, error, {}, ticket);
         return;
     }
-    execute(VSQueryForFetchingCountStatistics(
-        dataUnit()->sampleType(), range.start, range.end, range.interval,
+    execute(std::make_shared<VSCountStatisticsQuery>(
+        dataUnit()->sampleType(), range.start, range.end, range.interval, VSPredicate(),
         [intake = intake(), scope = range.timeScope,
-         ticket](const VSResult<std::vector<VSCountInBucket>>& answer) {
+         ticket](const VSResult<VSCountStatisticsQuery::Counts>& answer) {
             Points points;
             if (answer) {
-                for (const VSCountInBucket& entry : *answer)
-                    points.push_back(QVChartPointNumeric::chartPoint(
-                        VSMidDate(entry.bucket.start, entry.bucket.end), entry.count));
+                for (const auto& [bucket, count] : *answer)
+                    points.push_back(QVChartPointNumeric::chartPoint(VSMidDate(bucket.start, bucket.end),
+                                                                     static_cast<double>(count)));
             } else {
                 intake.logError("Error executing historical data query", answer.error());
             }

@@ -11,5 +11,6 @@ std::string QVImportRefusal::description() const {
 int64_t QVImportReport::refusalsNotListed() const {
     int64_t all = 0;
     for (const auto& [reason, count] : refusalsByReason) all += count;
+    for (const auto& [reason, count] : partRefusalsByReason) all += count;
     return all - static_cast<int64_t>(refusals.size());
 }

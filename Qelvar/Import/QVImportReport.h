@@ -17,7 +17,7 @@ struct QVImportCount {
     friend bool operator==(const QVImportCount&, const QVImportCount&) = default;
 };
 
-/// One element of a document that was not taken.
+/// One element of a document that was not taken: a record, or a smaller part.
 struct QVImportRefusal {
     std::string document;  // the file's name; for an entry of an archive "archive.zip:entry.xml"
     int64_t line = 0;      // where the element's start tag ends, from 1
@@ -37,11 +37,13 @@ struct QVImportReport {
     QVImportCount total;
     std::map<std::string, QVImportCount>
         byType;  // by type name ("HeartRate"); types unknown as the document names them
-    std::vector<QVImportRefusal> refusals;  // the first ones in full, in the order of the documents
-    std::map<std::string, int64_t> refusalsByReason;
+    std::vector<QVImportRefusal> refusals;            // the first ones in full, in the order of the documents
+    std::map<std::string, int64_t> refusalsByReason;  // of records; they make total.refused
+    std::map<std::string, int64_t> partRefusalsByReason;  // of smaller parts: a metadata entry, an event ...
     int characteristicsSet = 0;        // characteristics of the person that were not set before
     std::vector<std::string> notes;    // what was passed over, such as another document in an archive
     std::optional<VSDate> exportDate;  // the latest one that the documents give
 
+    /// How many refusals, of records and of parts, are counted but not listed.
     int64_t refusalsNotListed() const;
 };

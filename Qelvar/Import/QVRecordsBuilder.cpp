@@ -439,11 +439,12 @@ QVImportRefusal QVRecordsBuilder::refusal(const QVElement& element, Problem prob
 }
 
 void QVRecordsBuilder::refuse(const QVElement& element, Problem problem) {
-    list(refusal(element, std::move(problem)));
+    QVImportRefusal part = refusal(element, std::move(problem));
+    ++report_.partRefusalsByReason[part.reason];
+    list(std::move(part));
 }
 
 void QVRecordsBuilder::list(QVImportRefusal refusal) {
-    ++report_.refusalsByReason[refusal.reason];
     if (report_.refusals.size() < limits_.listedRefusals) report_.refusals.push_back(std::move(refusal));
 }
 
@@ -463,6 +464,7 @@ void QVRecordsBuilder::count(const Draft& draft, std::string_view typeAsGiven) {
     if (!draft.refusal) return;
     ++ofType.refused;
     ++report_.total.refused;
+    ++report_.refusalsByReason[draft.refusal->reason];
     list(*draft.refusal);
 }
 
@@ -490,8 +492,11 @@ void QVRecordsBuilder::flush() {
 QVImportReport QVRecordsBuilder::takeReport() {
     for (size_t code = 0; code < counts_.size(); ++code) {
         if (counts_[code].read == 0) continue;
-        if (const VSObjectType* type = VSObjectType::dataTypeWithCode(static_cast<int>(code)))
-            report_.byType[std::string(type->name())] = counts_[code];
+        const VSObjectType* type = VSObjectType::dataTypeWithCode(static_cast<int>(code));
+        // A document may name a type that it has not by the bare name of one that there is.
+        QVImportCount& count = report_.byType[std::string(type->name())];
+        count.read += counts_[code].read;
+        count.refused += counts_[code].refused;
     }
     return std::move(report_);
 }

@@ -89,6 +89,7 @@ class QVRecordsBuilder {
                      std::optional<VSQuantity>& result);
     Check readDuration(const QVElement& element, VSDuration& duration);
 
+    /// Of a part: its record goes on without it.
     void refuse(const QVElement& element, Problem problem);
     QVImportRefusal refusal(const QVElement& element, Problem problem) const;
     void count(const Draft& draft, std::string_view typeAsGiven);

@@ -13,8 +13,7 @@ namespace {
 
 using std::chrono::milliseconds;
 constexpr auto kProgressInterval = milliseconds(100);
-constexpr VSDuration kPatience = std::chrono::seconds(30);  // for a writer in another process
-constexpr VSDuration kPatienceStep = milliseconds(500);     // between two looks at the flag
+constexpr VSDuration kSilentPatience = milliseconds(500);  // for another writer, before it is told
 constexpr VSDuration kPopPatience = milliseconds(100);
 constexpr size_t kListedNotes = 100;
 constexpr auto kEarliestDate = VSDate(std::chrono::sys_days(std::chrono::year(1900) / 1 / 1));
@@ -206,18 +205,6 @@ class Storing {
     int characteristics_ = 0;
 };
 
-/// Waits for the store's writer in small steps, so that the flag is heard.
-VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> begin(VSHealthStore& store,
-                                                                  const std::string& name,
-                                                                  const std::atomic<bool>* cancel) {
-    for (VSDuration waited{};; waited += kPatienceStep) {
-        if (isSet(cancel)) return cancelled();
-        auto transaction = store.beginImport(name, kPatienceStep);
-        if (transaction || transaction.error().code != VSErrorCode::NotAccessible || waited >= kPatience)
-            return transaction;
-    }
-}
-
 std::string importName(const std::vector<std::filesystem::path>& files) {
     std::string name;
     for (const auto& file : files) name += (name.empty() ? "" : ", ") + file.filename().string();
@@ -236,7 +223,10 @@ class Progress {
         const auto now = std::chrono::steady_clock::now();
         if (!always && now - last_ < kProgressInterval) return;
         last_ = now;
-        options_.progress({bytesDone, total_, records});
+        options_.progress({bytesDone, total_, records, false});
+    }
+    void tellWaiting() const {
+        if (options_.progress) options_.progress({0, total_, 0, true});
     }
 
  private:
@@ -245,15 +235,30 @@ class Progress {
     std::chrono::steady_clock::time_point last_{};
 };
 
+/// Waits for the store's writer. As long as another program holds it, that one lives and works: its locks go
+/// with it. So there is no limit but the person's patience.
+VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> begin(VSHealthStore& store,
+                                                                  const std::string& name,
+                                                                  const std::atomic<bool>* cancel,
+                                                                  Progress& progress) {
+    auto transaction = store.beginImport(name, kSilentPatience, cancel);
+    if (!transaction && transaction.error().isHeldByOthers && !isSet(cancel)) {
+        progress.tellWaiting();
+        transaction = store.beginImport(name, VSDuration::max(), cancel);
+    }
+    if (isSet(cancel)) return cancelled();
+    return transaction;
+}
+
 }  // namespace
 
 VSResult<QVImportReport> QVRecordsImporter::importFiles(const std::vector<std::filesystem::path>& files,
                                                         const QVImportOptions& options) {
     Reading reading(files, options);
-    auto transaction = begin(*store_, importName(files), options.cancel);
+    Progress progress(options, files);
+    auto transaction = begin(*store_, importName(files), options.cancel, progress);
     if (!transaction) return transaction.error();
     Storing storing(options.listedRefusals);
-    Progress progress(options, files);
     while (!reading.queue().isDrained()) {
         if (isSet(options.cancel)) return cancelled();
         const auto batch = reading.queue().pop(kPopPatience);
@@ -267,7 +272,9 @@ VSResult<QVImportReport> QVRecordsImporter::importFiles(const std::vector<std::f
     if (!report) return report;
     storing.completeReport(*report);
     report->notes = reading.notes();
-    if (const VSStatus status = (*transaction)->commit(); !status) return status.error();
+    if (!options.dryRun) {
+        if (const VSStatus status = (*transaction)->commit(); !status) return status.error();
+    }
     progress.tell(reading.bytesDone(), storing.records(), true);
     return report;
 }

@@ -15,6 +15,7 @@ struct QVImportProgress {
     uint64_t bytesDone = 0;   // of the files as they lie on disk
     uint64_t bytesTotal = 0;  // 0: not known (a pipe)
     int64_t records = 0;      // records handed to the store so far
+    bool isWaiting = false;   // for another program that writes to the store
 };
 
 struct QVImportOptions {
@@ -27,6 +28,8 @@ struct QVImportOptions {
     std::optional<VSDate> latestDate;
     /// How many refusals the report lists in full.
     size_t listedRefusals = 20;
+    /// Everything as in an import, and then nothing of it is kept.
+    bool dryRun = false;
 };
 
 /// Reads records documents (.xml) and archives that hold them (.zip) into a store.
@@ -34,7 +37,8 @@ struct QVImportOptions {
 /// The documents are read as a stream: memory does not grow with their length. A second thread reads and
 /// checks while the calling one hands the records to the store, all in one transaction: whatever ends an
 /// import early leaves no trace of it. What is in the store already is not added again; a document's
-/// identical records are all kept.
+/// identical records are all kept. While another program writes to the store an import waits for it, as long
+/// as it takes.
 ///
 /// A record that cannot be understood is refused alone and reported. A document that is damaged (not
 /// well-formed, not a records document, with entities or an external declaration) is refused as a whole, and

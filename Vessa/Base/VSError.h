@@ -21,6 +21,8 @@ enum class VSErrorCode {
 struct VSError {
     VSErrorCode code = VSErrorCode::Failed;
     std::string message;
+    /// Of NotAccessible: others hold the database, so waiting for them may help.
+    bool isHeldByOthers = false;
 
     friend bool operator==(const VSError&, const VSError&) = default;
 };

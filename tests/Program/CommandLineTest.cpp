@@ -28,7 +28,8 @@ class CommandLine : public testing::Test {
 TEST_F(CommandLine, TellsAboutItself) {
     const auto help = run({"--help"});
     EXPECT_EQ(help.status, 0);
-    for (const char* command : {"import", "statistics", "samples", "types", "sources", "check"}) {
+    for (const char* command :
+         {"import", "statistics", "samples", "types", "sources", "batches", "undo", "check"}) {
         EXPECT_NE(help.output.find(std::string("\n  ") + command), std::string::npos) << command;
         const auto ofCommand = run({command, "--help"});
         EXPECT_EQ(ofCommand.status, 0);
@@ -54,6 +55,10 @@ TEST_F(CommandLine, WrongCommandLinesAreTwo) {
              {"samples"},
              {"samples", "HeartRate", "--limit", "few"},
              {"types", "all"},
+             {"batches", "1"},
+             {"undo"},
+             {"undo", "last"},
+             {"undo", "1", "2"},
              {"check", "--help=yes"},
              {"--size", "big"},
              {"--now", "later", "types"},
@@ -102,6 +107,65 @@ TEST_F(CommandLine, ImportTellsWhatItDid) {
     const auto second =
         run({"import", kData / "refused-records" / "input.xml", kData / "identical-records" / "input.xml"});
     EXPECT_NE(second.output.find("\ntotal\t54\t5\t2\t47\n"), std::string::npos) << second.output;
+}
+
+TEST_F(CommandLine, ATrialTellsWhatAnImportWouldDoAndKeepsNothing) {
+    const std::string file = kData / "refused-records" / "input.xml";
+    const auto trial = run({"import", "--dry-run", file});
+    EXPECT_EQ(trial.status, 0);
+    EXPECT_NE(trial.errors.find("nothing of it is kept"), std::string::npos);
+    EXPECT_FALSE(fs::exists(folder_.path() / "data" / "qelvar")) << "no store is made for a trial";
+    const auto real = run({"import", file});
+    EXPECT_EQ(trial.output, real.output);
+    const auto types = run({"types", "--recorded"}).output;
+    EXPECT_NE(run({"import", "--dry-run", file}).output.find("\ntotal\t49\t0\t2\t47\n"), std::string::npos);
+    EXPECT_EQ(run({"import", "--dry-run", kData / "refused-entity-bomb" / "input.xml"}).status, 4);
+    EXPECT_EQ(run({"types", "--recorded"}).output, types);
+    EXPECT_EQ(test::rowsOf(run({"batches"}).output).size(), 1U);
+}
+
+TEST_F(CommandLine, ATrialMakesNoStoreAndChangesNone) {
+    const std::string file = kData / "refused-records" / "input.xml";
+    const fs::path store = folder_.path() / "data" / "qelvar";
+    fs::create_directories(store);
+    EXPECT_EQ(run({"import", "--dry-run", file}).status, 0);
+    EXPECT_TRUE(fs::is_empty(store)) << "a folder is no store";
+    program_.set("TMPDIR", folder_.path() / "missing");
+    EXPECT_EQ(run({"import", "--dry-run", file}).status, 6) << "nowhere to try it";
+    EXPECT_FALSE(fs::exists("vessa.sqlite"));
+    // One of an older version is not brought to this one.
+    fs::copy_file(fs::path(QELVAR_TEST_DATA) / "stores" / "version-1" / "vessa.sqlite",
+                  store / "vessa.sqlite");
+    const auto bytes = [&] {
+        std::ifstream stream(store / "vessa.sqlite", std::ios::binary);
+        return std::string(std::istreambuf_iterator<char>(stream), {});
+    };
+    const std::string before = bytes();
+    const auto refused = run({"import", "--dry-run", file});
+    EXPECT_EQ(refused.status, 5) << refused.errors;
+    EXPECT_NE(refused.errors.find("older format"), std::string::npos) << refused.errors;
+    EXPECT_EQ(bytes(), before);
+}
+
+TEST_F(CommandLine, ImportsAreListedAndTakenBack) {
+    EXPECT_EQ(run({"undo", "1"}).status, 3);
+    import("wrist-two-days");
+    import("every-kind");
+    import("wrist-two-days");
+    const auto batches = test::rowsOf(run({"batches"}).output);
+    ASSERT_EQ(batches.size(), 3U);
+    EXPECT_EQ(batches[0].at("batch"), "1");
+    EXPECT_EQ(batches[0].at("name"), "input.zip");
+    EXPECT_EQ(batches[0].at("added"), batches[0].at("present"));
+    EXPECT_EQ(batches[2].at("added"), "0");
+    const auto first = test::rowsOf(run({"undo", "1"}).output).at(0);
+    EXPECT_EQ(first.at("removed"), "0");
+    EXPECT_EQ(first.at("kept"), batches[0].at("added"));
+    EXPECT_EQ(test::rowsOf(run({"undo", "3"}).output).at(0).at("removed"), batches[0].at("added"));
+    EXPECT_EQ(run({"undo", "3"}).status, 3);
+    EXPECT_GT(std::stoi(test::rowsOf(run({"undo", "2"}).output).at(0).at("characteristics")), 0);
+    EXPECT_TRUE(test::rowsOf(run({"types", "--recorded"}).output).empty());
+    EXPECT_EQ(run({"check"}).status, 0);
 }
 
 TEST_F(CommandLine, StatisticsFollowZoneUnitAndSource) {

@@ -42,8 +42,8 @@ TEST_F(StoreBasics, EveryKindOfSampleComesBackAsItWasSaved) {
     provenance.timeZoneOffset = 20700;
 
     const auto start = date("1969-12-31T23:59:59.999999Z"), end = date("2020-03-01T08:00");
-    const double awkward[] = {0.1 + 0.2, -0.0, 1e-300, 123456789012345680.0,
-                              75.0,      -3.0, 5e-324, 140737488355328.0};
+    const double awkward[] = {0.1 + 0.2, -0.0, 1e-300, 12345678901234.568,
+                              75.0,      -3.0, 5e-324, 140737488355327.0};
     std::vector<VSSamplePtr> objects;
     for (double value : awkward) objects.push_back(quantity(heartRate(), value, start, end, provenance));
     objects.push_back(
@@ -114,6 +114,7 @@ TEST_F(StoreBasics, OneBadObjectKeepsAllOut) {
                                            date("2020-03-01T08:00")),
         quantity(heartRate(), 60, VSDate::distantPast(), date("2020-03-01T08:00")),
         quantity(heartRate(), 60, date("2020-03-01T08:00"), VSDate::distantFuture()),
+        quantity(heartRate(), -0x1p47, "2020-03-01T08:00", "2020-03-01T08:00"),
     };
     for (const auto& object : bad) {
         const VSStatus status = store->saveObjectsAndWait({good, object});
@@ -150,6 +151,28 @@ TEST_F(StoreBasics, DeletionTakesTheObjectAndLeavesMembers) {
         store->deleteObjects({reading.objects()[0], reading.objects()[1], pressures[1]}, done);
     }));
     EXPECT_EQ(allSamples(*store, type(VSCode::BloodPressureSystolic)).size(), 1u);
+    expectSound(*store);
+}
+
+TEST_F(StoreBasics, AllToDeleteAreFoundBeforeAnyGoes) {
+    // As they were made, without numbers.
+    const VSSamplePtr made = bloodPressure(120, 80, "2020-03-01T08:00");
+    const auto members = dynamic_cast<const VSCorrelation&>(*made).objects();
+    const auto beat = [] { return quantity(heartRate(), 60, "2020-03-01T08:00", "2020-03-01T08:00"); };
+    EXPECT_OK(store->saveObjectsAndWait({made, beat(), beat(), beat(), beat()}));
+    const auto remove = [&](std::vector<VSSamplePtr> objects) {
+        return wait([&](auto done) { store->deleteObjects(std::move(objects), done); });
+    };
+    EXPECT_OK(remove({members[0], members[1], made}));
+    EXPECT_TRUE(allSamples(*store, type(VSCode::BloodPressure)).empty());
+    // Equal ones are different ones; the same one twice is one, also beside its like.
+    const auto beats = allSamples(*store, heartRate());
+    const VSSamplePtr unnumbered = beat();
+    EXPECT_OK(remove({unnumbered, beats[3], beats[3], unnumbered}));
+    EXPECT_EQ(allSamples(*store, heartRate()).size(), 2u);
+    EXPECT_EQ(remove({beat(), beat(), beat()}).error().code, VSErrorCode::NotFound) << "there are two";
+    EXPECT_OK(remove({beat(), beat()}));
+    EXPECT_TRUE(store->typeSummaries()->empty());
     expectSound(*store);
 }
 

@@ -209,3 +209,31 @@ TEST_F(StoreImport, ADocumentOfAnotherSeasonSaysTheSame) {
     EXPECT_EQ(count(VSCode::StepCount), 2u);
     expectSound(*store);
 }
+
+TEST_F(StoreImport, ManyRecordsOfOneStartAreFoundAgainInNoTime) {
+    // All alike, with two creations and without any, and all different:
+    // looked at one by one, these would be ten billion comparisons.
+    constexpr int count = 100'000;
+    std::vector<VSSamplePtr> records;
+    VSProvenance created = from("Watch");
+    for (int i = 0; i < count; ++i) {
+        created.creationDate = date("2020-03-01T09:00") + std::chrono::seconds(i % 2);
+        records.push_back(i % 3 ? pulse(i % 4 < 2 ? 60 : 1000 + i, "2020-03-01T08:00", created)
+                                : pulse(61, "2020-03-01T08:00"));
+    }
+    EXPECT_EQ(import(records), (Tally{count, 0}));
+    std::reverse(records.begin() + count / 2, records.end());
+    EXPECT_EQ(import(records), (Tally{0, count}));
+    records.push_back(pulse(61, "2020-03-01T08:00"));
+    records.push_back(pulse(61 * (1 + 1e-13), "2020-03-01T08:00"));
+    EXPECT_EQ(import(records), (Tally{2, count}));
+    EXPECT_EQ(import(records), (Tally{0, count + 2}));
+    // Members too, which join the records of the same moment.
+    std::vector<VSSamplePtr> readings;
+    for (int i = 0; i < 300; ++i) readings.push_back(reading(pressure(120 + i % 3, 80)));
+    EXPECT_EQ(import(readings), (Tally{300, 0}));
+    for (int i = 0; i < 300; ++i) readings.push_back(pressure(120 + i % 3, 80)[0]);
+    EXPECT_EQ(import(readings), (Tally{0, 600}));
+    EXPECT_EQ(this->count(VSCode::BloodPressureSystolic), 300u);
+    expectSound(*store);
+}

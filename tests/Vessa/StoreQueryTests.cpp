@@ -66,6 +66,14 @@ TEST_F(StoreQueries, AgreesWithFilteringEverything) {
             static_cast<int>(pick(0, 3)));
         if (pick(0, 3) == 0)
             predicate =
+                predicate & VSPredicate::samplesWithStartDate(a + std::chrono::hours(pick(-20, 20)),
+                                                              std::nullopt, static_cast<int>(pick(0, 3)));
+        if (pick(0, 3) == 0)
+            predicate = predicate & VSPredicate::samplesWithStartDate(std::nullopt,
+                                                                      b + std::chrono::hours(pick(-20, 20)),
+                                                                      static_cast<int>(pick(0, 3)));
+        if (pick(0, 3) == 0)
+            predicate =
                 predicate & VSPredicate::samplesStartingBefore(origin + std::chrono::hours(pick(0, 240)));
         if (pick(0, 3) == 0) predicate.sources = {VSSource::forImportedName("Phone")};
         if (pick(0, 7) == 0) predicate.metadataKeys = {"tag"};
@@ -224,6 +232,12 @@ TEST_F(StoreQueries, StatisticsAnswerOnce) {
         heartRate(), VSPredicate::samplesWithStartDate(date("2020-04-01"), std::nullopt, 0), 30);
     EXPECT_FALSE(empty->hasData());
     EXPECT_EQ(empty->count, 0);
+    for (const VSDateComponents& interval : {VSDateComponents{}, VSDateComponents{.days = -1}}) {
+        const auto buckets = store->statisticsCollection(heartRate(), {}, VSStatisticsOptionDiscreteAverage,
+                                                         date("2020-03-01"), interval);
+        ASSERT_FALSE(buckets.ok());
+        EXPECT_EQ(buckets.error().code, VSErrorCode::Invalid);
+    }
 }
 
 TEST_F(StoreQueries, SourcesStandInTheirOrder) {
@@ -247,6 +261,10 @@ TEST_F(StoreQueries, SourcesStandInTheirOrder) {
     EXPECT_EQ(order(), (std::vector<std::string>{"Young", "own", "Old"}));
     save(1, "2020-02-01T08:00", "", steps(), from("New"));
     EXPECT_EQ(order(), (std::vector<std::string>{"Young", "own", "New", "Old"}));
+    EXPECT_OK(wait(
+        [&](auto done) { store->setOrderedSources({VSSource::forImportedName("Lost")}, steps(), done); }));
+    EXPECT_EQ(order(), (std::vector<std::string>{"New", "Old", "Young", "own"})) << "the user chose";
+    expectSound(*store);
 
     Promise<size_t> sources;
     store->executeQuery(std::make_shared<VSSourceQuery>(

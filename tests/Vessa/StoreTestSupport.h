@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <condition_variable>
+#include <cstdlib>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -12,6 +13,11 @@
 #include "Vessa/VSHealthStore.h"
 
 namespace test {
+
+/// QELVAR_LONG_TESTS in the environment: every case there is, instead of a selection.
+inline bool longTests() {
+    return std::getenv("QELVAR_LONG_TESTS") != nullptr;
+}
 
 inline const VSObjectType* type(VSTypeCode code) {
     return VSObjectType::dataTypeWithCode(code);

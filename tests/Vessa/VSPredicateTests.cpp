@@ -101,23 +101,23 @@ TEST(VSPredicate, JoiningMeansBoth) {
     };
     int matched = 0;
     for (int i = 0; i < 20'000; ++i) {
-        const int options = static_cast<int>(random() % 4);
-        auto a = VSPredicate::samplesWithStartDate(moment(), moment(), options),
-             b = VSPredicate::samplesWithStartDate(moment(), moment(), options);
+        const auto range = [&] {
+            return VSPredicate::samplesWithStartDate(moment(), moment(), static_cast<int>(random() % 4));
+        };
+        auto a = range(), b = range();
         a.startsBefore = moment();
         b.startsBefore = moment();
         if (random() % 3 == 0) a.categoryValue = static_cast<int>(random() % 2);
         if (random() % 3 == 0) b.categoryValue = static_cast<int>(random() % 2);
-        // Ranges apart from each other join to an empty one, though a long span may meet both.
-        const auto joined = a & b;
-        if (joined.startDate && joined.endDate && *joined.startDate >= *joined.endDate) continue;
+        const auto c = range();
+        const auto joined = a & b & c;
         const int start = static_cast<int>(random() % 10);
         const auto sample =
             sleep(start, start + static_cast<int>(random() % 5), static_cast<int>(random() % 2));
-        ASSERT_EQ(joined.matches(sample), a.matches(sample) && b.matches(sample));
+        ASSERT_EQ(joined.matches(sample), a.matches(sample) && b.matches(sample) && c.matches(sample));
         matched += joined.matches(sample);
     }
-    EXPECT_GT(matched, 500);
+    EXPECT_GT(matched, 150);
 }
 
 TEST(VSStatisticsCollection, EnumeratesEmptyBucketsToo) {

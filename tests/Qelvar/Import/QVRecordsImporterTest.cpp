@@ -11,6 +11,7 @@
 
 #include "RecordsText.h"
 #include "TestSupport.h"
+#include "Vessa/VSDatabase.h"
 
 namespace {
 
@@ -160,6 +161,30 @@ TEST_F(QVRecordsImporterTest, ProgressEndsAtTheEnd) {
     EXPECT_TRUE(std::is_sorted(seen.begin(), seen.end(), [](const auto& a, const auto& b) {
         return a.records < b.records || a.bytesDone < b.bytesDone;
     }));
+}
+
+TEST_F(QVRecordsImporterTest, WaitsForAnotherWriterButNotForAStoreThatIsGone) {
+    const auto file = write("short.xml", kHead + records(5) + kTail);
+    const fs::path database = folder_.path() / "store" / "vessa.sqlite";
+    VSDatabase other(database, VSDatabase::Mode::Write, VSDuration(0));
+    other.execute("BEGIN IMMEDIATE");
+    QVImportOptions options;
+    int waits = 0;
+    options.progress = [&](const QVImportProgress& progress) {
+        if (!progress.isWaiting) return;
+        ++waits;
+        other.execute("ROLLBACK");
+    };
+    const auto report = import({file}, options);
+    ASSERT_TRUE(report.ok()) << report.error().message;
+    EXPECT_EQ(report->total.added, 5);
+    EXPECT_EQ(waits, 1);
+
+    fs::rename(folder_.path() / "store", folder_.path() / "away");
+    const auto gone = import({file}, options);
+    ASSERT_FALSE(gone.ok());
+    EXPECT_EQ(gone.error().code, VSErrorCode::NotAccessible) << gone.error().message;
+    EXPECT_EQ(waits, 1);
 }
 
 TEST_F(QVRecordsImporterTest, APipeIsReadAndCanBeGivenUp) {

@@ -78,6 +78,8 @@ std::string textOfReport(const VSResult<QVImportReport>& report) {
     for (const auto& refusal : report->refusals) text += "refused " + refusal.description() + "\n";
     for (const auto& [reason, count] : report->refusalsByReason)
         text += "reason " + reason + ": " + std::to_string(count) + "\n";
+    for (const auto& [reason, count] : report->partRefusalsByReason)
+        text += "part reason " + reason + ": " + std::to_string(count) + "\n";
     return text;
 }
 

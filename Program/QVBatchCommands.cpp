@@ -1,0 +1,77 @@
+#include <charconv>
+
+#include "Program/QVCommand.h"
+#include "Program/QVTabOutput.h"
+
+namespace {
+
+QVExitStatus finish(QVTabOutput& output) {
+    const VSStatus status = output.finish();
+    return status ? QVExitStatus::Success : QVFail(status.error());
+}
+
+QVExitStatus runBatches(const QVCommandContext& context) {
+    if (!context.arguments.words().empty()) return QVFailUsage("batches", "batches takes no words");
+    auto store = QVOpenStoreForReading(context.storeFolder);
+    if (!store) return QVFail(store.error());
+    const auto batches = (*store)->batches();
+    if (!batches) return QVFail(batches.error());
+    QVTabOutput output;
+    output.row({"batch", "date", "name", "added", "present"});
+    for (const VSBatch& batch : *batches) {
+        output.row({std::to_string(batch.id), output.date(batch.date), batch.name,
+                    std::to_string(batch.added), std::to_string(batch.present)});
+    }
+    return finish(output);
+}
+
+QVExitStatus runUndo(const QVCommandContext& context) {
+    const auto& words = context.arguments.words();
+    if (words.size() != 1) return QVFailUsage("undo", "undo needs the number of one batch");
+    int64_t batch = 0;
+    const char* const end = words[0].data() + words[0].size();
+    const auto [stopped, error] = std::from_chars(words[0].data(), end, batch);
+    if (error != std::errc{} || stopped != end)
+        return QVFailUsage("undo", words[0] + " is not the number of a batch; `qelvar batches` lists them");
+    std::error_code ignored;
+    if (!std::filesystem::exists(context.storeFolder, ignored))
+        return QVFail({VSErrorCode::NotFound, "there is no store in " + context.storeFolder.string()});
+    VSHealthStore::Options options;
+    options.createIfMissing = false;
+    auto store = VSHealthStore::open(context.storeFolder, options);
+    if (!store) return QVFail(store.error());
+    const auto report = (*store)->undoBatch(batch);
+    if (!report) return QVFail(report.error());
+    QVTabOutput output;
+    output.row({"removed", "kept", "gone", "characteristics"});
+    output.row({std::to_string(report->removed), std::to_string(report->kept), std::to_string(report->gone),
+                std::to_string(report->characteristics)});
+    return finish(output);
+}
+
+}  // namespace
+
+const QVCommand QVBatchesCommand{"batches",
+                                 "list the imports",
+                                 R"(Usage: qelvar batches
+
+Standard output: batch (its number), date, name (of the files), added (how many objects the import added; the
+values of a blood pressure count beside it), present (how many of them the store still has); a row for each
+import that was not undone, oldest first.
+)",
+                                 {},
+                                 runBatches};
+
+const QVCommand QVUndoCommand{"undo",
+                              "take an import back",
+                              R"(Usage: qelvar undo BATCH
+
+Takes back what an import did; `qelvar batches` lists the imports by number. What it added is removed, except
+what another import had in its documents too. What was entered by hand stays. Characteristics that it set and
+that have not been changed since are not set again, unless another import told them too. It is done at once,
+without a question, and as a whole; importing the same documents again brings everything back.
+
+Standard output: removed, kept (for another import), gone (what had been deleted before), characteristics.
+)",
+                              {},
+                              runUndo};
