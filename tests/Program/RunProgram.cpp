@@ -9,6 +9,7 @@
 #include <array>
 #include <cstdio>
 #include <cstdlib>
+#include <fstream>
 #include <sstream>
 
 namespace test {
@@ -122,6 +123,13 @@ std::vector<Row> rowsOf(const std::string& text) {
         rows.push_back(std::move(row));
     }
     return rows;
+}
+
+std::string contentOf(const std::filesystem::path& path) {
+    std::ifstream file(path, std::ios::binary);
+    std::ostringstream text;
+    text << file.rdbuf();
+    return text.str();
 }
 
 }  // namespace test

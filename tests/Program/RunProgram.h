@@ -70,4 +70,7 @@ class Program {
 using Row = std::map<std::string, std::string>;
 std::vector<Row> rowsOf(const std::string& text);
 
+/// All bytes of a file; none when it cannot be read.
+std::string contentOf(const std::filesystem::path& path);
+
 }  // namespace test

@@ -2,8 +2,6 @@
 
 #include <cmath>
 #include <cstdlib>
-#include <fstream>
-#include <sstream>
 
 #include "RunProgram.h"
 #include "TestSupport.h"
@@ -15,13 +13,6 @@
 namespace {
 
 namespace fs = std::filesystem;
-
-std::string contentOf(const fs::path& path) {
-    std::ifstream file(path, std::ios::binary);
-    std::ostringstream text;
-    text << file.rdbuf();
-    return text.str();
-}
 
 bool sameNumber(const std::string& a, const std::string& b) {
     if (a.empty() || b.empty()) return a == b;
@@ -53,7 +44,7 @@ void compareWithTable(const test::Program& program, const fs::path& table) {
     std::map<std::string, std::string> totals;
     for (auto& row : test::rowsOf(types.output)) totals[row["type"]] = row["count"];
 
-    const auto expected = test::rowsOf(contentOf(table));
+    const auto expected = test::rowsOf(test::contentOf(table));
     ASSERT_FALSE(expected.empty());
     for (const auto& row : expected) {
         const auto& type = row.at("type");

@@ -2,8 +2,6 @@
 
 #include <cmath>
 #include <cstdlib>
-#include <fstream>
-#include <sstream>
 
 #include "RunProgram.h"
 #include "TestSupport.h"
@@ -15,13 +13,6 @@
 namespace {
 
 namespace fs = std::filesystem;
-
-std::string contentOf(const fs::path& path) {
-    std::ifstream file(path, std::ios::binary);
-    std::ostringstream text;
-    text << file.rdbuf();
-    return text.str();
-}
 
 /// But for the last bits of numbers, which another way of adding may change.
 bool sameField(const std::string& a, const std::string& b) {
@@ -60,9 +51,10 @@ void compareStore(const test::Program& program, const fs::path& store, const fs:
         const std::string name = entry.path().stem().string();
         SCOPED_TRACE(name);
         if (name == "statistics")
-            compareRows(contentOf(entry.path()), ask({"statistics", "all", "--every", "day", "--by-source"}));
+            compareRows(test::contentOf(entry.path()),
+                        ask({"statistics", "all", "--every", "day", "--by-source"}));
         else
-            EXPECT_EQ(contentOf(entry.path()), ask({"samples", name}));
+            EXPECT_EQ(test::contentOf(entry.path()), ask({"samples", name}));
     }
 }
 
