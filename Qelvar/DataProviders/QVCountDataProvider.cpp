@@ -4,10 +4,11 @@
 #include "Qelvar/DataProviders/QVHealthStoreExtensions.h"
 #include "Qelvar/Formatters/QVDateFormatters.h"
 #include "Qelvar/Formatters/QVNumberFormatters.h"
+#include "VessaUI/VSTimePeriods.h"
 
 void QVCountDataProvider::restartQueries() {
     QVDataProvider::restartQueries();
-    if (!hasLoadedSecondaryValues() || !secondaryValueQuery_.isRunning()) restartSecondaryValueQuery();
+    if (needsSecondaryValueQuery(secondaryValueQuery_)) restartSecondaryValueQuery();
     restartHistoricalDataQuery();
 }
 
@@ -36,22 +37,23 @@ void QVCountDataProvider::restartSecondaryValueQuery() {
 void QVCountDataProvider::updateSecondaryValue(const Error& error) {
     const Ticket ticket = nextTicket();
     if (error) {
-        intake().logError("Error executing current value query", *error);
+        intake().logErrorAlways("Error executing current value query", *error);
         intake().updateSecondaryValue({}, error, ticket);
         return;
     }
-    mostRecentSampleOfType(*healthStore(), dataUnit()->sampleType(), std::nullopt,
-                           [intake = intake(), ticket](const VSResult<VSSamplePtr>& answer) {
-                               if (!answer) {
-                                   intake.logError("Error updating secondary value query", answer.error());
-                                   intake.updateSecondaryValue({}, answer.error(), ticket);
-                                   return;
-                               }
-                               const auto latest =
-                                   *answer ? Value((*answer)->endDate().secondsSinceReferenceDate())
-                                           : std::nullopt;
-                               intake.updateSecondaryValue(latest, std::nullopt, ticket);
-                           });
+    mostRecentSampleOfType(
+        *healthStore(), dataUnit()->sampleType(), std::nullopt,
+        [intake = intake(), ticket](const VSResult<VSSamplePtr>& answer) {
+            if (!answer) {
+                intake.logErrorAlways("Error updating secondary value query", answer.error());
+                intake.updateSecondaryValue({}, answer.error(), ticket);
+                return;
+            }
+            Value latest;
+            if (*answer)
+                latest = VSLastMomentOfSample(**answer, VSCalendar::current()).secondsSinceReferenceDate();
+            intake.updateSecondaryValue(latest, std::nullopt, ticket);
+        });
 }
 
 void QVCountDataProvider::restartHistoricalDataQuery() {
@@ -71,7 +73,7 @@ void QVCountDataProvider::restartHistoricalDataQuery() {
 void QVCountDataProvider::updateHistoricalData(const Range& range, const Error& error) {
     const Ticket ticket = nextTicket();
     if (error) {
-        intake().logError("Error executing historical data query", *error);
+        intake().logErrorAlways("Error executing historical data query", *error);
         intake().updateHistoricalData({}, range.timeScope, error, {}, ticket);
         return;
     }
@@ -85,7 +87,7 @@ void QVCountDataProvider::updateHistoricalData(const Range& range, const Error& 
                     points.push_back(QVChartPointNumeric::chartPoint(VSMidDate(bucket.start, bucket.end),
                                                                      static_cast<double>(count)));
             } else {
-                intake.logError("Error executing historical data query", answer.error());
+                intake.logErrorAlways("Error executing historical data query", answer.error());
             }
             intake.updateHistoricalData(std::move(points), scope,
                                         answer ? std::nullopt : Error(answer.error()), {}, ticket);

@@ -3,14 +3,15 @@
 #include "Qelvar/DataProviders/QVDataProvider.h"
 
 /// For samples whose only meaning is that they happened: a point per bucket with the number of samples. The
-/// secondary value is the end of the latest sample, in seconds since the reference date, for all time scopes.
-/// There is no current value.
+/// secondary value is the end of the latest sample (in its last day: VSLastMomentOfSample), in seconds since
+/// the reference date, for all time scopes. There is no current value.
 class QVCountDataProvider final : public QVDataProvider {
  public:
     using QVDataProvider::QVDataProvider;
 
     void restartQueries() override;
     void stopQueries() override;
+    bool showsCurrentValue() const override { return false; }
     /// "Last activity" and its date.
     platform::StyledText secondaryValueText() const override;
     const char* className() const override { return "QVCountDataProvider"; }

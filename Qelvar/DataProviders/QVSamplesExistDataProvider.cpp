@@ -37,7 +37,7 @@ bool isPositiveTest(const VSSample& sample) {
 void QVSamplesExistDataProvider::restartQueries() {
     QVDataProvider::restartQueries();
     if (shouldDisplayPrimaryValue() && needsCurrentValueQuery(currentValueQuery_)) restartCurrentValueQuery();
-    if (shouldDisplaySecondaryValue() && (!hasLoadedSecondaryValues() || !secondaryValueQuery_.isRunning()))
+    if (shouldDisplaySecondaryValue() && needsSecondaryValueQuery(secondaryValueQuery_))
         restartSecondaryValueQuery();
     restartHistoricalDataQuery();
 }
@@ -55,10 +55,10 @@ platform::StyledText QVSamplesExistDataProvider::secondaryValueText() const {
     const QString date =
         value ? QVShortDateFormatter().stringFromDate(VSDate::fromSecondsSinceReferenceDate(*value))
               : QVNoDataString();
-    const platform::StyledText text(secondaryTextForDate(date));
+    platform::StyledText text(secondaryTextForDate(date));
     if (!shouldPrefixSecondaryValueWithDot()) return text;
     const QImage dot =
-        QVChartSeriesPointMarker::chartPointWithColor(Qt::white, dotRadius, dotLineWidth, QVPointStyle::Ring);
+        QVChartSeriesPointMarker::chartPointForText(Qt::white, dotRadius, dotLineWidth, QVPointStyle::Ring);
     return platform::prefixedWithImage(text, dot, dotBaselineAdjustment, dotSpacing);
 }
 
@@ -84,7 +84,9 @@ void QVSamplesExistDataProvider::updateMostRecentObject(const Error& error) {
         *healthStore(), dataUnit()->sampleType(), std::nullopt,
         [intake = intake(), ticket](const VSResult<std::shared_ptr<const VSCategorySample>>& answer) {
             if (answer && *answer) {
-                intake.updateCurrentValue((*answer)->value(), (*answer)->endDate(), std::nullopt, {}, ticket);
+                intake.updateCurrentValue((*answer)->value(),
+                                          VSLastMomentOfSample(**answer, VSCalendar::current()), std::nullopt,
+                                          {}, ticket);
                 return;
             }
             if (!answer) intake.logError("Error fetching most recent sample", answer.error());
@@ -120,7 +122,9 @@ void QVSamplesExistDataProvider::updateSecondaryValue(const Error& error) {
                 return;
             }
             Value latest;
-            if (!answer->empty()) latest = answer->front()->endDate().secondsSinceReferenceDate();
+            if (!answer->empty())
+                latest =
+                    VSLastMomentOfSample(*answer->front(), VSCalendar::current()).secondsSinceReferenceDate();
             intake.updateSecondaryValue(latest, std::nullopt, ticket);
         }));
 }

@@ -8,14 +8,16 @@
 
 /// For records that say that something was so and not how much: the chart shows stretches of days that have
 /// samples (pairs of points with y 0) and accents on notable ones (points with y 1); the current value is the
-/// latest sample's category value; the secondary value is the end of the latest notable sample, in seconds
-/// since the reference date, for all time scopes.
+/// latest sample's category value; the secondary value is the end of the latest notable sample (in its
+/// last day: VSLastMomentOfSample), in seconds since the reference date, for all time scopes.
 class QVSamplesExistDataProvider : public QVDataProvider {
  public:
     using QVDataProvider::QVDataProvider;
 
     void restartQueries() override;
     void stopQueries() override;
+    bool showsCurrentValue() const override { return shouldDisplayPrimaryValue(); }
+    bool showsSecondaryValues() const override { return shouldDisplaySecondaryValue(); }
     /// Empty when there is nothing to show.
     platform::StyledText secondaryValueText() const override;
     const char* className() const override { return "QVSamplesExistDataProvider"; }

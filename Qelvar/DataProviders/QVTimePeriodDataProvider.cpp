@@ -1,38 +1,33 @@
 #include "Qelvar/DataProviders/QVTimePeriodDataProvider.h"
 
 #include <algorithm>
+#include <set>
 
 #include "Qelvar/DataProviders/QVHealthStoreExtensions.h"
 #include "Vessa/Base/VSEnvironment.h"
-#include "VessaUI/VSTimePeriods.h"
 
 namespace {
 
 using Points = QVDataProvider::Points;
 using Samples = std::vector<VSSamplePtr>;
 constexpr VSDateComponents oneDay{.days = 1};
+constexpr int samplesLookedAt = 16;
 
-void addSpanPoints(Points& points, const std::vector<VSTimeSpan>& spans, double y) {
-    for (const VSTimeSpan& span : spans) {
+using Spans = std::vector<VSTimeSpan>;
+
+Spans spansOf(const Samples& samples, const VSTimePeriodRules& rules) {
+    return VSCoalesceTimePeriodsFromSamples(samples, rules, VSCalendar::current());
+}
+
+Points joinedDayPoints(const Samples& samples, const VSTimePeriodRules& rules, VSDate start, VSDate end,
+                       double y) {
+    Points points;
+    for (const VSTimeSpan& span : spansOf(samples, rules)) {
+        // Nights are asked for with all that may stand here, which not all of them do.
+        if (span.start >= end || span.end < start) continue;
         points.push_back(QVChartPointNumeric::chartPoint(span.start, y));
         points.push_back(QVChartPointNumeric::chartPoint(span.end, y));
     }
-}
-
-Points joinedDayPoints(const Samples& samples) {
-    Points points;
-    addSpanPoints(points, VSCoalesceTimePeriodsFromSamples(samples), 0);
-    return points;
-}
-
-Points dayPointsByValue(const Samples& samples) {
-    std::map<int, Samples> byValue;
-    for (const VSSamplePtr& sample : samples)
-        if (const auto* category = dynamic_cast<const VSCategorySample*>(sample.get()))
-            byValue[category->value()].push_back(sample);
-    Points points;
-    for (const auto& [value, samplesOfValue] : byValue)
-        addSpanPoints(points, VSCoalesceTimePeriodsFromSamples(samplesOfValue), value);
     return points;
 }
 
@@ -50,7 +45,7 @@ struct Captured {
     VSDate start, end;
     QVTimeScope timeScope;
     VSDateComponents interval;
-    bool noonDays, useEndDate;
+    bool useEndDate;
     QVDataProvider::Ticket ticket;
 };
 
@@ -58,33 +53,45 @@ VSDate xOf(const VSTimeSpan& bucket, bool useEndDate) {
     return useEndDate ? bucket.end : VSMidDate(bucket.start, bucket.end);
 }
 
-std::vector<VSDurationInBucket> totalsOf(const Samples& samples, const Captured& captured,
-                                         const VSDateComponents& interval) {
-    return VSCalculateTotalDurations(VSCoalesceTimePeriodsFromSamples(samples, captured.start, captured.end),
-                                     captured.start, captured.end, interval, captured.noonDays,
-                                     VSCalendar::current());
+std::vector<VSDurationInBucket> totalsOf(const Spans& spans, const VSTimePeriodRules& rules, VSDate start,
+                                         VSDate end, const VSDateComponents& interval) {
+    return VSCalculateTotalDurations(spans, start, end, interval, rules.nights, VSCalendar::current());
 }
 
-void reportBuckets(const Samples& samples, const Captured& captured) {
-    const auto totals = totalsOf(samples, captured, captured.interval);
+void reportBuckets(const Spans& spans, const VSTimePeriodRules& rules, const Captured& captured) {
+    const auto totals = totalsOf(spans, rules, captured.start, captured.end, captured.interval);
     Points points;
     for (const VSDurationInBucket& total : totals)
         points.push_back(
             QVChartPointNumeric::chartPoint(xOf(total.bucket, captured.useEndDate), total.hours));
     captured.intake.updateHistoricalData(std::move(points), captured.timeScope, std::nullopt, {},
                                          captured.ticket);
-    const auto average =
-        averageOf(captured.timeScope == QVTimeScope::Year ? totalsOf(samples, captured, oneDay) : totals);
-    if (average)
-        captured.intake.updateAverage(average, {}, {}, captured.timeScope, std::nullopt, {}, captured.ticket);
+    const auto average = averageOf(captured.timeScope == QVTimeScope::Year
+                                       ? totalsOf(spans, rules, captured.start, captured.end, oneDay)
+                                       : totals);
+    captured.intake.updateAverage(average, {}, {}, captured.timeScope, std::nullopt, {}, captured.ticket);
 }
 
-std::map<VSDate, double> totalsByDay(const Samples& samples, const Captured& captured) {
+std::map<VSDate, double> totalsByDay(const Spans& spans, const VSTimePeriodRules& rules,
+                                     const Captured& captured) {
     const VSCalendar calendar = VSCalendar::current();
     std::map<VSDate, double> result;
-    for (const VSDurationInBucket& total : totalsOf(samples, captured, oneDay))
+    for (const VSDurationInBucket& total : totalsOf(spans, rules, captured.start, captured.end, oneDay))
         result[calendar.startOfDay(xOf(total.bucket, captured.useEndDate))] += total.hours;
     return result;
+}
+
+/// The time of the spans in [start, end), in hours, and when the last of it ended.
+std::pair<double, VSDate> totalOf(const Spans& spans, VSDate start, VSDate end) {
+    VSDuration total{0};
+    VSDate last = start;
+    for (const VSTimeSpan& span : spans) {
+        const VSTimeSpan part{std::max(span.start, start), std::min(span.end, end)};
+        if (part.start >= part.end) continue;
+        total += part.length();
+        last = std::max(last, part.end);
+    }
+    return {VSSecondsFromDuration(total) / 3600, last};
 }
 
 }  // namespace
@@ -113,22 +120,54 @@ void QVTimePeriodDataProvider::takeDateTotals(std::map<VSDate, double> totals) {
 }
 
 QVTimePeriodDataProvider::DayPoints QVTimePeriodDataProvider::dayPoints() const {
-    return joinedDayPoints;
+    return [](const Samples& samples, const VSTimePeriodRules& rules, const Range& range) {
+        return joinedDayPoints(samples, rules, range.start, range.end, 0);
+    };
 }
 
 QVTimePeriodDataProvider::DayPoints QVStackedCategoryValueDataProvider::dayPoints() const {
-    return dayPointsByValue;
+    return [](const Samples& samples, const VSTimePeriodRules& rules, const Range& range) {
+        std::set<int> values;
+        for (const VSSamplePtr& sample : samples)
+            if (const auto* category = dynamic_cast<const VSCategorySample*>(sample.get()))
+                values.insert(category->value());
+        Points points;
+        for (const int value : values) {
+            VSTimePeriodRules ofValue = rules;
+            ofValue.counted = VSPredicate::withCategoryValue(value);
+            const Points row = joinedDayPoints(samples, ofValue, range.start, range.end, value);
+            points.insert(points.end(), row.begin(), row.end());
+        }
+        return points;
+    };
 }
 
 bool QVTimePeriodDataProvider::shouldUseEndDateForTimeScope(QVTimeScope timeScope) const {
     return chartingRules().shouldStartDayAtNoon() && timeScope != QVTimeScope::Year;
 }
 
-VSPredicate QVTimePeriodDataProvider::predicateForSamples(VSDate start, VSDate end,
-                                                          QVTimeScope timeScope) const {
-    const VSPredicate dates = VSQuery::predicateForSamples(start, end, VSQueryOptionNone);
-    const auto charted = dataUnit()->chartingPredicateForTimeScope(QVTimeScopeIndex(timeScope));
-    return charted ? dates & *charted : dates;
+VSPredicate QVTimePeriodDataProvider::predicateForSamples(const Range& range) const {
+    const VSDuration around =
+        chartingRules().shouldStartDayAtNoon() ? VSGreatestShiftOfNights : VSDuration{0};
+    return VSQuery::predicateForSamples(range.start - around, range.end + around, VSQueryOptionNone);
+}
+
+void QVTimePeriodDataProvider::fetchSamples(const Range& range, const SamplesHandler& handler) {
+    VSTimePeriodRules rules{dataUnit()->chartingPredicateForTimeScope(QVTimeScopeIndex(range.timeScope)),
+                            {},
+                            VSEnvironment::current()->now(),
+                            chartingRules().shouldStartDayAtNoon()};
+    const auto ask = [predicate = predicateForSamples(range), rules, handler](
+                         QVTimePeriodDataProvider& self, const VSResult<std::vector<VSSource>>& order) {
+        if (!order) return handler(order.error(), rules);
+        VSTimePeriodRules ordered = rules;
+        ordered.sources = *order;
+        self.execute(std::make_shared<VSSampleQuery>(
+            self.dataUnit()->sampleType(), predicate, VSObjectQueryNoLimit,
+            std::vector<VSSortDescriptor>{{VSSampleSortIdentifierStartDate, true}},
+            [ordered, handler](const VSResult<Samples>& answer) { handler(answer, ordered); }));
+    };
+    healthStore()->orderedSources(dataUnit()->sampleType(), onMainQueue(this, ask));
 }
 
 // The chart
@@ -146,15 +185,14 @@ void QVTimePeriodDataProvider::restartHistoricalDataQuery() {
     beginQuery(Answer::Historical, timeScope());
     beginQuery(Answer::Secondary, timeScope());
     auto handler = onMainQueue(this, [range](QVTimePeriodDataProvider& self, const Error& error) {
-        self.fetchSamples(range, error);
+        self.updateHistoricalData(range, error);
     });
     historicalDataQuery_.start(
         healthStore(),
-        std::make_shared<VSObserverQuery>(
-            dataUnit()->sampleType(), predicateForSamples(range.start, range.end, range.timeScope), handler));
+        std::make_shared<VSObserverQuery>(dataUnit()->sampleType(), predicateForSamples(range), handler));
 }
 
-void QVTimePeriodDataProvider::fetchSamples(const Range& range, const Error& error) {
+void QVTimePeriodDataProvider::updateHistoricalData(const Range& range, const Error& error) {
     const Ticket ticket = nextTicket();
     if (error) {
         intake().logError("Error executing historical data query", *error);
@@ -166,7 +204,6 @@ void QVTimePeriodDataProvider::fetchSamples(const Range& range, const Error& err
                             range.end,
                             range.timeScope,
                             *intervalComponentsForTimeScope(range.timeScope),
-                            chartingRules().shouldStartDayAtNoon(),
                             shouldUseEndDateForTimeScope(range.timeScope),
                             ticket};
     const auto averageDays =
@@ -177,45 +214,38 @@ void QVTimePeriodDataProvider::fetchSamples(const Range& range, const Error& err
         onMainQueue(this, [](QVTimePeriodDataProvider& self, const std::map<VSDate, double>& totals) {
             self.takeDateTotals(totals);
         });
-    execute(std::make_shared<VSSampleQuery>(
-        dataUnit()->sampleType(), predicateForSamples(range.start, range.end, range.timeScope),
-        VSObjectQueryNoLimit, std::vector<VSSortDescriptor>{{VSSampleSortIdentifierStartDate, true}},
-        [captured, averageDays, takeTotals, dayPoints = dayPoints(),
-         all = processAllSamples_](const VSResult<Samples>& answer) {
-            if (!answer || answer->empty()) {
-                const Error failure = answer ? std::nullopt : Error(answer.error());
-                captured.intake.updateHistoricalData({}, captured.timeScope, failure, {}, captured.ticket);
-                captured.intake.updateAverage({}, {}, {}, captured.timeScope, failure, {}, captured.ticket);
-                return;
-            }
-            if (captured.timeScope != QVTimeScope::Day) return reportBuckets(*answer, captured);
+    fetchSamples(
+        range, [captured, range, averageDays, takeTotals, dayPoints = dayPoints(), all = processAllSamples_](
+                   const VSResult<Samples>& answer, const VSTimePeriodRules& rules) {
+            const Intake& intake = captured.intake;
+            if (answer && range.timeScope != QVTimeScope::Day)
+                return reportBuckets(spansOf(*answer, rules), rules, captured);
             // Before the points, so that who is told of points finds the totals that belong to them.
-            if (all) takeTotals(totalsByDay(*answer, captured));
-            captured.intake.updateHistoricalData(dayPoints(*answer), captured.timeScope, std::nullopt, {},
-                                                 captured.ticket);
+            if (answer && all) takeTotals(totalsByDay(spansOf(*answer, rules), rules, captured));
+            Points points;
+            if (answer) points = dayPoints(*answer, rules, range);
+            const bool empty = points.empty();
+            const Error failure = answer ? std::nullopt : Error(answer.error());
+            intake.updateHistoricalData(std::move(points), range.timeScope, failure, {}, captured.ticket);
+            if (empty) return intake.updateAverage({}, {}, {}, range.timeScope, failure, {}, captured.ticket);
             averageDays();
-        }));
+        });
 }
 
 void QVTimePeriodDataProvider::updateDailyAverage(QVTimeScope timeScope, Ticket ticket) {
     const auto week = QVTimeScopeSpan(QVTimeScope::Week, VSEnvironment::current()->now(), false);
-    VSDate start = week->start, end = week->end;
-    const bool noonDays = chartingRules().shouldStartDayAtNoon();
-    if (noonDays) {
-        start = VSCalendar::current().yesterdayAtNoon(start);
-        end = VSCalendar::current().yesterdayAtNoon(end);
+    Range range{week->start, week->end, QVTimeScope::Week};
+    if (chartingRules().shouldStartDayAtNoon()) {
+        range.start = VSCalendar::current().yesterdayAtNoon(range.start);
+        range.end = VSCalendar::current().yesterdayAtNoon(range.end);
     }
-    const Captured captured{intake(), start, end, timeScope, oneDay, noonDays, false, ticket};
-    execute(std::make_shared<VSSampleQuery>(
-        dataUnit()->sampleType(), predicateForSamples(start, end, QVTimeScope::Week), VSObjectQueryNoLimit,
-        std::vector<VSSortDescriptor>{{VSSampleSortIdentifierStartDate, true}},
-        [captured](const VSResult<Samples>& answer) {
-            if (!answer)
-                return captured.intake.logError("Error fetching samples for average calculation",
-                                                answer.error());
-            captured.intake.updateAverage(averageOf(totalsOf(*answer, captured, oneDay)), {}, {},
-                                          captured.timeScope, std::nullopt, {}, captured.ticket);
-        }));
+    fetchSamples(range, [intake = intake(), range, timeScope, ticket](const VSResult<Samples>& answer,
+                                                                      const VSTimePeriodRules& rules) {
+        if (!answer) return intake.logError("Error fetching samples for average calculation", answer.error());
+        intake.updateAverage(
+            averageOf(totalsOf(spansOf(*answer, rules), rules, range.start, range.end, oneDay)), {}, {},
+            timeScope, std::nullopt, {}, ticket);
+    });
 }
 
 // The current value: an observer, then the most recent sample, then the time of its day.
@@ -235,40 +265,38 @@ void QVTimePeriodDataProvider::updateCurrentValue(const Error& error) {
         intake().updateCurrentValue({}, {}, error, {}, ticket);
         return;
     }
-    mostRecentSampleOfType(
+    // Several, for the one that ended last may be one that has no length, or that nobody ended.
+    mostRecentSamplesOfType(
         *healthStore(), dataUnit()->sampleType(),
-        dataUnit()->chartingPredicateForTimeScope(QVTimeScopeIndex(timeScope())),
-        onMainQueue(this, [ticket](QVTimePeriodDataProvider& self, const VSResult<VSSamplePtr>& answer) {
-            if (answer && *answer) return self.updateCurrentValue((*answer)->startDate(), ticket);
-            if (!answer) self.intake().logError("Error getting most recent start date", answer.error());
-            self.intake().updateCurrentValue({}, {}, answer ? std::nullopt : Error(answer.error()), {},
-                                             ticket);
+        dataUnit()->chartingPredicateForTimeScope(QVTimeScopeIndex(timeScope())), samplesLookedAt,
+        onMainQueue(this, [ticket](QVTimePeriodDataProvider& self, const VSResult<Samples>& answer) {
+            if (answer) return self.updateCurrentValue(*answer, ticket);
+            self.intake().logError("Error getting most recent start date", answer.error());
+            self.intake().updateCurrentValue({}, {}, answer.error(), {}, ticket);
         }));
 }
 
-void QVTimePeriodDataProvider::updateCurrentValue(VSDate mostRecentStart, Ticket ticket) {
+void QVTimePeriodDataProvider::updateCurrentValue(const Samples& mostRecent, Ticket ticket) {
     const VSCalendar calendar = VSCalendar::current();
-    VSDate start = calendar.startOfDay(mostRecentStart);
-    if (chartingRules().shouldStartDayAtNoon()) {
-        const VSDate noon = calendar.noonOfDay(mostRecentStart);
-        start = mostRecentStart >= noon ? noon : calendar.yesterdayAtNoon(mostRecentStart);
+    const bool nights = chartingRules().shouldStartDayAtNoon();
+    std::optional<VSDate> latest;
+    for (const VSSamplePtr& sample : mostRecent) {
+        if (sample->startDate() == sample->endDate()) continue;
+        latest =
+            std::max(latest, std::optional(nights ? VSStartOfNight(*sample, calendar) : sample->startDate()));
     }
-    const VSDate end = calendar.addDays(start, 1);
-    execute(std::make_shared<VSSampleQuery>(
-        dataUnit()->sampleType(), predicateForSamples(start, end, QVTimeScope::Week), VSObjectQueryNoLimit,
-        std::vector<VSSortDescriptor>{{VSSampleSortIdentifierStartDate, true}},
-        [intake = intake(), start, end, ticket](const VSResult<Samples>& answer) {
-            if (!answer) {
-                intake.logError("Error calculating total duration", answer.error());
-                intake.updateCurrentValue({}, {}, answer.error(), {}, ticket);
-                return;
-            }
-            VSDuration total{0};
-            const auto spans = VSCoalesceTimePeriodsFromSamples(*answer, start, end);
-            for (const VSTimeSpan& span : spans) total += span.length();
-            if (total <= VSDuration::zero())
-                return intake.updateCurrentValue({}, {}, std::nullopt, {}, ticket);
-            intake.updateCurrentValue(VSSecondsFromDuration(total) / 3600, spans.back().end, std::nullopt, {},
-                                      ticket);
-        }));
+    if (!latest) return intake().updateCurrentValue({}, {}, std::nullopt, {}, ticket);
+    const VSDate start = nights ? VSStartOfNoonDay(*latest, calendar) : calendar.startOfDay(*latest);
+    const Range day{start, calendar.addDays(start, 1), QVTimeScope::Week};
+    fetchSamples(day, [intake = intake(), day, ticket](const VSResult<Samples>& answer,
+                                                       const VSTimePeriodRules& rules) {
+        if (!answer) {
+            intake.logError("Error calculating total duration", answer.error());
+            intake.updateCurrentValue({}, {}, answer.error(), {}, ticket);
+            return;
+        }
+        const auto [hours, end] = totalOf(spansOf(*answer, rules), day.start, day.end);
+        if (hours <= 0) return intake.updateCurrentValue({}, {}, std::nullopt, {}, ticket);
+        intake.updateCurrentValue(hours, end, std::nullopt, {}, ticket);
+    });
 }

@@ -4,14 +4,16 @@
 #include <vector>
 
 #include "Qelvar/DataProviders/QVDataProvider.h"
+#include "VessaUI/VSTimePeriods.h"
 
-/// For samples that are spans of time (sleep, workouts): overlapping ones are joined; the day scope shows
-/// each span as a pair of points, the longer scopes the hours in each bucket. The secondary value is the mean
-/// of the daily totals of days that have any (of the last 7 days in the day scope, of the visible ones in the
-/// year scope; of the visible buckets else), the current value the hours of the most recent day that has
-/// data; both in hours.
+/// For samples that are spans of time (sleep, workouts), each moment counted once and by the order of sources
+/// (VSCoalesceTimePeriodsFromSamples says how): the day scope shows each span as a pair of points, the longer
+/// scopes the hours in each bucket that has any. The secondary value is the mean of the daily totals of days
+/// that have any (of the last 7 days in the day scope, of the visible ones in the year scope; of the visible
+/// buckets else), the current value the hours of the most recent day that has data; both in hours.
 ///
-/// Where the charting rules start days at noon, a day reaches from the noon before to its own noon.
+/// Where the charting rules start days at noon, a day reaches from the noon before to its own noon, and
+/// nights stand at the hours at which they were lived.
 class QVTimePeriodDataProvider : public QVDataProvider {
  public:
     using QVDataProvider::QVDataProvider;
@@ -29,22 +31,29 @@ class QVTimePeriodDataProvider : public QVDataProvider {
     Value totalForDate(VSDate date) const;
 
  protected:
-    /// The points of a day. Called on the store's threads.
-    using DayPoints = Points (*)(const std::vector<VSSamplePtr>& samples);
-    virtual DayPoints dayPoints() const;
-
- private:
     struct Range {
         VSDate start, end;
         QVTimeScope timeScope;
     };
+    /// The points of a day, which the range spans. Called on the store's threads.
+    using DayPoints = Points (*)(const std::vector<VSSamplePtr>& samples, const VSTimePeriodRules& rules,
+                                 const Range& range);
+    virtual DayPoints dayPoints() const;
+
+ private:
     void restartCurrentValueQuery();
     void updateCurrentValue(const Error& error);
-    void updateCurrentValue(VSDate mostRecentStart, Ticket ticket);
+    void updateCurrentValue(const std::vector<VSSamplePtr>& mostRecent, Ticket ticket);
     void restartHistoricalDataQuery();
-    void fetchSamples(const Range& range, const Error& error);
+    void updateHistoricalData(const Range& range, const Error& error);
     void updateDailyAverage(QVTimeScope timeScope, Ticket ticket);
-    VSPredicate predicateForSamples(VSDate start, VSDate end, QVTimeScope timeScope) const;
+    /// The predicate that finds the samples of a range, wherever they were recorded.
+    VSPredicate predicateForSamples(const Range& range) const;
+    /// Asks for the samples of the range, ascending, and how they become spans. The handler is called on the
+    /// main thread with an error or on the store's.
+    using SamplesHandler =
+        std::function<void(const VSResult<std::vector<VSSamplePtr>>&, const VSTimePeriodRules&)>;
+    void fetchSamples(const Range& range, const SamplesHandler& handler);
     bool shouldUseEndDateForTimeScope(QVTimeScope timeScope) const;
     void takeDateTotals(std::map<VSDate, double> totals);
 

@@ -36,6 +36,7 @@ std::shared_ptr<const icu::number::LocalizedNumberFormatter> icuFormatter(const 
 }
 
 constexpr double epsilon = std::numeric_limits<double>::epsilon();
+constexpr double nearAMinute = 1e-6;  // in minutes; records are kept to the microsecond
 
 QString wholeNumber(double number) {
     return QVNumberFormatterWithFractionDigits(0)->stringFromNumber(number);
@@ -67,8 +68,10 @@ std::shared_ptr<const QVDecimalNumberFormatter> QVNumberFormatterWithFractionDig
 
 std::optional<QString> QVTimePeriodNumberFormatter::stringFromNumber(double number, const VSDataUnit*,
                                                                      const VSUnitController&) const {
-    double hours = std::trunc(number);
-    double minutes = std::trunc((number - hours) * 60);
+    // An hour and a minute is a little less than that as a double: what lies so near to a minute is it.
+    const double wholeMinutes = std::trunc(number * 60 + std::copysign(nearAMinute, number));
+    double hours = std::trunc(wholeMinutes / 60);
+    double minutes = wholeMinutes - hours * 60;
     if (shouldRoundToHours_) {
         if (minutes > 29) hours += 1;
         minutes = 0;

@@ -6,6 +6,7 @@
 #include <limits>
 
 #include "FormattersFixture.h"
+#include "Qelvar/Formatters/QVNumberFormatters.h"
 
 namespace {
 
@@ -30,11 +31,18 @@ class QVDataUnitValueFormatterTest : public test::FormattersTest {
 TEST_F(QVDataUnitValueFormatterTest, ClassesByDataType) {
     for (const auto* type : VSObjectType::allTypes()) {
         const int code = VSTypeCodeValue(type->code());
-        const auto expected = code == 2                                ? QVValueFormatterClass::Height
-                              : code == 63 || code == 70 || code == 79 ? QVValueFormatterClass::TimePeriod
-                              : code == 91 || code == 92 || code == 95 ? QVValueFormatterClass::Enumerated
-                                                                       : QVValueFormatterClass::Quantity;
-        EXPECT_EQ(qv_valueFormatterClass(type), expected) << code;
+        const bool period = code == 63 || code == 70 || code == 79;
+        EXPECT_EQ(qv_valueFormatterClass(type), code == 2 ? QVValueFormatterClass::Height
+                                                : period  ? QVValueFormatterClass::TimePeriod
+                                                : code == 91 || code == 92 || code == 95
+                                                    ? QVValueFormatterClass::Enumerated
+                                                    : QVValueFormatterClass::Quantity)
+            << code;
+        const auto number = qv_numberFormatterForUnit(type, VSUnit::hourUnit());
+        EXPECT_EQ(number != nullptr, code == 2 || period) << code;
+        const auto* hours = dynamic_cast<const QVTimePeriodNumberFormatter*>(number.get());
+        EXPECT_EQ(hours != nullptr, period) << code;
+        EXPECT_EQ(hours && hours->shouldRoundToHours(), code == 70) << code;
     }
 }
 
@@ -49,6 +57,11 @@ TEST_F(QVDataUnitValueFormatterTest, QuantityIsValueSpaceUnitInTheirFonts) {
     EXPECT_EQ(text.runs()[2].text, unit);
     EXPECT_EQ(text.runs()[2].font, unitFont_);
     EXPECT_EQ(plain(heartRate, 72), "72" + unit.toStdString());
+    const QVQuantityDataPrefixedUnitValueFormatter prefixed(nullptr);
+    EXPECT_EQ(prefixed.stringFromValue(72, heartRate, *units_), unit + ": 72");
+    const auto range = units_->displayRangeForDataUnit(heartRate->anyDataUnit());
+    ASSERT_TRUE(range && range->maximum);
+    EXPECT_EQ(styled(heartRate, *range->maximum + 1).runs()[0].text.left(1), ">");
 }
 
 TEST_F(QVDataUnitValueFormatterTest, UnitIconStandsAfterTheUnit) {
@@ -97,20 +110,6 @@ TEST_F(QVDataUnitValueFormatterTest, EnumeratedValuesAreLabelsOrNoData) {
         EXPECT_EQ(plain(mucus, unknown), "No Data");
     ASSERT_EQ(styled(mucus, 5).runs().size(), 1u);
     EXPECT_EQ(styled(mucus, 5).runs()[0].font, valueFont_);
-}
-
-TEST_F(QVDataUnitValueFormatterTest, PrefixedUnitComesFirst) {
-    const auto* heartRate = group(VSGroupID::HeartRate);
-    const QVQuantityDataPrefixedUnitValueFormatter formatter(nullptr);
-    const QString unit = units_->displayNameForDataUnit(heartRate->anyDataUnit(), 72);
-    EXPECT_EQ(formatter.stringFromValue(72, heartRate, *units_), unit + ": 72");
-}
-
-TEST_F(QVDataUnitValueFormatterTest, ValuesBeyondTheDisplayRangeSaySo) {
-    const auto* heartRate = group(VSGroupID::HeartRate);
-    const auto range = units_->displayRangeForDataUnit(heartRate->anyDataUnit());
-    ASSERT_TRUE(range && range->maximum);
-    EXPECT_EQ(styled(heartRate, *range->maximum + 1).runs()[0].text.left(1), ">");
 }
 
 TEST(QVValueAndUnitParts, SpaceOnlyBeforeAUnit) {

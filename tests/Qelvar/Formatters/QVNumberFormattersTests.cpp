@@ -31,16 +31,13 @@ TEST(QVDecimalNumberFormatter, RoundsHalfToEvenAndShowsNoNeedlessDigits) {
     const auto text = [](double number, int digits) {
         return QVNumberFormatterWithFractionDigits(digits)->stringFromNumber(number).toStdString();
     };
-    EXPECT_EQ(text(72, 2), "72");
-    EXPECT_EQ(text(72.5, 2), "72.5");
-    EXPECT_EQ(text(72.4999, 0), "72");
-    EXPECT_EQ(text(0.5, 0), "0");
-    EXPECT_EQ(text(1.5, 0), "2");
-    EXPECT_EQ(text(2.5, 0), "2");
-    EXPECT_EQ(text(0.125, 2), "0.12");
-    EXPECT_EQ(text(98.60000000000001, 4), "98.6");
-    EXPECT_EQ(text(-0.001, 2), "0");
-    EXPECT_EQ(text(1e15, 0), "1,000,000,000,000,000");
+    const std::tuple<double, int, const char*> cases[] = {
+        {72, 2, "72"},      {72.5, 2, "72.5"},
+        {72.4999, 0, "72"}, {0.5, 0, "0"},
+        {1.5, 0, "2"},      {2.5, 0, "2"},
+        {0.125, 2, "0.12"}, {98.60000000000001, 4, "98.6"},
+        {-0.001, 2, "0"},   {1e15, 0, "1,000,000,000,000,000"}};
+    for (const auto& [number, digits, expected] : cases) EXPECT_EQ(text(number, digits), expected);
     EXPECT_EQ(text(std::numeric_limits<double>::quiet_NaN(), 0), "NaN");
 }
 
@@ -55,15 +52,16 @@ class QVNumberFormattersTest : public test::FormattersTest {
 };
 
 TEST_F(QVNumberFormattersTest, TimePeriodsAreCutToMinutes) {
-    EXPECT_EQ(timePeriod(0), "0 hr");
-    EXPECT_EQ(timePeriod(0.25), "15 min");
-    EXPECT_EQ(timePeriod(7.5), "7 hr 30 min");
-    EXPECT_EQ(timePeriod(1.999), "1 hr 59 min");
-    EXPECT_EQ(timePeriod(2), "2 hr");
-    EXPECT_EQ(timePeriod(1234), "1,234 hr");
-    EXPECT_EQ(timePeriod(7.49, true), "7 hr");
-    EXPECT_EQ(timePeriod(7.5, true), "8 hr");
-    EXPECT_EQ(timePeriod(0.2, true), "0 hr");
+    const std::pair<double, const char*> cut[] = {{0, "0 hr"},          {0.25, "15 min"},
+                                                  {7.5, "7 hr 30 min"}, {1.999, "1 hr 59 min"},
+                                                  {2, "2 hr"},          {1234, "1,234 hr"}},
+                                         rounded[] = {{7.49, "7 hr"}, {7.5, "8 hr"}, {0.2, "0 hr"}};
+    for (const auto& [hours, expected] : cut) EXPECT_EQ(timePeriod(hours), expected);
+    for (const auto& [hours, expected] : rounded) EXPECT_EQ(timePeriod(hours, true), expected);
+    for (int minutes = 61; minutes < 600; ++minutes) {
+        const std::string rest = minutes % 60 ? " " + std::to_string(minutes % 60) + " min" : "";
+        EXPECT_EQ(timePeriod(minutes / 60.0), std::to_string(minutes / 60) + " hr" + rest);
+    }
 }
 
 TEST_F(QVNumberFormattersTest, FeetAndInchesCarryIntoTheFeet) {
@@ -76,28 +74,6 @@ TEST_F(QVNumberFormattersTest, FeetAndInchesCarryIntoTheFeet) {
     EXPECT_EQ(text(0), "0 ft 0 in");
     test::FixedEnvironment arabic("2020-03-31T20:00", "Africa/Cairo", "ar_EG");
     EXPECT_EQ(text(5.5), "٥ قدم ٦ بوصة");
-}
-
-TEST_F(QVNumberFormattersTest, DataTypesHaveTheirFormatters) {
-    const VSUnit unit = VSUnit::hourUnit();
-    const auto formatter = [&](VSTypeCode code) {
-        return qv_numberFormatterForUnit(VSObjectType::dataTypeWithCode(code), unit);
-    };
-    const auto isRounding = [&](VSTypeCode code) {
-        const auto* period = dynamic_cast<const QVTimePeriodNumberFormatter*>(formatter(code).get());
-        return period && period->shouldRoundToHours();
-    };
-    EXPECT_TRUE(dynamic_cast<const QVHeightNumberFormatter*>(formatter(VSCode::Height).get()));
-    EXPECT_TRUE(isRounding(VSCode::ZentroStandHour));
-    EXPECT_FALSE(isRounding(VSCode::SleepAnalysis));
-    EXPECT_TRUE(formatter(VSCode::SleepAnalysis));
-    EXPECT_EQ(formatter(VSCode::SleepAnalysis), formatter(VSCode::Workout));
-    for (const auto* type : VSObjectType::allTypes()) {
-        const int code = VSTypeCodeValue(type->code());
-        EXPECT_EQ(qv_numberFormatterForUnit(type, unit) != nullptr,
-                  code == 2 || code == 63 || code == 70 || code == 79)
-            << code;
-    }
 }
 
 TEST_F(QVNumberFormattersTest, OthersGetTheFractionDigitsOfTheirUnit) {
