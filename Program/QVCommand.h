@@ -57,5 +57,5 @@ VSResult<VSDate> QVDateForArgument(std::string_view option, std::string_view tex
 /// The date of an option; none when it is not given.
 VSResult<std::optional<VSDate>> QVDateOption(const QVCommandArguments& arguments, std::string_view option);
 
-extern const QVCommand QVImportCommand, QVStatisticsCommand, QVSamplesCommand, QVTypesCommand,
+extern const QVCommand QVImportCommand, QVExportCommand, QVStatisticsCommand, QVSamplesCommand, QVTypesCommand,
     QVSourcesCommand, QVCheckCommand, QVBatchesCommand, QVUndoCommand, QVSalvageCommand;

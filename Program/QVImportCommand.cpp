@@ -1,35 +1,17 @@
-#include <signal.h>
 #include <unistd.h>
 
-#include <atomic>
 #include <charconv>
 #include <cstdio>
 #include <cstdlib>
 #include <optional>
 
 #include "Program/QVCommand.h"
+#include "Program/QVInterruption.h"
 #include "Program/QVTabOutput.h"
 #include "Qelvar/Import/QVRecordsImporter.h"
 #include "Vessa/VSStoreSchema.h"
 
 namespace {
-
-std::atomic<bool> cancelled = false;
-std::atomic<int> cancellingSignal = 0;
-static_assert(std::atomic<bool>::is_always_lock_free && std::atomic<int>::is_always_lock_free);
-
-/// The first signal asks for a clean end; the second one ends the process at once, which leaves no trace
-/// either.
-void handleSignals() {
-    struct sigaction action {};
-    action.sa_handler = [](int signal) {
-        cancellingSignal = signal;
-        cancelled = true;
-    };
-    action.sa_flags = static_cast<int>(SA_RESETHAND);
-    sigaction(SIGINT, &action, nullptr);
-    sigaction(SIGTERM, &action, nullptr);
-}
 
 /// A line that is written over again and again on a terminal; a row each time when it was asked for. That an
 /// import waits for another program is told in any case.
@@ -164,7 +146,8 @@ QVExitStatus run(const QVCommandContext& context) {
     const std::vector<std::filesystem::path> files(words.begin(), words.end());
     const auto listed = refusalsToList(context.arguments);
     if (!listed) return QVFailUsage("import", listed.error().message);
-    handleSignals();
+    // A second signal ends the process at once, which leaves no trace either.
+    QVCatchInterruptions(QVSecondInterruption::EndsProcess);
     for (const auto& file : files) {
         std::error_code error;
         if (!std::filesystem::exists(file, error))
@@ -177,7 +160,7 @@ QVExitStatus run(const QVCommandContext& context) {
         options.dryRun ? openForTrial(context.storeFolder, trial) : VSHealthStore::open(context.storeFolder);
     if (!store) return QVFail(store.error());
 
-    options.cancel = &cancelled;
+    options.cancel = &QVInterrupted();
     options.listedRefusals = *listed;
     const auto report = [&] {
         const ProgressLine line(context.arguments.has("progress"));
@@ -187,7 +170,7 @@ QVExitStatus run(const QVCommandContext& context) {
     if (!report) {
         QVPrintError(report.error().message);
         if (report.error().code == VSErrorCode::Cancelled)
-            return static_cast<QVExitStatus>(128 + cancellingSignal);
+            return static_cast<QVExitStatus>(QVInterruptedExitStatus());
         return QVExitStatusForError(report.error());
     }
     if (const VSStatus status = printReport(*report); !status) return QVFail(status.error());

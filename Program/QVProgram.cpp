@@ -5,22 +5,23 @@
 #include <cstdio>
 #include <vector>
 
+#include "Platform/TextScale.h"
 #include "Qelvar/App/QVApplication.h"
 #include "Vessa/Base/VSEnvironment.h"
 
 namespace {
 
-constexpr const QVCommand* kCommands[] = {&QVImportCommand, &QVStatisticsCommand, &QVSamplesCommand,
+constexpr const QVCommand* kCommands[] = {&QVImportCommand, &QVExportCommand, &QVStatisticsCommand, &QVSamplesCommand,
                                           &QVTypesCommand,  &QVSourcesCommand,    &QVBatchesCommand,
                                           &QVUndoCommand,   &QVCheckCommand,      &QVSalvageCommand};
 
 constexpr QVCommandOption kCommonOptions[] = {{"store", true}, {"now", true}, {"help", false}};
-constexpr QVCommandOption kProgramOptions[] = {{"store", true},    {"now", true},   {"help", false},
-                                               {"version", false}, {"demo", false}, {"screenshots", true},
-                                               {"size", true},     {"scale", true}, {"open", true}};
+constexpr QVCommandOption kProgramOptions[] = {
+    {"store", true},       {"now", true},  {"help", false}, {"version", false}, {"demo", false},
+    {"screenshots", true}, {"size", true}, {"scale", true}, {"open", true},     {"text-scale", true}};
 
 constexpr const char* kHelp =
-    R"(Usage: qelvar [--demo] [--screenshots DIR] [--size WxH] [--scale S] [--open LINK] [--store DIR] [--now DATE]
+    R"(Usage: qelvar [--demo] [--screenshots DIR] [--size WxH] [--scale S] [--text-scale T] [--open LINK] [--store DIR] [--now DATE]
        qelvar COMMAND [OPTION]... [WORD]...
 
 Without a command the application is started.
@@ -29,7 +30,8 @@ Without a command the application is started.
   --screenshots DIR   draw every tab and time scope into PNG files in DIR and end; needs no display
   --size WxH          the window's size in points (375x667)
   --scale S           pixels per point of the screenshots
-  --open LINK         open a link of the application, such as qelvar://DashboardTab
+  --text-scale T      how large texts are, from 1 to 3 (QELVAR_TEXT_SCALE, or as the desktop says)
+  --open LINK         open a link of the application, such as qelvar://HealthDataTab?DataCategory=2&DataUnit=59
 
 For the application and every command:
 
@@ -94,7 +96,7 @@ QVExitStatus runCommand(const QVCommand& command, const QVCommandArguments& prog
     const auto arguments = QVCommandArguments::parse(std::span(program.words()).subspan(1), options);
     if (!arguments) return QVFailUsage(command.name, arguments.error().message);
     if (arguments->has("help") || program.has("help")) return printHelp(command), QVExitStatus::Success;
-    for (const char* option : {"screenshots", "size", "scale", "open"}) {
+    for (const char* option : {"screenshots", "size", "scale", "text-scale", "open"}) {
         if (program.has(option))
             return QVFailUsage({}, std::string("--") + option + " is for the application, not for a command");
     }
@@ -132,6 +134,11 @@ QVExitStatus runApplication(char* program, const QVCommandArguments& arguments) 
             !(options.scale > 0 && options.scale <= 8))
             return QVFailUsage({}, "--scale: " + *text + " is not a scale between 0 and 8");
     }
+    if (const auto text = arguments.value("text-scale")) {
+        const auto factor = platform::TextScale::fromText(QByteArray::fromStdString(*text));
+        if (!factor) return QVFailUsage({}, "--text-scale: " + *text + " is not a number from 1 to 3");
+        options.textScale = *factor;
+    }
     if (const auto link = arguments.value("open")) options.openLink = QString::fromStdString(*link);
     if (const VSStatus status = installClock(arguments.value("now")); !status)
         return QVFailUsage({}, status.error().message);
@@ -156,6 +163,5 @@ QVExitStatus QVRunProgram(int argc, char** argv, std::span<const std::string> gi
     for (const QVCommand* command : kCommands) {
         if (command->name == word) return runCommand(*command, *arguments);
     }
-    if (word == "export") return QVFailUsage({}, "there is no command export yet");
     return QVFailUsage({}, "there is no command " + word);
 }

@@ -11,6 +11,8 @@ class VSHealthStoreConnection final : public VSHealthStore {
  public:
     explicit VSHealthStoreConnection(std::shared_ptr<VSStoreCore> core) : core_(std::move(core)) {}
     ~VSHealthStoreConnection() override { core_->close(); }
+    /// For what reads the store beside its threads.
+    const VSStoreCore& core() const { return *core_; }
     void executeQuery(std::shared_ptr<VSQuery> query) override { core_->queries.execute(std::move(query)); }
     void stopQuery(const std::shared_ptr<VSQuery>& query) override { core_->queries.stop(query.get()); }
     void saveObjects(std::vector<VSSamplePtr> objects, Completion completion) override;

@@ -1,8 +1,11 @@
 #include "Vessa/VSStoreMatcher.h"
 
 #include <algorithm>
+#include <array>
 #include <bit>
+#include <charconv>
 #include <cmath>
+#include <cstdio>
 
 #include "Vessa/VSRollup.h"
 
@@ -27,9 +30,24 @@ int codeOf(const VSSample& sample) {
     return VSTypeCodeValue(sample.sampleType()->code());
 }
 
+/// Numbers as an export writes them have so many digits.
+constexpr int writtenDigits = 6;
+
+/// Whether the number is what writing the stored one leaves of it.
+bool isWrittenForm(double number, double stored) {
+    if (number == 0 || stored == 0 || !(std::abs(number - stored) <= 1e-5 * std::abs(stored))) return false;
+    std::array<char, 40> text{};
+    std::snprintf(text.data(), text.size(), "%.*e", writtenDigits - 1, number);
+    double kept = 0;
+    std::from_chars(text.data(), text.data() + text.size(), kept);
+    if (kept != number) return false;
+    const double lastDigit = std::pow(10, std::floor(std::log10(std::abs(stored))) - (writtenDigits - 1));
+    return std::abs(number - stored) <= 0.5 * lastDigit * (1 + 1e-6);
+}
+
 /// Values that are the same but for rounding lie in the same bucket or in neighbouring ones.
 int64_t valueBucket(double value) {
-    constexpr int roundedBits = 14;  // 38 of 52 are left: steps of at least 1.8e-12
+    constexpr int roundedBits = 36;  // 16 of 52 are left: steps of 7.6e-6 to 1.5e-5; digits lost: up to 5e-6
     return value == 0 ? 0 : std::bit_cast<int64_t>(value) >> roundedBits;
 }
 
@@ -74,6 +92,16 @@ bool VSSameStoredValue(double a, double b) {
     return a == b || std::abs(a - b) <= 1e-12 * std::max(std::abs(a), std::abs(b));
 }
 
+VSStoreMatcher::Likeness VSStoreMatcher::likenessOfValues(const VSSample& sample, double stored) {
+    if (VSSameStoredValue(stored, VSStoredValue(sample))) return Likeness::Same;
+    const auto* quantitySample = dynamic_cast<const VSQuantitySample*>(&sample);
+    if (!quantitySample) return Likeness::None;
+    const VSQuantity& quantity = quantitySample->quantity();
+    const VSQuantity kept(sample.sampleType()->canonicalUnit(), stored);
+    return isWrittenForm(quantity.value(), inUnit(kept, quantity.unit())) ? Likeness::Rounded
+                                                                          : Likeness::None;
+}
+
 template <typename Visit>
 void VSStoreMatcher::forEachRow(const VSSample& sample, Visit visit) {
     auto rows =
@@ -83,36 +111,58 @@ void VSStoreMatcher::forEachRow(const VSSample& sample, Visit visit) {
     }
 }
 
+template <typename Search>
+int64_t VSStoreMatcher::closest(Search search) {
+    bool sawRounded = false;
+    const int64_t found = search([&](Likeness likeness) {
+        if (likeness == Likeness::Rounded) sawRounded = true;
+        return likeness == Likeness::Same;
+    });
+    if (found || !sawRounded) return found;
+    return search([](Likeness likeness) { return likeness == Likeness::Rounded; });
+}
+
 int64_t VSStoreMatcher::find(const VSSample& sample, const Accept& accept) {
     const auto metadata = metadata_.find(sample.provenance().metadata);
     if (!metadata) return 0;
-    int64_t found = 0;
-    forEachRow(sample, [&](const VSSampleRow& row) {
-        if (same(sample, *metadata, row) && accept(row.id)) found = row.id;
-        return !found;
+    return closest([&](const auto& isWanted) {
+        int64_t found = 0;
+        forEachRow(sample, [&](const VSSampleRow& row) {
+            if (isWanted(likeness(sample, *metadata, row)) && accept(row.id)) found = row.id;
+            return !found;
+        });
+        return found;
     });
-    return found;
 }
 
 int64_t VSStoreMatcher::findAmongMany(const VSSample& sample, int purpose, const Accept& accept) {
     const auto metadata = metadata_.find(sample.provenance().metadata);
     if (!metadata) return 0;
-    const auto place = crowds_.find({codeOf(sample), sample.startDate().microseconds(), purpose});
-    VSCrowdedStart* known = place == crowds_.end() ? nullptr : &place->second;
-    if (!known) {
-        int64_t found = 0;
-        int seen = 0;
-        forEachRow(sample, [&](const VSSampleRow& row) {
-            if (++seen > fewRows) return false;
-            if (same(sample, *metadata, row) && accept(row.id)) found = row.id;
-            return !found;
+    const CrowdKey key{codeOf(sample), sample.startDate().microseconds(), purpose};
+    if (!crowds_.contains(key)) {
+        int mostSeen = 0;
+        const int64_t found = closest([&](const auto& isWanted) {
+            int64_t match = 0;
+            int seen = 0;
+            forEachRow(sample, [&](const VSSampleRow& row) {
+                if (++seen > fewRows) return false;
+                if (isWanted(likeness(sample, *metadata, row)) && accept(row.id)) match = row.id;
+                return !match;
+            });
+            mostSeen = std::max(mostSeen, seen);
+            return match;
         });
-        if (found || seen <= fewRows) return found;
-        known = &makeCrowd(sample, purpose);
+        if (found || mostSeen <= fewRows) return found;
+        makeCrowd(sample, purpose);
     }
+    return findInCrowd(sample, *metadata, crowds_.at(key), accept);
+}
+
+int64_t VSStoreMatcher::findInCrowd(const VSSample& sample, int64_t metadata, VSCrowdedStart& crowd,
+                                    const Accept& accept) {
     const VSSourceRevision revision = sample.sourceRevision();
-    Traits traits{(sample.endDate() - sample.startDate()).count(), *metadata,
-                  valueBucket(VSStoredValue(sample)), originHash(revision)};
+    const Traits traits{(sample.endDate() - sample.startDate()).count(), metadata,
+                        valueBucket(VSStoredValue(sample)), originHash(revision)};
     std::optional<int64_t> second;
     if (sample.creationDate()) second = VSFloorDivide(sample.creationDate()->microseconds(), kSecond);
     std::vector<uint64_t> fingerprints;
@@ -122,19 +172,24 @@ int64_t VSStoreMatcher::findAmongMany(const VSSample& sample, int purpose, const
         fingerprints.push_back(near.fingerprint(second));
     }
     using Verdict = VSCrowdedStart::Verdict;
-    return known->find(fingerprints, [&](int64_t id) {
-        if (!accept(id)) return Verdict::NeverAgain;
-        VSSampleRow stored;
-        const bool there = row({sample.sampleType(), sample.startDate().microseconds(), id}, stored);
-        return there && same(sample, *metadata, stored) ? Verdict::Wanted : Verdict::NotThis;
+    return closest([&](const auto& isWanted) {
+        return crowd.find(fingerprints, [&](int64_t id) {
+            if (!accept(id)) return Verdict::NeverAgain;
+            VSSampleRow stored;
+            const bool there = row({sample.sampleType(), sample.startDate().microseconds(), id}, stored);
+            return there && isWanted(likeness(sample, metadata, stored)) ? Verdict::Wanted : Verdict::NotThis;
+        });
     });
 }
 
-bool VSStoreMatcher::same(const VSSample& sample, int64_t metadata, const VSSampleRow& row) {
-    if (!sameRow(sample, metadata, row)) return false;
-    if (const auto* workout = dynamic_cast<const VSWorkout*>(&sample)) return sameWorkout(*workout, row.id);
+VSStoreMatcher::Likeness VSStoreMatcher::likeness(const VSSample& sample, int64_t metadata,
+                                                  const VSSampleRow& row) {
+    const Likeness ofRow = likenessOfRow(sample, metadata, row);
+    if (ofRow == Likeness::None) return ofRow;
+    if (const auto* workout = dynamic_cast<const VSWorkout*>(&sample))
+        return sameWorkout(*workout, row.id) ? ofRow : Likeness::None;
     const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample);
-    return !correlation || sameMembers(*correlation, row.id);
+    return correlation ? std::min(ofRow, likenessOfMembers(*correlation, row.id)) : ofRow;
 }
 
 void VSStoreMatcher::added(const VSSample& sample, int64_t id) {
@@ -148,7 +203,7 @@ void VSStoreMatcher::added(const VSSample& sample, int64_t id) {
     }
 }
 
-VSCrowdedStart& VSStoreMatcher::makeCrowd(const VSSample& sample, int purpose) {
+void VSStoreMatcher::makeCrowd(const VSSample& sample, int purpose) {
     if (crowdsSize_ > mostCrowded) {
         crowds_.clear();
         crowdsSize_ = 0;
@@ -158,7 +213,6 @@ VSCrowdedStart& VSStoreMatcher::makeCrowd(const VSSample& sample, int purpose) {
         addTo(made, row);
         return true;
     });
-    return made;
 }
 
 void VSStoreMatcher::addTo(VSCrowdedStart& crowd, const VSSampleRow& row) {
@@ -185,16 +239,21 @@ uint64_t VSStoreMatcher::Traits::fingerprint(std::optional<int64_t> second) cons
     return hash;
 }
 
-bool VSStoreMatcher::sameRow(const VSSample& sample, int64_t metadata, const VSSampleRow& row) {
+VSStoreMatcher::Likeness VSStoreMatcher::likenessOfRow(const VSSample& sample, int64_t metadata,
+                                                       const VSSampleRow& row) {
     if (row.duration != (sample.endDate() - sample.startDate()).count() || row.metadata != metadata)
-        return false;
-    if (!VSSameStoredValue(row.value, VSStoredValue(sample))) return false;
-    if (sample.creationDate() && !sameCreation(row, *sample.creationDate())) return false;
+        return Likeness::None;
+    const Likeness ofValues = likenessOfValues(sample, row.value);
+    if (ofValues == Likeness::None) return ofValues;
+    if (sample.creationDate() && !sameCreation(row, *sample.creationDate())) return Likeness::None;
     const auto& entry = provenances_.provenance(row.provenance);
     const VSProvenance& sought = sample.provenance();
-    if (entry.revision != sought.sourceRevision && *entry.revision != sample.sourceRevision()) return false;
-    return !entry.device == !sought.device &&
-           (!entry.device || entry.device == sought.device || *entry.device == *sought.device);
+    if (entry.revision != sought.sourceRevision && *entry.revision != sample.sourceRevision())
+        return Likeness::None;
+    const bool sameDevice =
+        !entry.device == !sought.device &&
+        (!entry.device || entry.device == sought.device || *entry.device == *sought.device);
+    return sameDevice ? ofValues : Likeness::None;
 }
 
 bool VSStoreMatcher::sameWorkout(const VSWorkout& workout, int64_t id) {
@@ -238,19 +297,25 @@ bool VSStoreMatcher::row(const VSMemberKey& key, VSSampleRow& row) {
     return true;
 }
 
-bool VSStoreMatcher::sameMembers(const VSCorrelation& correlation, int64_t id) {
+VSStoreMatcher::Likeness VSStoreMatcher::likenessOfMembers(const VSCorrelation& correlation, int64_t id) {
     auto keys = members(id);
-    if (keys.size() != correlation.objects().size()) return false;
+    if (keys.size() != correlation.objects().size()) return Likeness::None;
+    Likeness least = Likeness::Same;
     for (const VSSamplePtr& object : correlation.objects()) {
         const auto metadata = metadata_.find(object->provenance().metadata);
-        if (!metadata) return false;
+        if (!metadata) return Likeness::None;
+        Likeness ofMember = Likeness::None;
         const auto found = std::find_if(keys.begin(), keys.end(), [&](const VSMemberKey& key) {
             VSSampleRow stored;
-            return key.type == object->sampleType() && key.start == object->startDate().microseconds() &&
-                   row(key, stored) && sameRow(*object, *metadata, stored);
+            if (key.type != object->sampleType() || key.start != object->startDate().microseconds() ||
+                !row(key, stored))
+                return false;
+            ofMember = likenessOfRow(*object, *metadata, stored);
+            return ofMember != Likeness::None;
         });
-        if (found == keys.end()) return false;
+        if (found == keys.end()) return Likeness::None;
         keys.erase(found);
+        least = std::min(least, ofMember);
     }
-    return true;
+    return least;
 }

@@ -32,7 +32,8 @@ struct VSMemberKey {
 /// content (workout totals and events; members). The creation date counts, to the second that documents give,
 /// where the sample has one. The time-zone offset does not: a document writes all its dates with the offset
 /// of the day on which it was made, so that one made in summer says the same of a record as one made in
-/// winter.
+/// winter. A quantity of at most six digits is also what an export left of a stored one that has more, in the
+/// unit of the document: a row that rounds to it is taken where no row has that very value.
 class VSStoreMatcher {
  public:
     VSStoreMatcher(VSDatabase& database, VSStoreProvenances& provenances, VSStoreMetadata& metadata)
@@ -59,15 +60,23 @@ class VSStoreMatcher {
         uint64_t fingerprint(std::optional<int64_t> second) const;
     };
 
+    enum class Likeness { None, Rounded, Same };
+
     template <typename Visit>
     void forEachRow(const VSSample& sample, Visit visit);
-    bool same(const VSSample& sample, int64_t metadata, const VSSampleRow& row);
-    VSCrowdedStart& makeCrowd(const VSSample& sample, int purpose);
+    /// Calls search(isWanted) for the same values, and where there are none for what rounds to them.
+    template <typename Search>
+    static int64_t closest(Search search);
+    int64_t findInCrowd(const VSSample& sample, int64_t metadata, VSCrowdedStart& crowd,
+                        const Accept& accept);
+    static Likeness likenessOfValues(const VSSample& sample, double stored);
+    Likeness likeness(const VSSample& sample, int64_t metadata, const VSSampleRow& row);
+    void makeCrowd(const VSSample& sample, int purpose);
     void addTo(VSCrowdedStart& crowd, const VSSampleRow& row);
     size_t originOf(int64_t provenance);
-    bool sameRow(const VSSample& sample, int64_t metadata, const VSSampleRow& row);
+    Likeness likenessOfRow(const VSSample& sample, int64_t metadata, const VSSampleRow& row);
     bool sameWorkout(const VSWorkout& workout, int64_t id);
-    bool sameMembers(const VSCorrelation& correlation, int64_t id);
+    Likeness likenessOfMembers(const VSCorrelation& correlation, int64_t id);
 
     VSDatabase& database_;
     VSStoreProvenances& provenances_;

@@ -9,26 +9,12 @@
 #include "Vessa/Base/VSEnvironment.h"
 #include "Vessa/Base/VSLog.h"
 #include "VessaUI/VSDataUnitGroupCatalogue.h"
-#include "VessaUI/VSRegion.h"
+#include "VessaUI/VSUnitPreferences.h"
 
 namespace {
 
-constexpr const char* preferredUnitsKey = "VSPreferredUnits";
-
 /// The number whose plural form stands for "any other number": what a fraction and a bare name get.
 constexpr int manyOfThem = 100;
-
-const VSUnitChoice* choiceForUnit(const VSDataUnitRow& row, const VSUnit& unit) {
-    for (const VSUnitChoice& choice : row.units)
-        if (VSUnit::fromString(choice.unit) == unit) return &choice;
-    return nullptr;
-}
-
-VSUnit regionalUnit(const VSDataUnitRow& row, const std::string& locale) {
-    for (const VSUnitChoice& choice : row.units)
-        if (VSRegionHasUnitCustom(locale, choice.defaultWhere)) return VSUnit::fromString(choice.unit);
-    return VSUnit::fromString(row.units.front().unit);
-}
 
 /// The unit of the numbers of a type that is not a quantity.
 VSUnit unitOfOtherKinds(const VSObjectType* type) {
@@ -65,8 +51,8 @@ VSUnitController::VSUnitController(std::shared_ptr<VSHealthStore> healthStore)
 
 void VSUnitController::load() {
     loadState_ = LoadState::Loading;
-    healthStore_->getDefaultValue(preferredUnitsKey, [this, alive = std::weak_ptr(alive_)](
-                                                         const VSResult<std::optional<VSValue>>& result) {
+    healthStore_->getDefaultValue(VSPreferredUnitsKey, [this, alive = std::weak_ptr(alive_)](
+                                                           const VSResult<std::optional<VSValue>>& result) {
         platform::mainQueue().async([this, alive, result] {
             if (alive.expired()) return;
             if (!result) {
@@ -95,7 +81,7 @@ void VSUnitController::preferencesLoaded(const VSValue::Dictionary& stored) {
         if (!text) return;
         const VSResult<VSUnit> parsed = VSUnit::parse(*text);
         // An unknown unit is left alone in the store: another version may understand it.
-        if (!parsed || !choiceForUnit(unit->row(), parsed.value())) return;
+        if (!parsed || !VSUnitChoiceForUnit(unit, parsed.value())) return;
         if (unitForDataUnit(unit) != parsed.value()) changed.insert(unit->dataType());
         preferred_.insert_or_assign(unit->dataType(), parsed.value());
     });
@@ -111,7 +97,7 @@ void VSUnitController::save() {
         if (loadState_ == LoadState::Failed) load();
         return;
     }
-    healthStore_->setDefaultValue(VSValue(stored_), preferredUnitsKey, [](const VSStatus& status) {
+    healthStore_->setDefaultValue(VSValue(stored_), VSPreferredUnitsKey, [](const VSStatus& status) {
         if (!status)
             VSLog(VSLogLevel::Error,
                   "VSUnitController: Error saving preferred units: " + status.error().message);
@@ -124,7 +110,7 @@ VSUnit VSUnitController::unitForDataUnit(const VSDataUnit* dataUnit) const {
     if (dataUnit->row().units.empty()) return unitOfOtherKinds(dataUnit->dataType());
     const auto chosen = preferred_.find(dataUnit->dataType());
     if (chosen != preferred_.end()) return chosen->second;
-    return regionalUnit(dataUnit->row(), VSEnvironment::current()->localeIdentifier());
+    return VSRegionalUnit(dataUnit, VSEnvironment::current()->localeIdentifier());
 }
 
 std::vector<VSUnit> VSUnitController::availableUnits(const VSDataUnitGroup* group) const {
@@ -135,7 +121,7 @@ std::vector<VSUnit> VSUnitController::availableUnits(const VSDataUnitGroup* grou
 }
 
 void VSUnitController::updatePreferredUnit(const VSUnit& unit, const VSDataUnit* dataUnit) {
-    if (!choiceForUnit(dataUnit->row(), unit)) {
+    if (!VSUnitChoiceForUnit(dataUnit, unit)) {
         VSLog(VSLogLevel::Error, "VSUnitController: " + unit.unitString() + " is not a unit of " +
                                      dataUnit->dataType()->identifier());
         return;
@@ -151,7 +137,7 @@ void VSUnitController::localeDidChange() {
     const std::string locale = VSEnvironment::current()->localeIdentifier();
     QSet<const VSObjectType*> changed;
     forEachQuantityUnit([&](const VSDataUnit* unit) {
-        const VSUnit regional = regionalUnit(unit->row(), locale);
+        const VSUnit regional = VSRegionalUnit(unit, locale);
         VSUnit& told = defaultsTold_.at(unit->dataType());
         if (told != regional && !preferred_.contains(unit->dataType())) changed.insert(unit->dataType());
         told = regional;
@@ -164,7 +150,7 @@ void VSUnitController::localeDidChange() {
 QString VSUnitController::nameOfUnit(const VSDataUnit* dataUnit, const VSUnit& unit,
                                      std::optional<double> value) const {
     if (dataUnit->row().units.empty()) return {};
-    const VSUnitChoice* choice = choiceForUnit(dataUnit->row(), unit);
+    const VSUnitChoice* choice = VSUnitChoiceForUnit(dataUnit, unit);
     if (!choice) return QString::fromStdString(unit.unitString());
     if (!*choice->nameKey) return {};
     if (!choice->nameHasPlural) return platform::localized(choice->nameKey);

@@ -3,6 +3,8 @@
 #include <unicode/uchar.h>
 #include <unicode/utf8.h>
 
+#include <algorithm>
+#include <array>
 #include <charconv>
 #include <chrono>
 #include <cmath>
@@ -108,6 +110,16 @@ std::optional<double> QVImportNumberFromText(std::string_view text) {
     const auto [stopped, error] = std::from_chars(text.data(), end, value);
     if (error != std::errc{} || stopped != end || !std::isfinite(value)) return std::nullopt;
     return value;
+}
+
+VSValue QVMetadataValueFromText(std::string_view key, std::string_view text) {
+    static constexpr std::array kYesNo{VSMetadataKeyWasUserEntered, VSMetadataKeyMenstrualCycleStart,
+                                       VSMetadataKeySexualActivityProtectionUsed};
+    if (std::find(kYesNo.begin(), kYesNo.end(), key) != kYesNo.end()) {
+        if (text == "1" || text == "true" || text == "YES") return true;
+        if (text == "0" || text == "false" || text == "NO") return false;
+    }
+    return std::string(text);
 }
 
 std::string QVImportQuoted(std::string_view text, size_t length) {

@@ -26,6 +26,10 @@ std::optional<VSBirthDate> QVImportBirthDateFromText(std::string_view text);
 /// A finite decimal number with a point ("72", "-0.5", "1.23457e+06"), the whole text. None for all else.
 std::optional<double> QVImportNumberFromText(std::string_view text);
 
+/// What a metadata entry's text means: a text, but yes or no under those keys of which the application itself
+/// asks for yes or no.
+VSValue QVMetadataValueFromText(std::string_view key, std::string_view text);
+
 /// The text for a message: quoted, control characters as blanks, cut after `length` bytes at a character's
 /// border.
 std::string QVImportQuoted(std::string_view text, size_t length = 80);

@@ -1,8 +1,8 @@
 #include "Qelvar/Import/QVRecordsBuilder.h"
 
 #include <algorithm>
-#include <array>
 #include <cmath>
+#include <cstdint>
 
 namespace {
 
@@ -18,16 +18,12 @@ std::string attributeName(QVAttributeName attribute) {
     return kQVAttributeNames[static_cast<size_t>(attribute)];
 }
 
-/// Documents give every metadata value as text. Those that the application itself asks for as yes or no
-/// become so again.
-VSValue metadataValue(std::string_view key, std::string_view text) {
-    static constexpr std::array kYesNo{VSMetadataKeyWasUserEntered, VSMetadataKeyMenstrualCycleStart,
-                                       VSMetadataKeySexualActivityProtectionUsed};
-    if (std::find(kYesNo.begin(), kYesNo.end(), key) != kYesNo.end()) {
-        if (text == "1" || text == "true" || text == "YES") return true;
-        if (text == "0" || text == "false" || text == "NO") return false;
-    }
-    return std::string(text);
+/// The number of a thing that has no identifier.
+std::optional<int> exactNumber(const QVElement& element, QVAttributeName attribute) {
+    const VSValue* exact = element.exactValue(attribute);
+    const auto number = exact ? exact->integer() : std::nullopt;
+    if (!number || *number < INT32_MIN || *number > INT32_MAX) return std::nullopt;
+    return static_cast<int>(*number);
 }
 
 }  // namespace
@@ -127,8 +123,9 @@ void QVRecordsBuilder::startWorkout(const QVElement& element) {
     if (!problem) problem = readDates(element, record_);
     if (!problem) problem = readOrigin(element, record_);
     if (!problem) {
-        const auto activity = VSWorkoutActivityTypeForIdentifier(givenType_);
-        if (!element.has(QVAttributeName::WorkoutActivityType))
+        auto activity = VSWorkoutActivityTypeForIdentifier(givenType_);
+        if (!activity) activity = exactNumber(element, QVAttributeName::WorkoutActivityType);
+        if (!activity && !element.has(QVAttributeName::WorkoutActivityType))
             problem = Problem{"missing attribute", attributeName(QVAttributeName::WorkoutActivityType)};
         else if (!activity)
             problem =
@@ -158,7 +155,9 @@ void QVRecordsBuilder::addMetadata(const QVElement& element, Draft& draft) {
         return refuse(element,
                       {"attribute too long", std::to_string(std::max(key.size(), value.size())) + " bytes"});
     }
-    if (!draft.metadata.emplace(std::string(key), metadataValue(key, value)).second) {
+    const VSValue* exact = element.exactValue(QVAttributeName::Value);
+    VSValue meant = exact ? *exact : QVMetadataValueFromText(key, value);
+    if (!draft.metadata.emplace(std::string(key), std::move(meant)).second) {
         refuse(element, {"metadata key given twice", attributeText(QVAttributeName::Key, key)});
     }
 }
@@ -167,7 +166,9 @@ void QVRecordsBuilder::addWorkoutEvent(const QVElement& element) {
     if (record_.refusal) return;
     VSWorkoutEvent event;
     const std::string_view type = element[QVAttributeName::Type];
-    if (type == "VSWorkoutEventTypePause")
+    if (const auto number = exactNumber(element, QVAttributeName::Type))
+        event.type = *number;
+    else if (type == "VSWorkoutEventTypePause")
         event.type = 1;
     else if (type == "VSWorkoutEventTypeResume")
         event.type = 2;
@@ -384,7 +385,8 @@ QVRecordsBuilder::Check QVRecordsBuilder::readQuantity(const QVElement& element,
     return {};
 }
 
-/// The total of a workout. Documents write 0 where a workout has none, so 0 is none.
+/// The total of a workout. Documents write 0 where a workout has none, so 0 is none unless it is said
+/// exactly.
 QVRecordsBuilder::Check QVRecordsBuilder::readAmount(const QVElement& element, QVAttributeName amount,
                                                      QVAttributeName unitName, VSTypeCode code,
                                                      std::optional<VSQuantity>& result) {
@@ -393,7 +395,7 @@ QVRecordsBuilder::Check QVRecordsBuilder::readAmount(const QVElement& element, Q
     const auto number = QVImportNumberFromText(text);
     if (!number) return Problem{"not a number", attributeText(amount, text)};
     if (*number < 0) return Problem{"negative amount", attributeText(amount, text)};
-    if (*number == 0) return {};
+    if (*number == 0 && !element.exactValue(amount)) return {};
     if (unitText.empty()) return Problem{"missing attribute", attributeName(unitName)};
     const VSObjectType* type = VSObjectType::dataTypeWithCode(code);
     const QVUnitIndex::Entry& unit = units_.find(type, unitText);

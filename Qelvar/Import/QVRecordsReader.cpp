@@ -5,7 +5,9 @@
 
 #include <algorithm>
 #include <array>
+#include <map>
 #include <memory>
+#include <utility>
 #include <vector>
 
 #include "Qelvar/Import/QVImportText.h"
@@ -14,6 +16,7 @@ namespace {
 
 constexpr size_t kDeepestNesting = 16;
 constexpr size_t kBufferSize = 64 * 1024;
+constexpr size_t kLongestExactValue = 512 * 1024;
 
 std::string_view text(const xmlChar* chars) {
     return chars ? std::string_view(reinterpret_cast<const char*>(chars)) : std::string_view();
@@ -80,6 +83,7 @@ class QVRecordsReader::Parser {
 
  private:
     using Context = std::unique_ptr<xmlParserCtxt, ContextCloser>;
+    using ExactValues = std::map<QVAttributeName, VSValue>;
 
     static Parser& self(void* context) { return *static_cast<Parser*>(context); }
 
@@ -92,6 +96,9 @@ class QVRecordsReader::Parser {
         };
         handler.endElementNs = [](void* context, const xmlChar*, const xmlChar*, const xmlChar*) {
             self(context).endElement();
+        };
+        handler.processingInstruction = [](void* context, const xmlChar* target, const xmlChar* data) {
+            if (text(target) == kQVExactValueTarget) self(context).exactValue(text(data));
         };
         handler.internalSubset = [](void* context, const xmlChar* name, const xmlChar* publicId,
                                     const xmlChar* systemId) {
@@ -204,6 +211,8 @@ class QVRecordsReader::Parser {
             return;
         }
         readAttributes(count, attributes);
+        const auto exact = std::exchange(exact_, {});
+        applyExactValues(exact);
         const QVElementName parent = open_.back();
         if (!isAllowed(element_.name, parent)) {
             ++passedOver_;
@@ -215,6 +224,7 @@ class QVRecordsReader::Parser {
 
     void endElement() {
         if (stopped_) return;
+        exact_.clear();
         if (passedOver_ > 0) {
             --passedOver_;
             return;
@@ -226,6 +236,27 @@ class QVRecordsReader::Parser {
         else
             reader_.builder_.end(name, open_.back());
         if (reader_.builder_.isStopped()) stopParser();
+    }
+
+    /// Says an attribute of the element that follows. What is not of that form says nothing.
+    void exactValue(std::string_view content) {
+        const size_t blank = content.find(' ');
+        if (open_.empty() || passedOver_ > 0 || blank == std::string_view::npos ||
+            content.size() > kLongestExactValue)
+            return;
+        const auto name =
+            std::find(kQVAttributeNames.begin(), kQVAttributeNames.end(), content.substr(0, blank));
+        auto value = VSValue::fromSerialized(content.substr(blank + 1));
+        if (name == kQVAttributeNames.end() || !value) return;
+        exact_[static_cast<QVAttributeName>(name - kQVAttributeNames.begin())] = std::move(*value);
+    }
+
+    void applyExactValues(const ExactValues& exact) {
+        element_.exactValues = exact.empty() ? nullptr : &exact;
+        for (const auto& [attribute, value] : exact) {
+            if (element_.has(attribute) && value.string())
+                element_.values[static_cast<size_t>(attribute)] = *value.string();
+        }
     }
 
     /// The names come from the parser's dictionary, so their addresses tell them apart.
@@ -267,6 +298,7 @@ class QVRecordsReader::Parser {
     std::array<uint8_t, 16> order_{};
     QVElement element_;
     std::vector<QVElementName> open_;  // from the root
+    ExactValues exact_;                // of the element that follows
     size_t passedOver_ = 0;            // elements open in one that has no place
     bool rootClosed_ = false;
     bool stopped_ = false;

@@ -39,30 +39,19 @@ TEST_F(CommandLine, TellsAboutItself) {
 }
 
 TEST_F(CommandLine, WrongCommandLinesAreTwo) {
-    for (const std::vector<std::string>& arguments : std::vector<std::vector<std::string>>{
-             {"--nonsense"},
-             {"nonsense"},
-             {"export", "--to", "x.zip"},
-             {"import"},
-             {"import", "--loud", "x"},
-             {"statistics"},
-             {"statistics", "HeartRate", "StepCount"},
-             {"statistics", "HeartRate", "--every", "fortnight"},
-             {"statistics", "HeartRate", "--options", "median"},
-             {"statistics", "HeartRate", "--from", "soon"},
-             {"statistics", "HeartRate", "--from"},
-             {"statistics", "HeartRate", "--from", "2020-03-02", "--to", "2020-03-01"},
-             {"samples"},
-             {"samples", "HeartRate", "--limit", "few"},
-             {"types", "all"},
-             {"batches", "1"},
-             {"undo"},
-             {"undo", "last"},
-             {"undo", "1", "2"},
-             {"check", "--help=yes"},
-             {"--size", "big"},
-             {"--now", "later", "types"},
-             {"--size", "1x1", "types"}}) {
+    // clang-format off
+    const std::vector<std::vector<std::string>> wrong{
+        {"--nonsense"}, {"nonsense"}, {"export"}, {"export", "--to"}, {"import"},
+        {"import", "--loud", "x"}, {"statistics"}, {"statistics", "HeartRate", "StepCount"},
+        {"statistics", "HeartRate", "--every", "fortnight"},
+        {"statistics", "HeartRate", "--options", "median"},
+        {"statistics", "HeartRate", "--from", "soon"}, {"statistics", "HeartRate", "--from"},
+        {"statistics", "HeartRate", "--from", "2020-03-02", "--to", "2020-03-01"}, {"samples"},
+        {"samples", "HeartRate", "--limit", "few"}, {"types", "all"}, {"batches", "1"}, {"undo"},
+        {"undo", "last"}, {"undo", "1", "2"}, {"check", "--help=yes"}, {"--size", "big"},
+        {"--now", "later", "types"}, {"--size", "1x1", "types"}};
+    // clang-format on
+    for (const auto& arguments : wrong) {
         const auto outcome = run(arguments);
         EXPECT_EQ(outcome.status, 2) << arguments[0] << ": " << outcome.errors;
         EXPECT_EQ(outcome.output, "");

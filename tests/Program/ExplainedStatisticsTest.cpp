@@ -39,26 +39,18 @@ class ExplainedStatistics : public testing::Test {
 TEST_F(ExplainedStatistics, ListRecordsAndWhatTookTheRest) {
     const auto all = rows({"statistics", "StepCount", "--every", "day", "--explain"});
     ASSERT_EQ(all.size(), 4U);  // the phone's first day; its second day, the watch, and what the phone took
-    EXPECT_EQ(all[0].at("end"), "2020-03-02T00:00:00+01:00");
-    EXPECT_EQ(all[0].at("source"), "Phone");
-    EXPECT_EQ(all[0].at("value"), "1573");
-    EXPECT_EQ(all[0].at("starts"), "1");
-    EXPECT_EQ(all[0].at("counted"), "589.875");
-    EXPECT_EQ(all[1].at("starts"), "0");
-    EXPECT_EQ(all[1].at("counted"), "983.125");
-    EXPECT_EQ(all[2].at("source"), "Watch");
-    EXPECT_EQ(all[2].at("in_interval"), "60");
-    EXPECT_EQ(all[2].at("counted"), "20");
-    EXPECT_EQ(all[2].at("taken"), "");
-    EXPECT_EQ(all[3].at("counted"), "");
-    EXPECT_EQ(all[3].at("source"), "Watch");
-    EXPECT_EQ(all[3].at("taken"), "40");
-    EXPECT_EQ(all[3].at("taken_from"), "2020-03-02T00:10:00+01:00");
-    EXPECT_EQ(all[3].at("taken_to"), "2020-03-02T00:50:00+01:00");
-    EXPECT_EQ(all[3].at("by_source"), "Phone");
-    EXPECT_EQ(all[3].at("by_start"), "2020-03-01T23:30:00+01:00");
-    EXPECT_EQ(all[3].at("by_value"), "1573");
-    EXPECT_EQ(all[3].at("unit"), "count");
+    // clang-format off
+    const std::tuple<size_t, const char*, const char*> fields[] = {
+        {0, "end", "2020-03-02T00:00:00+01:00"}, {0, "source", "Phone"}, {0, "value", "1573"},
+        {0, "starts", "1"}, {0, "counted", "589.875"}, {1, "starts", "0"}, {1, "counted", "983.125"},
+        {2, "source", "Watch"}, {2, "in_interval", "60"}, {2, "counted", "20"}, {2, "taken", ""},
+        {3, "counted", ""}, {3, "source", "Watch"}, {3, "taken", "40"},
+        {3, "taken_from", "2020-03-02T00:10:00+01:00"}, {3, "taken_to", "2020-03-02T00:50:00+01:00"},
+        {3, "by_source", "Phone"}, {3, "by_start", "2020-03-01T23:30:00+01:00"},
+        {3, "by_value", "1573"}, {3, "unit", "count"}};
+    // clang-format on
+    for (const auto& [row, column, value] : fields)
+        EXPECT_EQ(all[row].at(column), value) << "row " << row << ", " << column;
     EXPECT_EQ(program_.run({"statistics", "StepCount", "--explain", "--by-source"}).status, 2);
 }
 

@@ -4,12 +4,16 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <memory>
+
 #include "RunProgram.h"
 #include "TestSupport.h"
 
 namespace {
 
 namespace fs = std::filesystem;
+
+const fs::path kData = fs::path(QELVAR_TEST_DATA) / "import";
 
 std::string records(int count) {
     std::string text = "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<HealthData locale=\"en_DK\">\n";
@@ -25,72 +29,104 @@ std::string records(int count) {
     return text;
 }
 
-/// An import that reads a pipe, of which the other end is held here: it is in the midst of its transaction
-/// for as long as one likes.
-class InterruptedImport : public testing::Test {
+bool isWaiting(const std::string& line) {
+    return line.find("another program writes to the store") != std::string::npos;
+}
+
+/// An import into a store in use that reads a pipe, of which the other end is held here: it is in the midst
+/// of its transaction, with records in the store's hands, for as long as one likes.
+class ImportOfAPipe : public testing::Test {
  protected:
     void SetUp() override {
         ::signal(SIGPIPE, SIG_IGN);
         ASSERT_EQ(mkfifo(pipe_.c_str(), 0600), 0);
-        const fs::path before = fs::path(QELVAR_TEST_DATA) / "import" / "wrist-two-days" / "input.zip";
-        ASSERT_EQ(program_.run({"import", before}).status, 0);
+        ASSERT_EQ(program_.run({"import", kData / "wrist-two-days" / "input.zip"}).status, 0);
         types_ = program_.run({"types", "--recorded"}).output;
         ASSERT_NE(types_.find("HeartRate"), std::string::npos);
-    }
-
-    /// Begins an import, waits until records of it are in the store's hands, sends the signal.
-    test::Outcome interrupt(int signal) {
-        test::RunningProgram running({"import", "--progress", pipe_}, program_.environment());
-        const int end = open(pipe_.c_str(), O_WRONLY | O_CLOEXEC);
-        const std::string text = records(30'000);
-        size_t written = 0;
-        while (written < text.size()) {
-            const ssize_t count = write(end, text.data() + written, text.size() - written);
-            if (count <= 0) break;
-            written += static_cast<size_t>(count);
-        }
-        EXPECT_EQ(written, text.size());
-        EXPECT_TRUE(running.waitForErrorLine([](const std::string& line) {
+        first_ = std::make_unique<test::RunningProgram>(
+            std::vector<std::string>{"import", "--progress", pipe_}, program_.environment());
+        end_ = open(pipe_.c_str(), O_WRONLY | O_CLOEXEC);
+        send(records(30'000));
+        ASSERT_TRUE(first_->waitForErrorLine([](const std::string& line) {
             const size_t tab = line.rfind('\t');
             return tab != std::string::npos && std::atoll(line.c_str() + tab + 1) > 20'000;
         }));
-        running.signal(signal);
-        const auto outcome = running.wait();
-        close(end);
-        return outcome;
     }
-
-    void expectNoTrace() {
-        EXPECT_EQ(program_.run({"types", "--recorded"}).output, types_);
-        const auto check = program_.run({"check"});
-        EXPECT_EQ(check.status, 0) << check.errors;
-        const fs::path again = fs::path(QELVAR_TEST_DATA) / "import" / "identical-records" / "input.xml";
-        EXPECT_EQ(program_.run({"import", again}).status, 0) << "the store can be written again";
+    void TearDown() override {
+        if (end_ >= 0) close(end_);
+    }
+    void send(const std::string& text) {
+        for (size_t written = 0; written < text.size();) {
+            const ssize_t count = write(end_, text.data() + written, text.size() - written);
+            ASSERT_GT(count, 0);
+            written += static_cast<size_t>(count);
+        }
+    }
+    test::Outcome finishFirst() {
+        send("</HealthData>");
+        close(std::exchange(end_, -1));
+        return first_->wait();
     }
 
     const test::TemporaryFolder folder_;
     const test::Program program_{folder_.path()};
     const fs::path pipe_ = folder_.path() / "pipe";
     std::string types_;
+    std::unique_ptr<test::RunningProgram> first_;
+    int end_ = -1;
 };
 
-TEST_F(InterruptedImport, KilledItLeavesNoTrace) {
-    const auto outcome = interrupt(SIGKILL);
-    EXPECT_EQ(outcome.signal, SIGKILL);
-    expectNoTrace();
+class InterruptedImport : public ImportOfAPipe, public testing::WithParamInterface<int> {};
+
+TEST_P(InterruptedImport, LeavesNoTrace) {
+    const int signal = GetParam();
+    first_->signal(signal);
+    const auto outcome = first_->wait();
+    if (signal == SIGKILL) {
+        EXPECT_EQ(outcome.signal, SIGKILL);
+    } else {
+        EXPECT_EQ(outcome.status, 128 + signal);
+        EXPECT_NE(outcome.errors.find("nothing of it is kept"), std::string::npos);
+        EXPECT_EQ(outcome.output, "");
+    }
+    EXPECT_EQ(program_.run({"types", "--recorded"}).output, types_);
+    const auto check = program_.run({"check"});
+    EXPECT_EQ(check.status, 0) << check.errors;
+    EXPECT_EQ(program_.run({"import", kData / "identical-records" / "input.xml"}).status, 0)
+        << "the store can be written again";
 }
 
-TEST_F(InterruptedImport, InterruptedItEndsCleanly) {
-    const auto outcome = interrupt(SIGINT);
+INSTANTIATE_TEST_SUITE_P(Signals, InterruptedImport, testing::Values(SIGKILL, SIGINT, SIGTERM));
+
+TEST_F(ImportOfAPipe, AnotherOneWaitsAndBothAreComplete) {
+    test::RunningProgram second({"import", kData / "identical-records" / "input.xml"},
+                                program_.environment());
+    ASSERT_TRUE(second.waitForErrorLine(isWaiting));
+    test::RunningProgram trial({"import", "--dry-run", kData / "every-kind" / "input.xml"},
+                               program_.environment());
+    ASSERT_TRUE(trial.waitForErrorLine(isWaiting));
+    EXPECT_EQ(program_.run({"check"}).status, 0) << "readers do not wait";
+    EXPECT_EQ(finishFirst().status, 0);
+    EXPECT_EQ(second.wait().status, 0);
+    EXPECT_EQ(trial.wait().status, 0);
+    const auto batches = test::rowsOf(program_.run({"batches"}).output);
+    ASSERT_EQ(batches.size(), 3U) << "a trial leaves none";
+    EXPECT_EQ(batches[1].at("name"), "pipe");
+    EXPECT_EQ(batches[1].at("present"), "30000");
+    EXPECT_EQ(batches[2].at("name"), "input.xml");
+    EXPECT_EQ(batches[2].at("added"), batches[2].at("present"));
+    EXPECT_EQ(program_.run({"check"}).status, 0);
+}
+
+TEST_F(ImportOfAPipe, OneThatWaitsEndsAtOnce) {
+    test::RunningProgram second({"import", kData / "every-kind" / "input.xml"}, program_.environment());
+    ASSERT_TRUE(second.waitForErrorLine(isWaiting));
+    second.signal(SIGINT);
+    const auto outcome = second.wait();  // while the first one still holds the store
     EXPECT_EQ(outcome.status, 130);
     EXPECT_NE(outcome.errors.find("nothing of it is kept"), std::string::npos);
-    EXPECT_EQ(outcome.output, "");
-    expectNoTrace();
-}
-
-TEST_F(InterruptedImport, TerminatedItEndsCleanly) {
-    EXPECT_EQ(interrupt(SIGTERM).status, 143);
-    expectNoTrace();
+    EXPECT_EQ(finishFirst().status, 0);
+    EXPECT_EQ(test::rowsOf(program_.run({"batches"}).output).size(), 2U);
 }
 
 }  // namespace

@@ -15,44 +15,43 @@ namespace {
 using Kind = FaultyFileSystem::Kind;
 using Event = FaultyFileSystem::Event;
 
-FaultyFileSystem* current = nullptr;
+FaultyFileSystem* current = nullptr;  // the one that lives
 
-/// What SQLite holds of an open file: ours, and behind it in the same memory the real one's.
+/// What we know of an open file, behind what the real file system knows of it in the memory that SQLite
+/// gives. Its functions are the real ones but for those that may fail.
 struct OpenFile {
-    sqlite3_file base;
-    std::string* path;  // null: a temporary file
-    sqlite3_file* real() { return reinterpret_cast<sqlite3_file*>(this + 1); }
+    const sqlite3_io_methods* real = nullptr;
+    sqlite3_io_methods ours{};
+    std::string path;  // empty: a temporary file
 };
 
 OpenFile& own(sqlite3_file* file) {
-    return *reinterpret_cast<OpenFile*>(file);
+    return *reinterpret_cast<OpenFile*>(reinterpret_cast<char*>(file) + current->real()->szOsFile);
+}
+
+void note(sqlite3_file* file, Event event) {
+    if (!own(file).path.empty()) current->note(std::move(event), own(file).path);
 }
 
 int closeFile(sqlite3_file* file) {
-    OpenFile& open = own(file);
-    const int code = open.real()->pMethods ? open.real()->pMethods->xClose(open.real()) : SQLITE_OK;
-    delete open.path;
-    open.path = nullptr;
+    const int code = own(file).real->xClose(file);
+    own(file).~OpenFile();
     return code;
 }
 
 int readFile(sqlite3_file* file, void* bytes, int size, sqlite3_int64 offset) {
     if (current->fails(Kind::Read)) return SQLITE_IOERR_READ;
-    return own(file).real()->pMethods->xRead(own(file).real(), bytes, size, offset);
+    return own(file).real->xRead(file, bytes, size, offset);
 }
 
 int writeFile(sqlite3_file* file, const void* bytes, int size, sqlite3_int64 offset) {
-    OpenFile& open = own(file);
     const auto write = [&](int count) {
-        const int code = open.real()->pMethods->xWrite(open.real(), bytes, count, offset);
-        if (open.path)
-            current->note(
-                {Event::Write, {}, offset, {static_cast<const char*>(bytes), static_cast<size_t>(count)}},
-                *open.path);
+        const int code = own(file).real->xWrite(file, bytes, count, offset);
+        note(file, {Event::Write, {}, offset, {static_cast<const char*>(bytes), static_cast<size_t>(count)}});
         return code;
     };
     sqlite3_int64 length = 0;
-    open.real()->pMethods->xFileSize(open.real(), &length);
+    own(file).real->xFileSize(file, &length);
     if (!current->fails(offset + size > length ? Kind::Grow : Kind::Write)) return write(size);
     const int reason = errno;
     if (size > 1) write(size / 2);
@@ -61,80 +60,46 @@ int writeFile(sqlite3_file* file, const void* bytes, int size, sqlite3_int64 off
 }
 
 int truncateFile(sqlite3_file* file, sqlite3_int64 size) {
-    OpenFile& open = own(file);
     if (current->fails(Kind::Truncate)) return SQLITE_IOERR_TRUNCATE;
-    if (open.path) current->note({Event::Truncate, {}, size, {}}, *open.path);
-    return open.real()->pMethods->xTruncate(open.real(), size);
+    note(file, {Event::Truncate, {}, size, {}});
+    return own(file).real->xTruncate(file, size);
 }
 
 /// The machine does not stop in a test, so the real disk need not be waited for.
 int syncFile(sqlite3_file* file, int) {
-    OpenFile& open = own(file);
     if (current->fails(Kind::Sync)) return SQLITE_IOERR_FSYNC;
-    if (open.path) current->note({Event::Sync, {}, 0, {}}, *open.path);
+    note(file, {Event::Sync, {}, 0, {}});
     return SQLITE_OK;
 }
 
-int fileSize(sqlite3_file* file, sqlite3_int64* size) {
-    return own(file).real()->pMethods->xFileSize(own(file).real(), size);
-}
-int lock(sqlite3_file* file, int level) {
-    return own(file).real()->pMethods->xLock(own(file).real(), level);
-}
-int unlock(sqlite3_file* file, int level) {
-    return own(file).real()->pMethods->xUnlock(own(file).real(), level);
-}
-int checkReservedLock(sqlite3_file* file, int* locked) {
-    return own(file).real()->pMethods->xCheckReservedLock(own(file).real(), locked);
-}
-int fileControl(sqlite3_file* file, int operation, void* argument) {
-    return own(file).real()->pMethods->xFileControl(own(file).real(), operation, argument);
-}
-int sectorSize(sqlite3_file*) {
-    return 512;
-}
-int characteristics(sqlite3_file* file) {
-    return own(file).real()->pMethods->xDeviceCharacteristics(own(file).real());
-}
 int mapMemory(sqlite3_file* file, int region, int size, int extend, void volatile** memory) {
     if (current->fails(Kind::SharedMemory)) return SQLITE_IOERR_SHMSIZE;
-    return own(file).real()->pMethods->xShmMap(own(file).real(), region, size, extend, memory);
-}
-int lockMemory(sqlite3_file* file, int offset, int count, int flags) {
-    return own(file).real()->pMethods->xShmLock(own(file).real(), offset, count, flags);
-}
-void memoryBarrier(sqlite3_file* file) {
-    own(file).real()->pMethods->xShmBarrier(own(file).real());
-}
-int unmapMemory(sqlite3_file* file, int remove) {
-    return own(file).real()->pMethods->xShmUnmap(own(file).real(), remove);
+    return own(file).real->xShmMap(file, region, size, extend, memory);
 }
 
-constexpr sqlite3_io_methods methods{
-    2,          closeFile,     readFile,          writeFile,   truncateFile, syncFile,        fileSize,
-    lock,       unlock,        checkReservedLock, fileControl, sectorSize,   characteristics, mapMemory,
-    lockMemory, memoryBarrier, unmapMemory,       nullptr,     nullptr};
-
-int openFile(sqlite3_vfs*, const char* name, sqlite3_file* file, int flags, int* outFlags) {
-    auto* open = new (file) OpenFile{{nullptr}, nullptr};
-    std::memset(open->real(), 0, static_cast<size_t>(current->real()->szOsFile));
+int openFile(sqlite3_vfs* vfs, const char* name, sqlite3_file* file, int flags, int* outFlags) {
+    file->pMethods = nullptr;
     int exists = 1;
-    if (name) current->real()->xAccess(current->real(), name, SQLITE_ACCESS_EXISTS, &exists);
-    if (current->isReadOnly() && name) {
-        // As SQLite's own does where the system refuses to open a file for writing.
-        if (!exists) return SQLITE_CANTOPEN;
-        flags = (flags & ~(SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE)) | SQLITE_OPEN_READONLY;
-    }
+    if (name) vfs->xAccess(vfs, name, SQLITE_ACCESS_EXISTS, &exists);
     if (current->fails(exists ? Kind::Open : Kind::Create)) return SQLITE_CANTOPEN;
-    const int code = current->real()->xOpen(current->real(), name, open->real(), flags, outFlags);
-    if (open->real()->pMethods) open->base.pMethods = &methods;
-    if (name) open->path = new std::string(name);
-    if (code == SQLITE_OK && !exists) current->note({Event::Open, {}, 0, {}}, name);
+    const int code = current->real()->xOpen(current->real(), name, file, flags, outFlags);
+    if (code != SQLITE_OK) return code;
+    OpenFile& open = *new (&own(file)) OpenFile{file->pMethods, *file->pMethods, name ? name : ""};
+    open.ours.iVersion = 2;  // without memory maps of the file, which nothing could make fail
+    open.ours.xClose = closeFile;
+    open.ours.xRead = readFile;
+    open.ours.xWrite = writeFile;
+    open.ours.xTruncate = truncateFile;
+    open.ours.xSync = syncFile;
+    open.ours.xSectorSize = [](sqlite3_file*) { return 512; };
+    open.ours.xShmMap = mapMemory;
+    file->pMethods = &open.ours;
+    if (!exists) current->note({Event::Open, {}, 0, {}}, name);
     return code;
 }
 
 int deleteFile(sqlite3_vfs*, const char* name, int syncFolder) {
-    if (current->isReadOnly() || current->fails(Kind::Delete)) return SQLITE_IOERR_DELETE;
+    if (current->fails(Kind::Delete)) return SQLITE_IOERR_DELETE;
     const int code = current->real()->xDelete(current->real(), name, syncFolder);
     if (code == SQLITE_OK) {
         current->note({Event::Delete, {}, 0, {}}, name);
@@ -143,44 +108,17 @@ int deleteFile(sqlite3_vfs*, const char* name, int syncFolder) {
     return code;
 }
 
-int access(sqlite3_vfs*, const char* name, int flags, int* result) {
-    return current->real()->xAccess(current->real(), name, flags, result);
-}
-int fullPathname(sqlite3_vfs*, const char* name, int size, char* out) {
-    return current->real()->xFullPathname(current->real(), name, size, out);
-}
-int randomness(sqlite3_vfs*, int size, char* out) {
-    return current->real()->xRandomness(current->real(), size, out);
-}
-int sleep(sqlite3_vfs*, int microseconds) {
-    return current->real()->xSleep(current->real(), microseconds);
-}
-int currentTime(sqlite3_vfs*, double* time) {
-    return current->real()->xCurrentTime(current->real(), time);
-}
-int lastSystemError(sqlite3_vfs*, int, char*) {
-    return errno;
-}
-int currentTimeInteger(sqlite3_vfs*, sqlite3_int64* time) {
-    return current->real()->xCurrentTimeInt64(current->real(), time);
-}
-
 }  // namespace
 
-FaultyFileSystem::FaultyFileSystem() : real_(sqlite3_vfs_find(nullptr)), vfs_(new sqlite3_vfs{}) {
-    vfs_->iVersion = 2;
-    vfs_->szOsFile = static_cast<int>(sizeof(OpenFile)) + real_->szOsFile;
-    vfs_->mxPathname = real_->mxPathname;
+FaultyFileSystem::FaultyFileSystem()
+    : real_(sqlite3_vfs_find(nullptr)), vfs_(std::make_unique<sqlite3_vfs>(*real_)) {
+    static_assert(alignof(OpenFile) <= 8);
+    vfs_->pNext = nullptr;
+    vfs_->szOsFile = real_->szOsFile + static_cast<int>(sizeof(OpenFile));
     vfs_->zName = "faulty";
     vfs_->xOpen = openFile;
     vfs_->xDelete = deleteFile;
-    vfs_->xAccess = access;
-    vfs_->xFullPathname = fullPathname;
-    vfs_->xRandomness = randomness;
-    vfs_->xSleep = sleep;
-    vfs_->xCurrentTime = currentTime;
-    vfs_->xGetLastError = lastSystemError;
-    vfs_->xCurrentTimeInt64 = currentTimeInteger;
+    vfs_->xGetLastError = [](sqlite3_vfs*, int, char*) { return errno; };
     current = this;
     sqlite3_vfs_register(vfs_.get(), 1);
 }
@@ -216,22 +154,10 @@ bool FaultyFileSystem::fails(Kind kind) {
     if (kind == Kind::Read && !reads_) return false;
     const int number = count_++;
     if (!armed_ || number < failing_) return false;
-    bool failing = false;
-    switch (fault_) {
-        case Fault::OneFailure:
-            failing = number == failing_;
-            break;
-        case Fault::BrokenDisk:
-            failing = true;
-            break;
-        case Fault::FullDisk:
-            failing = kind == Kind::Create || kind == Kind::Grow || kind == Kind::SharedMemory;
-            break;
-        case Fault::ReadOnlyDisk:
-            failing = kind == Kind::Create || kind == Kind::Write || kind == Kind::Grow ||
-                      kind == Kind::Truncate || kind == Kind::SharedMemory;
-            break;
-    }
+    const bool needsSpace = kind == Kind::Create || kind == Kind::Grow || kind == Kind::SharedMemory;
+    const bool failing = fault_ == Fault::OneFailure ? number == failing_
+                         : fault_ == Fault::FullDisk ? needsSpace
+                                                     : true;
     if (failing) errno = fault_ == Fault::FullDisk ? ENOSPC : EIO;
     return failing;
 }
@@ -239,11 +165,6 @@ bool FaultyFileSystem::fails(Kind kind) {
 bool FaultyFileSystem::isFull() const {
     std::lock_guard lock(mutex_);
     return armed_ && fault_ == Fault::FullDisk;
-}
-
-bool FaultyFileSystem::isReadOnly() const {
-    std::lock_guard lock(mutex_);
-    return armed_ && fault_ == Fault::ReadOnlyDisk;
 }
 
 void FaultyFileSystem::startRecording(const std::filesystem::path& folder) {

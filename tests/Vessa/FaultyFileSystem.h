@@ -24,10 +24,9 @@ class FaultyFileSystem {
     FaultyFileSystem& operator=(const FaultyFileSystem&) = delete;
 
     enum class Fault {
-        OneFailure,   // one operation gives an I/O error; a write lands in part before
-        BrokenDisk,   // every operation from there on
-        FullDisk,     // every one from there on that needs space
-        ReadOnlyDisk  // files cannot be opened for writing, made or deleted, from the first on
+        OneFailure,  // one operation gives an I/O error; a write lands in part before
+        BrokenDisk,  // every operation from there on
+        FullDisk     // every one from there on that needs space
     };
     /// The n-th operation from now on (0: the next) and what follows fail in this way. Operations are
     /// opening, writing, cutting, syncing and deleting files, growing the shared memory, and with `reads`
@@ -54,7 +53,6 @@ class FaultyFileSystem {
     /// Whether this operation fails; counts it.
     bool fails(Kind kind);
     bool isFull() const;
-    bool isReadOnly() const;
     void note(Event event, const std::string& path);
     sqlite3_vfs* real() const { return real_; }
 

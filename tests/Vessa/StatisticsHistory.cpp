@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
+#include <functional>
 
 namespace test {
 
@@ -104,33 +105,26 @@ VSSamplePtr History::sample(VSDate start) {
 }
 
 void History::change() {
-    switch (pick(0, 9)) {
-        case 0:
-        case 1:
-        case 2:
-            lastChange_ = "many added";
-            return add(static_cast<int>(pick(2, 60)));
-        case 3:
-            lastChange_ = "one added";
-            return add(1);
-        case 4:
-            lastChange_ = "imported";
-            return importSome(static_cast<int>(pick(1, 30)));
-        case 5:
-            lastChange_ = "removed";
-            return removeSome(static_cast<int>(pick(1, 25)));
-        case 6:
-            lastChange_ = "a source removed";
-            return removeSource();
-        case 7:
-            // Whose first sample it becomes may count first from now on.
-            lastChange_ = "an earlier one added";
-            EXPECT_OK(store().saveObjectsAndWait({sample(origin_ - std::chrono::seconds(pick(1, 90000)))}));
-            return;
-        default:
-            lastChange_ = "sources in another order";
-            return reorder();
-    }
+    const auto some = [&](int64_t low, int64_t high) { return static_cast<int>(pick(low, high)); };
+    const std::function<void()> many = [&] { add(some(2, 60)); }, order = [&] { reorder(); };
+    const std::pair<const char*, std::function<void()>> changes[] = {
+        {"many added", many},
+        {"many added", many},
+        {"many added", many},
+        {"one added", [&] { add(1); }},
+        {"imported", [&] { importSome(some(1, 30)); }},
+        {"removed", [&] { removeSome(some(1, 25)); }},
+        {"a source removed", [&] { removeSource(); }},
+        // Whose first sample it becomes may count first from now on.
+        {"an earlier one added",
+         [&] {
+             EXPECT_OK(store().saveObjectsAndWait({sample(origin_ - std::chrono::seconds(pick(1, 90000)))}));
+         }},
+        {"sources in another order", order},
+        {"sources in another order", order}};
+    const auto& [name, change] = changes[pick(0, std::size(changes) - 1)];
+    lastChange_ = name;
+    change();
 }
 
 void History::add(int count) {
@@ -168,9 +162,7 @@ void History::reorder() {
 }
 
 std::vector<VSSource> History::order() {
-    Promise<std::vector<VSSource>> promise;
-    store().orderedSources(type_, [&](const auto& result) { promise.set(*result); });
-    return *promise.wait();
+    return sourceOrderOf(store(), type_);
 }
 
 std::vector<PlainSample> History::plain(const std::vector<VSSource>& order) {

@@ -9,10 +9,7 @@ namespace {
 
 using Status = VSAuthorizationStatus;
 
-struct StoreAuthorization : testing::Test {
-    FixedEnvironment environment;
-    TemporaryFolder folder;
-    std::shared_ptr<VSHealthStore> store = openStore(folder.path());
+struct StoreAuthorization : StoreTest {
     const VSSource band{"Band App", "org.example.band"};
     std::shared_ptr<VSHealthStore> theirs = openTheirs();
 
@@ -43,14 +40,11 @@ struct StoreAuthorization : testing::Test {
         EXPECT_OK(wait([&](auto done) { theirs->requestAuthorization(toShare, toRead, done); }));
     }
     std::vector<VSAuthorizationRecord> records(const VSObjectType* of) {
-        Promise<std::vector<VSAuthorizationRecord>> promise;
-        store->authorizationRecords(of, [&](const auto& result) { promise.set(*result); });
-        return *promise.wait();
+        return *answerOf<std::vector<VSAuthorizationRecord>>(
+            [&](auto done) { store->authorizationRecords(of, done); });
     }
     std::vector<VSSource> sources() {
-        Promise<std::vector<VSSource>> promise;
-        store->allSources([&](const auto& result) { promise.set(*result); });
-        return *promise.wait();
+        return *answerOf<std::vector<VSSource>>([&](auto done) { store->allSources(done); });
     }
     /// 0: no error.
     static int refusal(const VSStatus& status) {
@@ -70,7 +64,7 @@ struct StoreAuthorization : testing::Test {
 }  // namespace
 
 TEST_F(StoreAuthorization, ProgramsReadAndShareWhatTheyMay) {
-    EXPECT_OK(store->saveObjectsAndWait({beat(60, {})}));
+    save({beat(60, {})});
     VSPredicate ofBand;
     ofBand.sources = {band};
     EXPECT_TRUE(refusal(theirs->saveObjectsAndWait({beat(61, own())}))) << "never asked";
@@ -91,14 +85,14 @@ TEST_F(StoreAuthorization, ProgramsReadAndShareWhatTheyMay) {
         EXPECT_EQ(reading(heartRate(), ofBand), 0) << "what it saved itself it sees";
         saved += c.shares;
     }
-    EXPECT_EQ(allSamples(*store, heartRate()).size(), 1 + saved) << "the owner may do everything";
+    EXPECT_EQ(count(VSCode::HeartRate), 1 + saved) << "the owner may do everything";
     EXPECT_EQ(theirs->samples(heartRate(), ofBand, 0, {})->size(), saved);
     EXPECT_TRUE(reading(steps())) << "of this type nothing was granted";
     expectSound(*store);
 }
 
 TEST_F(StoreAuthorization, NobodySpeaksOrActsForOthers) {
-    EXPECT_OK(store->saveObjectsAndWait({beat(60, {})}));
+    save({beat(60, {})});
     const auto mine = allSamples(*store, heartRate());
     grant(heartRate(), Status::SharingAndReading);
     EXPECT_OK(theirs->saveObjectsAndWait({beat(61, own())}));
@@ -123,17 +117,12 @@ TEST_F(StoreAuthorization, NobodySpeaksOrActsForOthers) {
     EXPECT_TRUE(refusal(wait([&](auto done) { theirs->setDateOfBirth(std::nullopt, done); })));
     grant(type(VSCode::DateOfBirth), Status::ReadingOnly);
     EXPECT_TRUE(theirs->dateOfBirth().ok());
-    EXPECT_EQ(allSamples(*store, heartRate()).size(), 2u);
+    EXPECT_EQ(count(VSCode::HeartRate), 2u);
     EXPECT_OK(wait([&](auto done) { theirs->deleteAllSamples({heartRate()}, band.bundleIdentifier, done); }));
-    EXPECT_EQ(allSamples(*store, heartRate()).size(), 1u);
+    EXPECT_EQ(count(VSCode::HeartRate), 1u);
 
     // A correlation needs what its members need.
-    const auto value = [&](VSTypeCode code) {
-        return quantity(type(code), 100, "2020-03-01", "2020-03-01", own());
-    };
-    const auto reading = std::make_shared<VSCorrelation>(
-        type(VSCode::BloodPressure), date("2020-03-01"), date("2020-03-01"),
-        std::vector{value(VSCode::BloodPressureSystolic), value(VSCode::BloodPressureDiastolic)}, own());
+    const auto reading = bloodPressure(120, 80, date("2020-03-01"), own());
     for (const VSTypeCode code :
          {VSCode::BloodPressure, VSCode::BloodPressureSystolic, VSCode::BloodPressureDiastolic}) {
         EXPECT_TRUE(refusal(theirs->saveObjectsAndWait({reading})));
@@ -145,8 +134,8 @@ TEST_F(StoreAuthorization, NobodySpeaksOrActsForOthers) {
 
 TEST_F(StoreAuthorization, WhatMayNotBeReadIsNotCountedEither) {
     grant(heartRate(), Status::SharingOnly);
-    EXPECT_OK(store->saveObjectsAndWait({quantity(heartRate(), 60, "2019-01-01", "2021-01-01", from("Watch")),
-                                         quantity(steps(), 5, "2018-01-01", "2018-01-02")}));
+    save({quantity(heartRate(), 60, "2019-01-01", "2021-01-01", from("Watch")),
+          quantity(steps(), 5, "2018-01-01", "2018-01-02")});
     EXPECT_OK(theirs->saveObjectsAndWait({beat(61, own())}));
     EXPECT_OK(wait([&](auto done) {
         store->setAuthorizationStatuses({{heartRate(), Status::ReadingOnly}}, "org.example.other", done);
@@ -186,19 +175,16 @@ TEST_F(StoreAuthorization, WhatOthersSavedIsNotMadeAMember) {
         grant(type(code), Status::SharingAndReading);
     const VSDate when = date("2020-03-01");
     const auto workout = [&](const VSProvenance& provenance, VSObjectID id = {}) {
-        return std::make_shared<VSWorkout>(1, when, when, VSDuration(0), std::nullopt, std::nullopt,
-                                           std::vector<VSWorkoutEvent>(), provenance, id);
+        return plainWorkout(when, when, provenance, id);
     };
-    EXPECT_OK(store->saveObjectsAndWait(
-        {quantity(type(VSCode::BloodPressureSystolic), 100, when, when), workout({})}));
+    save({quantity(type(VSCode::BloodPressureSystolic), 100, when, when), workout({})});
     const auto value = allSamples(*store, type(VSCode::BloodPressureSystolic))[0];
     const auto theirsNow = allSamples(*store, type(VSCode::Workout))[0];
     // What claims to be theirs, under the number of what is not.
     const auto forged = std::make_shared<VSQuantitySample>(
         value->sampleType(), VSQuantity(value->sampleType()->canonicalUnit(), 100), when, when, own(),
         value->dataID());
-    EXPECT_TRUE(refusal(theirs->saveObjectsAndWait({std::make_shared<VSCorrelation>(
-        type(VSCode::BloodPressure), when, when, std::vector<VSSamplePtr>{forged}, own())})));
+    EXPECT_TRUE(refusal(theirs->saveObjectsAndWait({bloodPressureOf({forged}, own())})));
     EXPECT_OK(theirs->saveObjectsAndWait({workout(own())}));
     const auto add = [&](VSSamplePtr sample, VSSamplePtr to) {
         return wait([&](auto done) { theirs->addSamplesToWorkout({sample}, to, done); });
@@ -235,7 +221,7 @@ TEST_F(StoreAuthorization, RecordsTellWhatWasAskedAndGranted) {
     worn.device = std::make_shared<VSDevice>(VSDevice{"W", {}, {}, {}, {}, {}, "one", {}});
     VSProvenance strapped = from("Watch");
     strapped.device = std::make_shared<VSDevice>(VSDevice{"Strap", {}, {}, {}, {}, {}, "two", {}});
-    EXPECT_OK(store->saveObjectsAndWait({beat(1, worn), beat(2, strapped), beat(3, {}), beat(4, from("X"))}));
+    save({beat(1, worn), beat(2, strapped), beat(3, {}), beat(4, from("X"))});
     theirs.reset();
     store.reset();
     store = openStore(folder.path());
@@ -245,9 +231,7 @@ TEST_F(StoreAuthorization, RecordsTellWhatWasAskedAndGranted) {
     EXPECT_EQ(vs_sourcesForAuthorization(sources()), (std::vector{band}));
     EXPECT_EQ(vs_sourcesForDevices(sources()), (std::vector{VSSource::application(), watch, x}));
     const auto devices = [&](std::vector<std::string> identifiers) {
-        Promise<std::vector<VSDevice>> promise;
-        store->devices(std::move(identifiers), [&](const auto& result) { promise.set(*result); });
-        return *promise.wait();
+        return *answerOf<std::vector<VSDevice>>([&](auto done) { store->devices(identifiers, done); });
     };
     EXPECT_EQ(devices({}), (std::vector{*strapped.device, *worn.device}));
     EXPECT_EQ(devices({"one", "three"}), (std::vector{*worn.device}));
@@ -255,7 +239,7 @@ TEST_F(StoreAuthorization, RecordsTellWhatWasAskedAndGranted) {
 }
 
 TEST_F(StoreAuthorization, RunningQueriesFeelEachChangeOfPermission) {
-    EXPECT_OK(store->saveObjectsAndWait({beat(60, {}), quantity(steps(), 5, "2020-03-01", "2020-03-01")}));
+    save({beat(60, {}), quantity(steps(), 5, "2020-03-01", "2020-03-01")});
     grant(heartRate(), Status::ReadingOnly);
     Log<std::string> told;
     const auto tell = [&](const auto& result) {
@@ -268,7 +252,7 @@ TEST_F(StoreAuthorization, RunningQueriesFeelEachChangeOfPermission) {
     ASSERT_TRUE(told.waitFor(1));
     grant(heartRate(), Status::Neither);
     ASSERT_TRUE(told.waitFor(2));
-    EXPECT_OK(store->saveObjectsAndWait({beat(61, {})}));
+    save({beat(61, {})});
     ASSERT_TRUE(told.waitFor(3));
     grant(heartRate(), Status::ReadingOnly);
     ASSERT_TRUE(told.waitFor(4));

@@ -90,12 +90,7 @@ Step workout() {
                 37, date("2020-03-02T10:00"), date("2020-03-02T11:00"), VSDuration(0), std::nullopt,
                 std::nullopt,
                 std::vector<VSWorkoutEvent>{{1, date("2020-03-02T10:10")}, {2, date("2020-03-02T10:11")}});
-            auto pressure = std::make_shared<VSCorrelation>(
-                type(VSCode::BloodPressure), date("2020-03-02"), date("2020-03-02"),
-                std::vector<VSSamplePtr>{
-                    quantity(type(VSCode::BloodPressureSystolic), 120, "2020-03-02", "2020-03-02"),
-                    quantity(type(VSCode::BloodPressureDiastolic), 80, "2020-03-02", "2020-03-02")});
-            return store.saveObjectsAndWait({run, pressure});
+            return store.saveObjectsAndWait({run, bloodPressure(120, 80, date("2020-03-02"))});
         },
         [](VSHealthStore& store) {
             size_t found = 0;
@@ -103,7 +98,7 @@ Step workout() {
                               VSCode::BloodPressureDiastolic})
                 found += allSamples(store, type(code)).size();
             for (const auto& sample : allSamples(store, type(VSCode::BloodPressure)))
-                found += dynamic_cast<const VSCorrelation&>(*sample).objects().size();
+                found += membersOf(sample).size();
             return stateOf(found, 6);
         }};
 }
@@ -120,11 +115,7 @@ Step sourceOrder() {
                 EXPECT_OK(store.saveObjectsAndWait(
                     {quantity(flights, 1, "2020-03-01T10:00", "2020-03-01T10:00", from("Early")),
                      quantity(flights, 1, "2020-03-01T11:00", "2020-03-01T11:00", from("Late"))}));
-                Promise<std::string> first;
-                store.orderedSources(flights, [&](const auto& sources) {
-                    first.set(sources && !sources->empty() ? sources->front().name : "");
-                });
-                return *first.wait() == "Late" ? Step::Whole : Step::Absent;
+                return sourceOrderOf(store, flights).at(0).name == "Late" ? Step::Whole : Step::Absent;
             }};
 }
 
@@ -132,11 +123,7 @@ Step defaultValue() {
     return {[](VSHealthStore& store) {
                 return wait([&](auto done) { store.setDefaultValue(VSValue(7), "key", done); });
             },
-            [](VSHealthStore& store) {
-                Promise<bool> promise;
-                store.getDefaultValue("key", [&](const auto& value) { promise.set(value && *value); });
-                return *promise.wait() ? Step::Whole : Step::Absent;
-            }};
+            [](VSHealthStore& store) { return *defaultValueOf(store, "key") ? Step::Whole : Step::Absent; }};
 }
 
 std::vector<Step> everyKind() {
@@ -224,13 +211,16 @@ struct Disk : testing::Test {
         return reached;
     }
 
-    void failEverywhere(FaultyFileSystem::Fault fault, bool fresh, int stride) {
+    /// Strides through the operations, of a store in use and of a new one; a long test leaves none out.
+    void failEverywhere(FaultyFileSystem::Fault fault, int strideInUse, int strideNew) {
         TemporaryFolder used;
         prepare(used.path());
         const auto ready = used.path();
-        for (int n = 0;; n += longTests() ? 1 : stride) {
-            SCOPED_TRACE("operation " + std::to_string(n) + (fresh ? " of a new store" : ""));
-            if (!runWithFault(n, fault, fresh ? nullptr : &ready) || HasFailure()) break;
+        for (const bool fresh : {false, true}) {
+            for (int n = 0;; n += longTests() ? 1 : fresh ? strideNew : strideInUse) {
+                SCOPED_TRACE("operation " + std::to_string(n) + (fresh ? " of a new store" : ""));
+                if (!runWithFault(n, fault, fresh ? nullptr : &ready) || HasFailure()) break;
+            }
         }
     }
 };
@@ -238,18 +228,15 @@ struct Disk : testing::Test {
 }  // namespace
 
 TEST_F(Disk, OneFailedOperationFailsOneChangeAndHurtsNothing) {
-    failEverywhere(FaultyFileSystem::Fault::OneFailure, false, 3);
-    failEverywhere(FaultyFileSystem::Fault::OneFailure, true, 7);
+    failEverywhere(FaultyFileSystem::Fault::OneFailure, 3, 7);
 }
 
 TEST_F(Disk, AFullDiskIsSaidToBeFullAndHurtsNothing) {
-    failEverywhere(FaultyFileSystem::Fault::FullDisk, false, 5);
-    failEverywhere(FaultyFileSystem::Fault::FullDisk, true, 7);
+    failEverywhere(FaultyFileSystem::Fault::FullDisk, 5, 7);
 }
 
 TEST_F(Disk, ABrokenDiskFailsEverythingUntilItIsWellAgain) {
-    failEverywhere(FaultyFileSystem::Fault::BrokenDisk, false, 11);
-    failEverywhere(FaultyFileSystem::Fault::BrokenDisk, true, 13);
+    failEverywhere(FaultyFileSystem::Fault::BrokenDisk, 11, 13);
 }
 
 TEST_F(Disk, AFailedReadIsAnErrorAndNeverAnEmptyAnswer) {
@@ -357,6 +344,14 @@ struct PowerCut : Disk {
         }
     }
 
+    void playAndCut(const std::vector<Step>& steps, bool survivesPowerLoss, bool inUse, size_t stride) {
+        TemporaryFolder folder, before;
+        if (inUse) prepare(folder.path());
+        std::filesystem::copy(folder.path(), before.path(), std::filesystem::copy_options::recursive);
+        const Recording recording = record(folder.path(), steps, survivesPowerLoss);
+        cutEverywhere(before.path(), recording, steps, survivesPowerLoss, stride);
+    }
+
     /// What is there is what was saved first: only the last saves may be lost.
     static void expectPrefix(VSHealthStore& store, const std::vector<Step>& steps) {
         bool lost = false;
@@ -372,28 +367,11 @@ struct PowerCut : Disk {
 
 }  // namespace
 
-TEST_F(PowerCut, NoAcknowledgedChangeOfAStoreInUseIsLost) {
-    TemporaryFolder used, before;
-    prepare(used.path());
-    std::filesystem::copy(used.path(), before.path(), std::filesystem::copy_options::recursive);
-    const auto steps = everyKind();
-    const Recording recording = record(used.path(), steps, true);
-    cutEverywhere(before.path(), recording, steps, true, 5);
-}
-
-TEST_F(PowerCut, NoAcknowledgedChangeOfANewStoreIsLost) {
-    TemporaryFolder fresh, before;
-    const auto steps = everyKind();
-    const Recording recording = record(fresh.path(), steps, true);
-    cutEverywhere(before.path(), recording, steps, true, 7);
+TEST_F(PowerCut, NoAcknowledgedChangeIsLost) {
+    playAndCut(everyKind(), true, true, 5);
+    playAndCut(everyKind(), true, false, 7);
 }
 
 TEST_F(PowerCut, WithoutSurvivingItOnlyTheLastChangesAreLost) {
-    TemporaryFolder used, before;
-    prepare(used.path());
-    std::filesystem::copy(used.path(), before.path(), std::filesystem::copy_options::recursive);
-    const std::vector<Step> steps{save("1", 20), import("2", 300), save("3", 5), defaultValue(),
-                                  save("4", 1)};
-    const Recording recording = record(used.path(), steps, false);
-    cutEverywhere(before.path(), recording, steps, false, 3);
+    playAndCut({save("1", 20), import("2", 300), save("3", 5), defaultValue(), save("4", 1)}, false, true, 3);
 }

@@ -1,11 +1,6 @@
 #include <gtest/gtest.h>
-#include <sys/resource.h>
 #include <sys/stat.h>
 
-#include <csignal>
-#include <fstream>
-
-#include "ChildProcess.h"
 #include "StoreTestSupport.h"
 #include "Vessa/VSDatabase.h"
 
@@ -18,10 +13,6 @@ struct StoreFile : testing::Test {
     TemporaryFolder folder;
     const std::filesystem::path file = folder.path() / "vessa.sqlite";
 
-    std::string bytes() const {
-        std::ifstream stream(file, std::ios::binary);
-        return {std::istreambuf_iterator<char>(stream), {}};
-    }
     void makeStore(int samples = 10) const {
         const auto store = openStore(folder.path());
         std::vector<VSSamplePtr> objects;
@@ -70,40 +61,37 @@ TEST_F(StoreFile, IsCompleteInItselfAfterTheLastConnectionClosed) {
     EXPECT_EQ(allSamples(*openStore(copy.path()), heartRate()).size(), 1u);
 }
 
-TEST_F(StoreFile, IsRefusedUntouchedWhenItIsNotOurs) {
+TEST_F(StoreFile, IsRefusedUntouchedWhenItIsNotOursOrNewer) {
     VSHealthStore::Options options;
     options.createIfMissing = false;
     EXPECT_EQ(refusal(options), VSErrorCode::NotAccessible) << "missing";
 
     std::ofstream(file) << std::string(5000, 'x');
     EXPECT_EQ(refusal(), VSErrorCode::Corrupt);
-    EXPECT_EQ(bytes(), std::string(5000, 'x'));
-    std::filesystem::remove(file);
-
+    EXPECT_EQ(contentOf(file), std::string(5000, 'x'));
     std::ofstream(file) << "";
     change("CREATE TABLE theirs(a)");
-    const std::string theirs = bytes();
+    const std::string theirs = contentOf(file);
     EXPECT_EQ(refusal(), VSErrorCode::Refused);
-    EXPECT_EQ(bytes(), theirs);
-}
+    EXPECT_EQ(contentOf(file), theirs);
+    std::filesystem::remove(file);
 
-TEST_F(StoreFile, OfANewerFormatIsRefusedUntouched) {
     makeStore();
     change("PRAGMA user_version = 99; PRAGMA wal_checkpoint(TRUNCATE)");
-    const std::string before = bytes();
-    EXPECT_EQ(refusal(), VSErrorCode::Refused);
-    VSHealthStore::Options options;
-    options.readOnly = true;
-    EXPECT_EQ(refusal(options), VSErrorCode::Refused);
-    EXPECT_EQ(bytes(), before);
+    const std::string newer = contentOf(file);
+    for (const bool readOnly : {false, true}) {
+        options.readOnly = readOnly;
+        EXPECT_EQ(refusal(options), VSErrorCode::Refused);
+    }
+    EXPECT_EQ(contentOf(file), newer);
 }
 
 TEST_F(StoreFile, DamageIsReportedAndNothingIsChanged) {
     makeStore(20000);
-    const auto whole = bytes();
+    const auto whole = contentOf(file);
     std::filesystem::resize_file(file, whole.size() / 2);
     EXPECT_EQ(refusal(), VSErrorCode::Corrupt);
-    EXPECT_EQ(bytes(), whole.substr(0, whole.size() / 2));
+    EXPECT_EQ(contentOf(file), whole.substr(0, whole.size() / 2));
 
     // Broken pages: the store opens, what reads them says so, and the check finds them.
     std::string broken = whole;
@@ -166,30 +154,7 @@ TEST_F(StoreFile, ReadOnlyReadsAndRefusesToWrite) {
     EXPECT_FALSE(store->beginImport("x").ok());
 }
 
-TEST_F(StoreFile, AFullDiskFailsTheSaveAndHurtsNothing) {
-    const auto store = openStore(folder.path());
-    EXPECT_OK(store->saveObjectsAndWait({quantity(heartRate(), 1, "2020-03-01", "2020-03-01")}));
-    std::vector<VSSamplePtr> many;
-    for (int i = 0; i < 50000; ++i)
-        many.push_back(quantity(heartRate(), i, date("2020-03-01") + std::chrono::seconds(i),
-                                date("2020-03-01") + std::chrono::seconds(i)));
-
-    signal(SIGXFSZ, SIG_IGN);
-    rlimit before{};
-    ASSERT_EQ(getrlimit(RLIMIT_FSIZE, &before), 0);
-    rlimit small = before;
-    small.rlim_cur = 1 << 20;
-    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &small), 0);
-    const VSStatus full = store->saveObjectsAndWait(many);
-    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &before), 0);
-    ASSERT_FALSE(full.ok());
-    EXPECT_EQ(full.error().code, VSErrorCode::DiskFull) << full.error().message;
-    EXPECT_EQ(allSamples(*store, heartRate()).size(), 1u);
-    EXPECT_OK(store->saveObjectsAndWait(many));
-    EXPECT_EQ(allSamples(*store, heartRate()).size(), 50001u);
-    expectSound(*store);
-}
-
+/// Other processes are told in the same way as other connections of this one.
 TEST_F(StoreFile, AnotherConnectionSeesAndHearsOfChanges) {
     Log<bool> told;
     const auto writing = openStore(folder.path()), watching = openStore(folder.path());
@@ -210,45 +175,4 @@ TEST_F(StoreFile, AnotherConnectionSeesAndHearsOfChanges) {
     }
     EXPECT_EQ(writing->sourceSummaries()->size(), 2u);
     expectSound(*writing);
-}
-
-TEST_F(StoreFile, AnotherProcessIsHeardOf) {
-    Child child([this](const auto& say, const auto& listen) {
-        listen();
-        const auto store = openStore(folder.path());
-        if (store->saveObjectsAndWait({quantity(heartRate(), 1, "2020-03-01", "2020-03-01")}).ok()) say('+');
-    });
-    {
-        Log<size_t> told;
-        const auto store = openStore(folder.path());
-        store->executeQuery(
-            std::make_shared<VSObserverQuery>(heartRate(), VSPredicate(), [&](const auto&) { told.add(0); }));
-        ASSERT_TRUE(told.waitFor(1));
-        child.tell();
-        EXPECT_TRUE(child.hear());
-        EXPECT_TRUE(told.waitFor(2));
-        EXPECT_EQ(allSamples(*store, heartRate()).size(), 1u);
-    }
-}
-
-TEST_F(StoreFile, AKilledImportLeavesNoTrace) {
-    makeStore();
-    Child child([this](const auto& say, const auto& listen) {
-        const auto store = openStore(folder.path());
-        auto transaction = store->beginImport("killed");
-        for (int i = 0; i < 60000; ++i)
-            if (!(*transaction)
-                     ->add(*quantity(steps(), i, date("2020-03-01") + std::chrono::minutes(i),
-                                     date("2020-03-01") + std::chrono::minutes(i + 1), from("New")))
-                     .ok())
-                _exit(3);
-        say('+');
-        listen();
-    });
-    ASSERT_TRUE(child.hear());
-    child.kill();
-    const auto store = openStore(folder.path());
-    EXPECT_TRUE(allSamples(*store, steps()).empty());
-    EXPECT_EQ(store->sourceSummaries()->size(), 1u);
-    expectSound(*store);
 }

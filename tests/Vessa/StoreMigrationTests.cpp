@@ -4,7 +4,6 @@
 #include <sys/inotify.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <csignal>
@@ -33,10 +32,6 @@ struct StoreMigration : testing::Test {
 
     void SetUp() override { fs::copy_file(stored, file); }
 
-    static std::string bytes(const fs::path& path) {
-        std::ifstream stream(path, std::ios::binary);
-        return {std::istreambuf_iterator<char>(stream), {}};
-    }
     static VSDatabase open(const fs::path& path) { return {path, VSDatabase::Mode::Write, VSDuration(0)}; }
     static void change(const fs::path& path, const char* sql) { open(path).execute(sql); }
     static std::vector<std::string> texts(VSDatabase& database, const std::string& sql) {
@@ -45,22 +40,9 @@ struct StoreMigration : testing::Test {
         while (rows.step()) result.push_back(rows.text(0));
         return result;
     }
-    /// Every table that both have holds the same rows; but not the rollups, whose form may differ.
+    /// All but the rollups, whose form may differ.
     static void expectSameContent(const fs::path& a, const fs::path& b) {
-        VSDatabase database = open(a);
-        database.execute(("ATTACH '" + b.string() + "' AS other").c_str());
-        const auto tables = texts(database,
-                                  "SELECT name FROM main.sqlite_master WHERE type = 'table' AND "
-                                  "name NOT IN ('rollups', 'batches', 'sqlite_sequence') AND name "
-                                  "IN (SELECT name FROM other.sqlite_master)");
-        EXPECT_GE(tables.size(), 16u);
-        for (const auto& table : tables) {
-            for (const auto& [x, y] : {std::pair("main.", "other."), std::pair("other.", "main.")})
-                EXPECT_EQ(database.integer("SELECT count(*) FROM (SELECT * FROM " + (x + table) +
-                                           " EXCEPT SELECT * FROM " + (y + table) + ")"),
-                          0)
-                    << table;
-        }
+        EXPECT_GE(expectSameRows(a, b, {"rollups", "batches", "sqlite_sequence"}), 16);
     }
     std::vector<std::string> copies() const {
         std::vector<std::string> names;
@@ -80,13 +62,6 @@ struct StoreMigration : testing::Test {
         }
         EXPECT_EQ(open(file).integer("PRAGMA user_version"), VSStoreSchema::currentVersion);
         expectSameContent(stored, file);
-    }
-    template <typename Block>
-    static pid_t start(Block block) {
-        const pid_t process = fork();
-        if (process != 0) return process;
-        block();
-        _exit(0);
     }
 };
 
@@ -126,7 +101,7 @@ TEST_F(StoreMigration, KeepsACompleteCopyUnderANameOfItsOwn) {
     std::ofstream(folder.path() / "vessa.version-1.sqlite") << "mine";
     expectSound(*openStore(folder.path()));
     EXPECT_EQ(copies(), (std::vector<std::string>{"vessa.version-1.2.sqlite", "vessa.version-1.sqlite"}));
-    EXPECT_EQ(bytes(folder.path() / "vessa.version-1.sqlite"), "mine");
+    EXPECT_EQ(contentOf(folder.path() / "vessa.version-1.sqlite"), "mine");
     const fs::path copy = folder.path() / "vessa.version-1.2.sqlite";
     struct stat status {};
     ASSERT_EQ(stat(copy.c_str(), &status), 0);
@@ -140,7 +115,7 @@ TEST_F(StoreMigration, KeepsACompleteCopyUnderANameOfItsOwn) {
 }
 
 TEST_F(StoreMigration, IsNotForReadersAndNotWhileAnotherProgramIsIn) {
-    const std::string before = bytes(file);
+    const std::string before = contentOf(file);
     VSHealthStore::Options options;
     options.readOnly = true;
     const auto reading = VSHealthStore::open(folder.path(), options);
@@ -159,31 +134,22 @@ TEST_F(StoreMigration, IsNotForReadersAndNotWhileAnotherProgramIsIn) {
         EXPECT_EQ(other.integer("PRAGMA user_version"), 1);
     }
     EXPECT_EQ(copies(), std::vector<std::string>());
-    EXPECT_EQ(bytes(file), before);
+    EXPECT_EQ(contentOf(file), before);
     expectMigrated();
 }
 
 TEST_F(StoreMigration, IsDoneOnceByProcessesThatOpenAtTheSameTime) {
-    int gate[2];
-    ASSERT_EQ(pipe2(gate, O_CLOEXEC), 0);
-    std::vector<pid_t> processes;
+    std::vector<std::unique_ptr<Child>> processes;
     for (int i = 0; i < 4; ++i)
-        processes.push_back(start([&] {
-            close(gate[1]);
-            char word;
-            if (read(gate[0], &word, 1) != 0) _exit(1);
+        processes.push_back(std::make_unique<Child>([this](const auto& say, const auto& listen) {
+            listen();
             const auto store = VSHealthStore::open(folder.path());
-            if (!store ||
-                !(*store)->saveObjectsAndWait({quantity(heartRate(), 1, "2020-04-01", "2020-04-01")}))
-                _exit(1);
+            if (store && (*store)->saveObjectsAndWait({quantity(heartRate(), 1, "2020-04-01", "2020-04-01")}))
+                say('+');
         }));
-    close(gate[1]);  // now all go
-    for (const pid_t process : processes) {
-        int status = 0;
-        waitpid(process, &status, 0);
-        EXPECT_EQ(status, 0);
-    }
-    close(gate[0]);
+    for (const auto& process : processes) process->tell();
+    for (const auto& process : processes) EXPECT_TRUE(process->hear());
+    processes.clear();
     EXPECT_EQ(copies(), (std::vector<std::string>{"vessa.version-1.sqlite"}));
     const auto store = openStore(folder.path());
     EXPECT_EQ(allSamples(*store, heartRate()).size(), 5u);
@@ -266,7 +232,7 @@ TEST_F(StoreMigration, OnABrokenDiskNeverReplacesTheOldStoreWithoutItsCopy) {
 }
 
 TEST_F(StoreMigration, WithoutRoomChangesNothing) {
-    const std::string before = bytes(file);
+    const std::string before = contentOf(file);
     signal(SIGXFSZ, SIG_IGN);
     rlimit unlimited{};
     ASSERT_EQ(getrlimit(RLIMIT_FSIZE, &unlimited), 0);
@@ -281,16 +247,16 @@ TEST_F(StoreMigration, WithoutRoomChangesNothing) {
         ++refused;
         EXPECT_EQ(store.error().code, VSErrorCode::DiskFull) << store.error().message;
         EXPECT_EQ(copies(), std::vector<std::string>());
-        EXPECT_EQ(bytes(file), before);
+        EXPECT_EQ(contentOf(file), before);
     }
     EXPECT_GT(refused, 3);
 
     // The same after the copy was made: something in the way of a step.
     change(file, "CREATE TABLE authorizations(a)");
-    const std::string odd = bytes(file);
+    const std::string odd = contentOf(file);
     EXPECT_FALSE(VSHealthStore::open(folder.path()).ok());
     EXPECT_EQ(copies(), std::vector<std::string>());
-    EXPECT_EQ(bytes(file), odd);
+    EXPECT_EQ(contentOf(file), odd);
     change(file, "DROP TABLE authorizations");
     expectMigrated();
 }
@@ -306,7 +272,7 @@ TEST_F(StoreMigration, KilledAtAnyMomentIsDoneAtTheNextOpening) {
         ASSERT_GE(inotify_add_watch(events, folder.path().c_str(),
                                     IN_CREATE | IN_MODIFY | IN_MOVED_TO | IN_DELETE | IN_CLOSE_WRITE),
                   0);
-        const pid_t process = start([this] {
+        Child process([this](const auto&, const auto&) {
             (void)VSHealthStore::open(folder.path());
             // Told in its own way that it got to its end.
             std::ofstream(folder.path() / "done");
@@ -322,8 +288,7 @@ TEST_F(StoreMigration, KilledAtAnyMomentIsDoneAtTheNextOpening) {
                 if (event->len && std::string(event->name) == "done") finished = true;
             }
         }
-        kill(process, SIGKILL);
-        waitpid(process, nullptr, 0);
+        process.kill();
         close(events);
         fs::remove(folder.path() / "done");
         expectMigrated();

@@ -9,21 +9,13 @@ using namespace test;
 
 namespace {
 
-struct StoreQueries : testing::Test {
-    FixedEnvironment environment;
-    TemporaryFolder folder;
-    std::shared_ptr<VSHealthStore> store = openStore(folder.path());
-
+struct StoreQueries : StoreTest {
+    using StoreTest::save;
     void save(double value, const std::string& start, const std::string& end = "",
               const VSObjectType* of = heartRate(), VSProvenance provenance = {}) {
-        EXPECT_OK(store->saveObjectsAndWait(
-            {quantity(of, value, start, end.empty() ? start : end, std::move(provenance))}));
+        save({quantity(of, value, start, end.empty() ? start : end, std::move(provenance))});
     }
 };
-
-double valueOf(const VSSamplePtr& sample) {
-    return dynamic_cast<const VSQuantitySample&>(*sample).quantity().value();
-}
 
 std::vector<double> valuesOf(const std::vector<VSSamplePtr>& samples) {
     std::vector<double> values;
@@ -54,7 +46,7 @@ TEST_F(StoreQueries, AgreesWithFilteringEverything) {
         objects.push_back(quantity(steps(), static_cast<double>(pick(0, 50)), start, end,
                                    pick(0, 5) == 0 ? tagged : provenances[static_cast<size_t>(pick(0, 2))]));
     }
-    EXPECT_OK(store->saveObjectsAndWait(objects));
+    save(objects);
     const auto all = allSamples(*store, steps());
     ASSERT_EQ(all.size(), objects.size());
 
@@ -123,7 +115,7 @@ TEST_F(StoreQueries, ObserverFiresAtItsStartAndAfterChangesOfItsTypeOnly) {
     save(100, "2020-03-01T08:00", "", steps());  // another type
     save(61, "2020-03-01T08:01");
     ASSERT_TRUE(told.waitFor(2));
-    EXPECT_OK(wait([&](auto done) { store->deleteObject(allSamples(*store, heartRate())[0], done); }));
+    EXPECT_OK(remove({allSamples(*store, heartRate())[0]}));
     ASSERT_TRUE(told.waitFor(3));
     store->stopQuery(query);
     // A change after the stop is not told: a second observer, which hears of it, shows that there was time
@@ -142,19 +134,12 @@ TEST_F(StoreQueries, ObserverFiresAtItsStartAndAfterChangesOfItsTypeOnly) {
 TEST_F(StoreQueries, AnchoredQueryTellsEachChangeOnce) {
     for (int i = 0; i < 5; ++i) save(i, "2020-03-01T08:0" + std::to_string(i));
     using Answer = VSAnchoredObjectQuery::Answer;
-    const auto ask = [&](VSQueryAnchor anchor, int limit) {
-        Promise<VSResult<Answer>> promise;
-        store->executeQuery(std::make_shared<VSAnchoredObjectQuery>(heartRate(), VSPredicate(), anchor, limit,
-                                                                    [&](const auto& a) { promise.set(a); }));
-        return *promise.wait().value();
+    const auto since = [&](VSQueryAnchor anchor) {
+        return *ask<Answer>([&](auto handler) {
+            return std::make_shared<VSAnchoredObjectQuery>(heartRate(), VSPredicate(), anchor, 0, handler);
+        });
     };
-    const Answer first = ask({0}, 2), second = ask(first.anchor, 2), third = ask(second.anchor, 2),
-                 none = ask(third.anchor, 2);
-    EXPECT_EQ(valuesOf(first.added), (std::vector<double>{0, 1}));
-    EXPECT_EQ(valuesOf(second.added), (std::vector<double>{2, 3}));
-    EXPECT_EQ(valuesOf(third.added), (std::vector<double>{4}));
-    EXPECT_TRUE(none.added.empty() && none.deleted.empty());
-
+    const VSQueryAnchor seen = since({0}).anchor;
     Log<Answer> live;
     auto query = std::make_shared<VSAnchoredObjectQuery>(
         heartRate(), VSPredicate(), VSQueryAnchor::beyondAll(), 0, [&](const auto& a) { live.add(*a); });
@@ -165,7 +150,7 @@ TEST_F(StoreQueries, AnchoredQueryTellsEachChangeOnce) {
     const auto gone = allSamples(*store, heartRate()).at(1);
     save(9, "2020-03-01T09:00");
     ASSERT_TRUE(live.waitFor(2));
-    EXPECT_OK(wait([&](auto done) { store->deleteObject(gone, done); }));
+    EXPECT_OK(remove({gone}));
     ASSERT_TRUE(live.waitFor(3));
     EXPECT_EQ(valuesOf(live.entries()[1].added), (std::vector<double>{9}));
     ASSERT_EQ(live.entries()[2].deleted.size(), 1u);
@@ -174,60 +159,23 @@ TEST_F(StoreQueries, AnchoredQueryTellsEachChangeOnce) {
     store->stopQuery(query);
 
     // Who saw the object hears that it went; who never saw it does not.
-    const Answer since = ask(third.anchor, 0);
-    EXPECT_EQ(valuesOf(since.added), (std::vector<double>{9}));
-    EXPECT_EQ(since.deleted.size(), 1u);
-    EXPECT_TRUE(ask({0}, 0).deleted.empty());
+    EXPECT_EQ(valuesOf(since(seen).added), (std::vector<double>{9}));
+    EXPECT_EQ(since(seen).deleted.size(), 1u);
+    EXPECT_TRUE(since({0}).deleted.empty());
     store.reset();  // before what its handlers use
 }
 
-TEST_F(StoreQueries, NumbersAreNeverUsedAgain) {
-    save(1, "2020-03-01T08:00");
-    const auto old = allSamples(*store, heartRate()).at(0);
-    EXPECT_OK(wait([&](auto done) { store->deleteObject(old, done); }));
-    store.reset();
-    store = openStore(folder.path());
-    save(2, "2020-03-01T08:00");
-    EXPECT_GT(allSamples(*store, heartRate()).at(0)->dataID(), old->dataID());
-    const VSStatus status = wait([&](auto done) { store->deleteObject(old, done); });
-    EXPECT_FALSE(status.ok());
-}
-
-TEST_F(StoreQueries, CollectionFollowsChanges) {
-    save(100, "2020-03-01T08:00", "2020-03-01T09:00", steps());
-    Log<std::vector<double>> told;
-    const auto tell = [&](const auto& result) {
-        std::vector<double> sums;
-        for (const auto& bucket : (*result)->statistics()) sums.push_back(*bucket.sum);
-        told.add(sums);
-    };
-    auto query = std::make_shared<VSStatisticsCollectionQuery>(
-        steps(), VSPredicate::samplesWithStartDate(date("2020-03-01"), date("2020-03-08"), 0),
-        VSStatisticsOptionCumulativeSum, date("2020-03-01"), VSDateComponents{0, 0, 1, 0, 0, 0});
-    query->initialResultsHandler = tell;
-    query->statisticsUpdateHandler = tell;
-    store->executeQuery(query);
-    ASSERT_TRUE(told.waitFor(1));
-    save(40, "2020-03-02T23:00", "2020-03-03T01:00", steps());
-    ASSERT_TRUE(told.waitFor(2));
-    EXPECT_EQ(told.entries()[0], (std::vector<double>{100}));
-    EXPECT_EQ(told.entries()[1], (std::vector<double>{100, 20, 20}));
-    store.reset();  // before what its handlers use
-}
-
-/// Whole-second spans that rollups, partial edges and single samples answer: see StoreStatisticsTests for the
-/// definition.
 TEST_F(StoreQueries, StatisticsAnswerOnce) {
     save(60, "2020-03-01T08:00");
     save(80, "2020-03-01T10:00");
-    Promise<VSResult<VSStatistics>> promise;
-    store->executeQuery(std::make_shared<VSStatisticsQuery>(
-        heartRate(), VSPredicate(), VSStatisticsOptionDiscreteAverage | VSStatisticsOptionDiscreteMax,
-        [&](const auto& result) { promise.set(result); }));
-    const auto answer = promise.wait();
-    EXPECT_EQ((*answer)->average, 70);
-    EXPECT_EQ((*answer)->maximum, 80);
-    EXPECT_FALSE((*answer)->minimum || (*answer)->sum) << "not asked for";
+    const auto answer = ask<VSStatistics>([](auto handler) {
+        return std::make_shared<VSStatisticsQuery>(
+            heartRate(), VSPredicate(), VSStatisticsOptionDiscreteAverage | VSStatisticsOptionDiscreteMax,
+            handler);
+    });
+    EXPECT_EQ(answer->average, 70);
+    EXPECT_EQ(answer->maximum, 80);
+    EXPECT_FALSE(answer->minimum || answer->sum) << "not asked for";
     const auto empty = store->statistics(
         heartRate(), VSPredicate::samplesWithStartDate(date("2020-04-01"), std::nullopt, 0), 30);
     EXPECT_FALSE(empty->hasData());
@@ -245,13 +193,10 @@ TEST_F(StoreQueries, SourcesStandInTheirOrder) {
     save(1, "2020-03-01T08:00", "", steps(), from("Old"));
     save(1, "2020-03-05T08:00", "", steps());
     const auto order = [&] {
-        Promise<std::vector<std::string>> promise;
-        store->orderedSources(steps(), [&](const auto& result) {
-            std::vector<std::string> names;
-            for (const auto& source : *result) names.push_back(source.isApplication() ? "own" : source.name);
-            promise.set(names);
-        });
-        return *promise.wait();
+        std::vector<std::string> names;
+        for (const auto& source : sourceOrderOf(*store, steps()))
+            names.push_back(source.isApplication() ? "own" : source.name);
+        return names;
     };
     EXPECT_EQ(order(), (std::vector<std::string>{"own", "Old", "Young"}));
     EXPECT_OK(wait([&](auto done) {
@@ -266,11 +211,11 @@ TEST_F(StoreQueries, SourcesStandInTheirOrder) {
     EXPECT_EQ(order(), (std::vector<std::string>{"New", "Old", "Young", "own"})) << "the user chose";
     expectSound(*store);
 
-    Promise<size_t> sources;
-    store->executeQuery(std::make_shared<VSSourceQuery>(
-        steps(), VSPredicate::samplesWithStartDate(date("2020-03-02"), std::nullopt, 0),
-        [&](const auto& result) { sources.set(result->size()); }));
-    EXPECT_EQ(sources.wait(), 2u);
+    const auto sources = ask<std::vector<VSSource>>([](auto handler) {
+        return std::make_shared<VSSourceQuery>(
+            steps(), VSPredicate::samplesWithStartDate(date("2020-03-02"), std::nullopt, 0), handler);
+    });
+    EXPECT_EQ(sources->size(), 2u);
 }
 
 TEST_F(StoreQueries, TheStoreMayEndInAHandler) {

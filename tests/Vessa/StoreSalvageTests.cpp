@@ -14,55 +14,11 @@ using namespace test;
 
 namespace {
 
-std::string read(const std::filesystem::path& file) {
-    std::ifstream stream(file, std::ios::binary);
-    return {std::istreambuf_iterator<char>(stream), {}};
-}
 void write(const std::filesystem::path& file, const std::string& bytes) {
     std::ofstream(file, std::ios::binary) << bytes;
 }
 
-/// What one sample says; `origin` is what other tables say of it.
-struct Said {
-    std::string content, origin;
-    friend bool operator==(const Said&, const Said&) = default;
-};
-
-Said saidBy(const VSSample& sample) {
-    Said said;
-    said.content = sample.sampleType()->identifier() + " " +
-                   std::to_string(sample.startDate().microseconds()) + " " +
-                   std::to_string(sample.endDate().microseconds()) + " " +
-                   std::to_string(sample.creationDate()->microseconds());
-    if (const auto* quantity = dynamic_cast<const VSQuantitySample*>(&sample))
-        said.content += " " + std::to_string(quantity->quantity().value());
-    if (const auto* category = dynamic_cast<const VSCategorySample*>(&sample))
-        said.content += " " + std::to_string(category->value());
-    if (const auto* workout = dynamic_cast<const VSWorkout*>(&sample)) {
-        said.content += " " + std::to_string(workout->workoutActivityType());
-        said.origin += std::to_string(workout->duration().count()) + " " +
-                       std::to_string(workout->workoutEvents().size()) + " ";
-    }
-    if (const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample))
-        said.origin += std::to_string(correlation->objects().size()) + " ";
-    said.origin += sample.sourceRevision().source.name + " " + sample.sourceRevision().version + " " +
-                   (sample.device() ? sample.device()->description() : "") + " " +
-                   VSValue(sample.metadata()).serialized();
-    return said;
-}
-
 using Contents = std::map<int64_t, Said>;
-
-/// All samples of a store by number.
-Contents contentsOf(VSHealthStore& store) {
-    Contents contents;
-    for (const VSObjectType* type : VSObjectType::allTypes()) {
-        if (!type->isSampleType()) continue;
-        for (const VSSamplePtr& sample : allSamples(store, type))
-            contents[VSObjectIDValue(sample->dataID())] = saidBy(*sample);
-    }
-    return contents;
-}
 
 /// A store with something in every table, some of it on several pages.
 void fill(VSHealthStore& store) {
@@ -86,11 +42,7 @@ void fill(VSHealthStore& store) {
                    37, date("2020-03-02T10:00"), date("2020-03-02T11:00"), VSDuration(0),
                    VSQuantity(VSUnit::kilocalorieUnit(), 300), std::nullopt,
                    std::vector<VSWorkoutEvent>{{1, date("2020-03-02T10:10")}, {2, date("2020-03-02T10:20")}}),
-               std::make_shared<VSCorrelation>(
-                   type(VSCode::BloodPressure), date("2020-03-02"), date("2020-03-02"),
-                   std::vector<VSSamplePtr>{
-                       quantity(type(VSCode::BloodPressureSystolic), 120, "2020-03-02", "2020-03-02"),
-                       quantity(type(VSCode::BloodPressureDiastolic), 80, "2020-03-02", "2020-03-02")})};
+               bloodPressure(120, 80, date("2020-03-02"))};
     EXPECT_OK(store.saveObjectsAndWait(samples));
     auto import = store.beginImport("document");
     ASSERT_TRUE(import.ok());
@@ -131,7 +83,7 @@ struct StoreSalvage : testing::Test {
             fill(*store);
             contents = contentsOf(*store);
         }
-        bytes = read(wholeFile);
+        bytes = contentOf(wholeFile);
         {
             VSDatabase database(wholeFile, VSDatabase::Mode::Read, VSDuration(0));
             auto rows = database.use("SELECT pageno, name FROM dbstat");
@@ -157,7 +109,7 @@ struct StoreSalvage : testing::Test {
         write(from.path() / "vessa.sqlite", damaged);
         const auto target = parent.path() / "new";
         const auto report = VSHealthStore::salvage(from.path(), target);
-        EXPECT_EQ(read(from.path() / "vessa.sqlite"), damaged) << "the damaged file is never changed";
+        EXPECT_EQ(contentOf(from.path() / "vessa.sqlite"), damaged) << "the damaged file is never changed";
         Outcome outcome;
         if (!report) {
             ADD_FAILURE() << report.error().message;
@@ -183,7 +135,7 @@ struct StoreSalvage : testing::Test {
                 return;
             }
             EXPECT_EQ(there->second.content, said.content);
-            if (!originMayDiffer && !said.content.starts_with("VSCorrelation")) {
+            if (!originMayDiffer && said.content.find("VSCorrelation") == std::string::npos) {
                 EXPECT_EQ(there->second.origin, said.origin);
             }
         }
@@ -202,20 +154,7 @@ TEST_F(StoreSalvage, OfASoundStoreIsACopy) {
     EXPECT_EQ(contentsOf(*after), contents);
     expectSound(*after);
     // Row for row; what follows from the samples may stand in another order only.
-    VSDatabase old(wholeFile, VSDatabase::Mode::Write, VSDuration(0));
-    old.execute(("ATTACH '" + (parent.path() / "new" / "vessa.sqlite").string() + "' AS made").c_str());
-    auto names = old.use("SELECT name FROM main.sqlite_master WHERE type = 'table'");
-    int tablesSeen = 0;
-    while (names.step()) {
-        const std::string name = names.text(0);
-        auto differing =
-            old.use("SELECT count(*) FROM (SELECT * FROM main." + name + " EXCEPT SELECT * FROM made." +
-                    name + ") UNION ALL SELECT count(*) FROM (SELECT * FROM made." + name +
-                    " EXCEPT SELECT * FROM main." + name + ")");
-        while (differing.step()) EXPECT_EQ(differing.integer(0), 0) << name;
-        ++tablesSeen;
-    }
-    EXPECT_GT(tablesSeen, 20);
+    EXPECT_GT(expectSameRows(wholeFile, parent.path() / "new" / "vessa.sqlite"), 20);
 }
 
 TEST_F(StoreSalvage, ABrokenPageCostsWhatWasOnIt) {
@@ -293,14 +232,14 @@ TEST_F(StoreSalvage, WhatIsStillInTheLogIsThere) {
         both = contentsOf(*store);
         std::filesystem::copy(live.path(), killed.path(), std::filesystem::copy_options::recursive);
     }
-    ASSERT_GT(read(killed.path() / "vessa.sqlite-wal").size(), 0u);
-    const auto log = read(killed.path() / "vessa.sqlite-wal");
+    ASSERT_GT(contentOf(killed.path() / "vessa.sqlite-wal").size(), 0u);
+    const auto log = contentOf(killed.path() / "vessa.sqlite-wal");
     for (const bool headLost : {false, true}) {
         if (headLost) write(killed.path() / "vessa.sqlite", std::string(4096, '\0') + bytes.substr(4096));
         const auto target = parent.path() / (headLost ? "b" : "a");
         const auto report = VSHealthStore::salvage(killed.path(), target);
         ASSERT_TRUE(report.ok()) << report.error().message;
-        EXPECT_EQ(read(killed.path() / "vessa.sqlite-wal"), log);
+        EXPECT_EQ(contentOf(killed.path() / "vessa.sqlite-wal"), log);
         const auto store = openStore(target);
         EXPECT_EQ(contentsOf(*store), both);
         expectSound(*store);

@@ -82,45 +82,6 @@ TEST(StoreStatistics, AgreeWithTheDefinition) {
     }
 }
 
-TEST(StoreStatistics, TwoSourcesOfTheSameStepsCountOnce) {
-    FixedEnvironment environment;
-    TemporaryFolder folder;
-    const auto store = openStore(folder.path());
-    EXPECT_OK(store->saveObjectsAndWait({
-        quantity(steps(), 1000, "2020-03-01T10:00", "2020-03-01T11:00", from("Phone")),
-        quantity(steps(), 1200, "2020-03-01T10:30", "2020-03-01T11:30", from("Watch")),
-        quantity(steps(), 7, "2020-03-01T10:59:59", "2020-03-01T10:59:59",
-                 from("Watch")),  // its moment is the phone's
-        quantity(steps(), 5, "2020-03-01T11:00", "2020-03-01T11:00",
-                 from("Watch")),  // the phone's span ends before it
-    }));
-    const auto statistics =
-        store->statistics(steps(), {}, VSStatisticsOptionCumulativeSum | VSStatisticsOptionSeparateBySource);
-    EXPECT_EQ(statistics->sum, 1000 + 600 + 5);
-    EXPECT_EQ(statistics->bySource.at(VSSource::forImportedName("Watch")).sum, 1212);
-    EXPECT_OK(wait(
-        [&](auto done) { store->setOrderedSources({VSSource::forImportedName("Watch")}, steps(), done); }));
-    EXPECT_EQ(store->statistics(steps(), {}, VSStatisticsOptionCumulativeSum)->sum, 1212 + 500);
-}
-
-/// Local days of a zone whose offset was not whole quarters then.
-TEST(StoreStatistics, BordersInsideOfAQuarterAreExact) {
-    FixedEnvironment environment("1930-06-03T12:00", "Africa/Monrovia");  // 44 minutes 30 seconds behind
-    TemporaryFolder folder;
-    const auto store = openStore(folder.path());
-    const VSDate midnight = date("1930-06-02");
-    ASSERT_NE(midnight.microseconds() % (900 * 1'000'000), 0);
-    const auto second = std::chrono::seconds(1);
-    EXPECT_OK(store->saveObjectsAndWait({quantity(heartRate(), 50, midnight - second, midnight - second),
-                                         quantity(heartRate(), 70, midnight, midnight),
-                                         quantity(heartRate(), 90, midnight + second, midnight + second)}));
-    const auto days = store->statisticsCollection(heartRate(), {}, VSStatisticsOptionDiscreteAverage,
-                                                  midnight, {0, 0, 1, 0, 0, 0});
-    ASSERT_EQ((*days)->statistics().size(), 2u);
-    EXPECT_EQ((*days)->statistics()[0].average, 50);
-    EXPECT_EQ((*days)->statistics()[1].average, 80);
-}
-
 TEST(StoreStatistics, ConditionsSelectTheSamplesThatExist) {
     FixedEnvironment environment;
     TemporaryFolder folder;

@@ -29,25 +29,4 @@ TEST(VSWorkout, DurationLeavesThePausesOut) {
     EXPECT_EQ(durationOf({pause(10)}, minutes(33)), minutes(33)) << "given";
 }
 
-TEST(VSSample, WithoutProvenanceItIsThisApplications) {
-    const VSCategorySample sample(VSObjectType::dataTypeWithCode(VSCode::SleepAnalysis), 1, kStart, kStart);
-    EXPECT_TRUE(sample.sourceRevision().source.isApplication());
-    EXPECT_TRUE(sample.metadata().empty());
-    EXPECT_EQ(sample.device(), nullptr);
-    EXPECT_FALSE(sample.creationDate());
-    EXPECT_EQ(VSObjectIDValue(sample.dataID()), 0);
-}
-
-TEST(VSWorkout, IsOfTheWorkoutTypeAndKeepsWhatItWasGiven) {
-    VSProvenance provenance;
-    provenance.metadata = std::make_shared<VSMetadata>(VSMetadata{{VSMetadataKeyWasUserEntered, true}});
-    const VSWorkout workout(13, kStart, kStart + minutes(5), {}, VSQuantity(VSUnit::kilocalorieUnit(), 250),
-                            VSQuantity(VSUnit::mileUnit(), 3), {}, provenance, VSObjectID{4});
-    EXPECT_EQ(workout.sampleType(), VSObjectType::workoutType());
-    EXPECT_EQ(workout.totalDistance()->doubleValueForUnit(VSUnit::fromString("m")), 4828.032);
-    EXPECT_EQ(workout.totalEnergyBurned()->value(), 250);
-    EXPECT_EQ(workout.metadata().at(VSMetadataKeyWasUserEntered), VSValue(true));
-    EXPECT_EQ(VSObjectIDValue(workout.dataID()), 4);
-}
-
 }  // namespace

@@ -10,11 +10,11 @@ namespace {
 
 TEST(VSObjectType, EveryCodeIsATypeOrReserved) {
     const std::set<int> reserved(VSReservedTypeCodes().begin(), VSReservedTypeCodes().end());
-    for (int code = 0; code <= 98; ++code)
-        EXPECT_NE(VSObjectType::dataTypeWithCode(code) != nullptr, reserved.contains(code)) << code;
-    EXPECT_EQ(VSObjectType::dataTypeWithCode(-1), nullptr);
-    EXPECT_EQ(VSObjectType::dataTypeWithCode(99), nullptr);
     int last = -1;
+    for (int code = -1; code <= 99; ++code) {
+        const auto* type = VSObjectType::dataTypeWithCode(code);
+        EXPECT_EQ(type != nullptr, code >= 0 && code <= 98 && !reserved.contains(code)) << code;
+    }
     for (const VSObjectType* type : VSObjectType::allTypes()) {
         EXPECT_GT(VSTypeCodeValue(type->code()), last);
         last = VSTypeCodeValue(type->code());
@@ -38,15 +38,15 @@ TEST(VSObjectType, EveryTypeIsFoundByItsIdentifiersAndNoOther) {
                   type->kind() == VSTypeKind::Characteristic ? type : nullptr);
         EXPECT_EQ(type->isSampleType(), type->kind() != VSTypeKind::Characteristic);
     }
-    EXPECT_EQ(VSObjectType::dataTypeWithCode(VSCode::HeartRate)->identifier(),
-              "VSQuantityTypeIdentifierHeartRate");
-    EXPECT_EQ(VSObjectType::dataTypeWithCode(VSCode::SleepAnalysis)->identifier(),
-              "VSCategoryTypeIdentifierSleepAnalysis");
-    EXPECT_EQ(VSObjectType::dataTypeWithCode(VSCode::BloodPressure)->identifier(),
-              "VSCorrelationTypeIdentifierBloodPressure");
-    EXPECT_EQ(VSObjectType::dataTypeWithCode(VSCode::DateOfBirth)->identifier(),
-              "VSCharacteristicTypeIdentifierDateOfBirth");
-    EXPECT_EQ(VSObjectType::workoutType()->identifier(), "VSWorkoutTypeIdentifier");
+    const std::pair<VSTypeCode, const char*> identifiers[] = {
+        {VSCode::HeartRate, "VSQuantityTypeIdentifierHeartRate"},
+        {VSCode::SleepAnalysis, "VSCategoryTypeIdentifierSleepAnalysis"},
+        {VSCode::BloodPressure, "VSCorrelationTypeIdentifierBloodPressure"},
+        {VSCode::DateOfBirth, "VSCharacteristicTypeIdentifierDateOfBirth"},
+        {VSCode::Workout, "VSWorkoutTypeIdentifier"}};
+    for (const auto& [code, identifier] : identifiers)
+        EXPECT_EQ(VSObjectType::dataTypeWithCode(code)->identifier(), identifier);
+    EXPECT_EQ(VSObjectType::workoutType(), VSObjectType::dataTypeWithCode(VSCode::Workout));
     for (const char* none : {"", "heartrate", "VSQuantityTypeIdentifier",
                              "VSQuantityTypeIdentifierSleepAnalysis", "VSQuantityTypeIdentifierHeartRate "})
         EXPECT_EQ(VSObjectType::typeForIdentifier(none), nullptr) << none;
@@ -60,15 +60,6 @@ TEST(VSObjectType, QuantityTypesHaveUnitsThatConvert) {
         EXPECT_EQ(*unit, type->canonicalUnit());
         EXPECT_TRUE(type->enumeratedValues().empty());
     }
-    // What the sums and averages of the screens rest on.
-    for (const auto code : {VSCode::StepCount, VSCode::DistanceWalkingRunning, VSCode::DistanceCycling,
-                            VSCode::ActiveEnergyBurned, VSCode::BasalEnergyBurned, VSCode::FlightsClimbed,
-                            VSCode::NikeFuel, VSCode::DietaryWater, VSCode::DietaryEnergyConsumed})
-        EXPECT_TRUE(VSObjectType::dataTypeWithCode(code)->isCumulative()) << VSTypeCodeValue(code);
-    for (const auto code :
-         {VSCode::BodyMass, VSCode::Height, VSCode::HeartRate, VSCode::BloodGlucose, VSCode::OxygenSaturation,
-          VSCode::BodyTemperature, VSCode::UVExposure, VSCode::SleepAnalysis})
-        EXPECT_FALSE(VSObjectType::dataTypeWithCode(code)->isCumulative()) << VSTypeCodeValue(code);
 }
 
 TEST(VSObjectType, UnitsOfDocuments) {
@@ -90,13 +81,12 @@ TEST(VSObjectType, UnitsOfDocuments) {
 }
 
 TEST(VSObjectType, EnumeratedValuesGoBothWays) {
-    for (const VSObjectType* type : VSObjectType::allTypes())
+    for (const VSObjectType* type : VSObjectType::allTypes()) {
         for (const auto& [value, identifier] : type->enumeratedValues()) {
             ASSERT_NE(type->identifierForValue(value), nullptr);
             EXPECT_EQ(*type->identifierForValue(value), identifier);
             EXPECT_EQ(type->valueForIdentifier(identifier), value);
         }
-    for (const VSObjectType* type : VSObjectType::allTypes()) {
         const bool enumerated = type->isCategoryType() || (type->kind() == VSTypeKind::Characteristic &&
                                                            type->code() != VSCode::DateOfBirth);
         EXPECT_EQ(!type->enumeratedValues().empty(), enumerated) << type->identifier();

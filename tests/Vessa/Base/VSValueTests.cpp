@@ -82,41 +82,15 @@ TEST(VSValue, TheFormOnDiskStaysAsItIs) {
 }
 
 TEST(VSValue, RefusesOtherTexts) {
-    for (const char* text : {"",
-                             "x",
-                             "nul",
-                             "null",
-                             "tru",
-                             "1x",
-                             "1 2",
-                             "-",
-
-                             "+1",
-                             "99999999999999999999",
-                             "\"",
-                             "\"\\q\"",
-                             "\"\\ud800\"",
-                             "\"\\udc00\"",
-                             "\"\\u12\"",
-                             "\"a\nb\"",
-                             "[",
-                             "[1",
-                             "[1,]",
-                             "[1 2]",
-                             "{}",
-                             "{\"a\":1}",
-                             "{\"dict\":1}",
-                             "{\"dict\":{\"a\":1,\"a\":2}}",
-                             "{\"dict\":{\"a\"}}",
-                             "{\"dict\":{}",
-                             "{\"date\":1.5}",
-                             "{\"date\":\"1\"}",
-                             "{\"data\":\"0\"}",
-                             "{\"data\":\"0g\"}",
-                             "{\"data\":\"-1\"}",
-                             "{\"real\":\"NaN\"}",
-                             "{\"dict\":{}}}"})
-        EXPECT_FALSE(VSValue::fromSerialized(text)) << text;
+    // clang-format off
+    const char* const texts[] = {
+        "", "x", "nul", "null", "tru", "1x", "1 2", "-", "+1", "99999999999999999999", "\"", "\"\\q\"",
+        "\"\\ud800\"", "\"\\udc00\"", "\"\\u12\"", "\"a\nb\"", "[", "[1", "[1,]", "[1 2]", "{}",
+        "{\"a\":1}", "{\"dict\":1}", "{\"dict\":{\"a\":1,\"a\":2}}", "{\"dict\":{\"a\"}}",
+        "{\"dict\":{}", "{\"date\":1.5}", "{\"date\":\"1\"}", "{\"data\":\"0\"}", "{\"data\":\"0g\"}",
+        "{\"data\":\"-1\"}", "{\"real\":\"NaN\"}", "{\"dict\":{}}}"};
+    // clang-format on
+    for (const char* text : texts) EXPECT_FALSE(VSValue::fromSerialized(text)) << text;
     EXPECT_FALSE(VSValue::fromSerialized(std::string(100'000, '[')));
 }
 

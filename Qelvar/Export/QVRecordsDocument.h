@@ -1,0 +1,71 @@
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "Qelvar/Export/QVExportText.h"
+#include "Qelvar/Export/QVExportUnits.h"
+#include "Qelvar/Export/QVXMLWriter.h"
+#include "Vessa/VSHealthStore.h"
+#include "Vessa/VSObject.h"
+
+/// What a sample says of its origin, as an export writes it. Samples share their devices, so a device's text
+/// is made once. Used by one thread.
+class QVDeviceTexts {
+ public:
+    /// Empty: no device. Valid until the next call.
+    const std::string& textOf(const VSSample& sample);
+
+ private:
+    std::shared_ptr<const VSDevice> device_;
+    std::string text_;
+};
+
+/// The records document: every record of the store, in the elements that the import reads. Used by one thread
+/// at a time; errors are the writer's.
+class QVRecordsDocument {
+ public:
+    /// Writes into the file, which is there already.
+    QVRecordsDocument(const std::filesystem::path& file, int secondsFromGMT, const QVExportUnits& units);
+
+    /// The declaration and the beginning of the root.
+    void open(const std::string& locale);
+    void writeXMLPersonWithDateOfBirth(VSDate now, const std::optional<VSBirthDate>& dateOfBirth,
+                                       int biologicalSex, int bloodType, int skinType);
+    // One record of each kind.
+    void writeRecord(const VSSample& sample);
+    void writeCorrelation(const VSCorrelation& correlation);
+    void writeWorkout(const VSWorkout& workout);
+    /// Ends the document and closes its file.
+    VSStatus close() { return writer_.finish(); }
+    VSStatus status() const { return writer_.status(); }
+
+ private:
+    /// A value that is absent or empty gives no attribute.
+    struct Value {
+        std::string unit, text;
+        bool present = false;
+    };
+    Value valueOf(const VSSample& sample) const;
+    void writeXMLRecordWithType(const VSSample& sample, const Value& value);
+    void writeXMLCorrelationStartWithType(const VSCorrelation& correlation);
+    void writeXMLCorrelationEnd() { writer_.endElement(); }
+    void writeXMLWorkoutStartWithActivityType(const VSWorkout& workout);
+    void writeXMLWorkoutEventWithEventType(const VSWorkoutEvent& event);
+    void writeXMLWorkoutEnd() { writer_.endElement(); }
+
+    void startElement(const char* name, const VSSample& sample);
+    void writeOrigin(const VSSample& sample);
+    void writeDates(const VSSample& sample);
+    void writeAmount(const char* name, const char* unitName, double amount, const std::string& unit);
+    void writeMetadata(const VSMetadata& metadata);
+    void writeExactValue(const char* attribute, const VSValue& value);
+    void writeExactZero(const char* attribute, const std::optional<VSQuantity>& total);
+    void writeExactText(const char* attribute, const std::string& text);
+
+    QVXMLWriter writer_;
+    QVExportDateFormatter dates_;
+    const QVExportUnits& units_;
+    QVDeviceTexts devices_;
+};

@@ -1,0 +1,109 @@
+#include <gtest/gtest.h>
+#include <signal.h>
+
+#include <cstdlib>
+#include <fstream>
+
+#include "RunProgram.h"
+#include "TestSupport.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+class ExportCommand : public testing::Test {
+ protected:
+    void SetUp() override {
+        fs::create_directory(folder_.path() / "out");
+        program_.set("LC_ALL", "en_US.UTF-8");
+    }
+    void import(const fs::path& records) const { ASSERT_EQ(program_.run({"import", records}).status, 0); }
+    /// So many that an export of them can be met in its midst.
+    void importMany() const {
+        const fs::path file = folder_.path() / "many.xml";
+        std::ofstream text(file);
+        text << "<HealthData>\n";
+        for (int i = 0; i < 40'000; ++i) {
+            char time[64];
+            std::snprintf(time, sizeof time, "2020-04-%02d %02d:%02d:00 +0200", 1 + i / 1440, i / 60 % 24,
+                          i % 60);
+            text << "<Record type=\"VSQuantityTypeIdentifierHeartRate\" sourceName=\"Wrist\" "
+                    "unit=\"count/min\" startDate=\""
+                 << time << "\" endDate=\"" << time << "\" value=\"70\"/>\n";
+        }
+        text << "</HealthData>\n";
+        text.close();
+        import(file);
+    }
+    static bool isWriting(const std::string& line) { return line.starts_with("HeartRate\t"); }
+    /// Nothing is beside the target, which is as it was.
+    void expectUntouched() const {
+        EXPECT_EQ(test::contentOf(target_), "an older export");
+        EXPECT_EQ(std::distance(fs::directory_iterator(target_.parent_path()), {}), 1);
+    }
+
+    const test::TemporaryFolder folder_;
+    test::Program program_{folder_.path()};
+    const fs::path target_ = folder_.path() / "out" / "all.zip";
+};
+
+TEST_F(ExportCommand, WritesAnArchiveThatCanBeImported) {
+    import(fs::path(QELVAR_TEST_DATA) / "import" / "every-kind" / "input.xml");
+    const auto outcome = program_.run({"export", "--to", target_});
+    EXPECT_EQ(outcome.status, 0) << outcome.errors;
+    const auto rows = test::rowsOf(outcome.output);
+    ASSERT_FALSE(rows.empty());
+    EXPECT_EQ(rows.back().at("type"), "total");
+    EXPECT_EQ(rows.back().at("records"), "11");
+    EXPECT_EQ(fs::status(target_).permissions(), fs::perms::owner_read | fs::perms::owner_write);
+    EXPECT_EQ(std::distance(fs::directory_iterator(target_.parent_path()), {}), 1);
+    EXPECT_EQ(std::system(("unzip -p '" + target_.string() + "' export.xml | grep -q 'unit=\"lb\"'").c_str()),
+              0)
+        << "in the units of the region";
+    const auto imported = program_.run({"import", "--store", folder_.path() / "other", target_});
+    EXPECT_EQ(test::rowsOf(imported.output).back().at("added"), "11") << imported.errors;
+}
+
+TEST_F(ExportCommand, SaysWhatIsWrong) {
+    import(fs::path(QELVAR_TEST_DATA) / "import" / "every-kind" / "input.xml");
+    EXPECT_EQ(program_.run({"export", "--to", target_, "word"}).status, 2);
+    EXPECT_EQ(program_.run({"export", "--to", folder_.path() / "no" / "such" / "folder.zip"}).status, 3);
+    EXPECT_EQ(program_.run({"export", "--to", target_.parent_path()}).status, 4);
+    EXPECT_EQ(program_.run({"export", "--to", target_, "--store", folder_.path() / "none"}).status, 3);
+    EXPECT_TRUE(fs::is_empty(target_.parent_path()));
+}
+
+TEST_F(ExportCommand, EndedByASignalItLeavesTheTargetAlone) {
+    importMany();
+    std::ofstream(target_) << "an older export";
+    for (const auto& [signal, status] :
+         {std::pair(SIGINT, 130), std::pair(SIGTERM, 143), std::pair(SIGHUP, 129)}) {
+        test::RunningProgram running({"export", "--progress", "--to", target_}, program_.environment());
+        ASSERT_TRUE(running.waitForErrorLine(isWriting));
+        running.signal(signal);
+        const auto outcome = running.wait();
+        EXPECT_EQ(outcome.status, status) << outcome.errors;
+        EXPECT_EQ(outcome.output, "");
+        expectUntouched();
+    }
+}
+
+TEST_F(ExportCommand, TheNextOneRemovesWhatAKilledOneHasLeft) {
+    importMany();
+    std::ofstream(target_) << "an older export";
+    test::RunningProgram running({"export", "--progress", "--to", target_}, program_.environment());
+    ASSERT_TRUE(running.waitForErrorLine(isWriting));
+    // Meanwhile no other one may have the same place.
+    running.signal(SIGSTOP);
+    const auto second = program_.run({"export", "--to", target_});
+    EXPECT_EQ(second.status, 6);
+    EXPECT_NE(second.errors.find("another export is under way"), std::string::npos) << second.errors;
+    running.signal(SIGKILL);
+    running.wait();
+    EXPECT_EQ(test::contentOf(target_), "an older export");
+    EXPECT_EQ(program_.run({"export", "--to", target_}).status, 0);
+    EXPECT_NE(test::contentOf(target_), "an older export");
+    EXPECT_EQ(std::distance(fs::directory_iterator(target_.parent_path()), {}), 1);
+}
+
+}  // namespace
