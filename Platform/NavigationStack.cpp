@@ -8,8 +8,16 @@ namespace platform {
 NavigationStack::NavigationStack(QString restorationIdentifier, std::unique_ptr<Screen> root)
     : restorationIdentifier_(std::move(restorationIdentifier)) {
     assert(root);
-    root->navigationStack_ = this;
+    adopt(*root);
     screens_.push_back(std::move(root));
+    connect(this, &NavigationStack::changed, this, &NavigationStack::backTitleChanged);
+    connect(this, &NavigationStack::changed, this, &NavigationStack::restorableStateChanged);
+}
+
+void NavigationStack::adopt(Screen& screen) {
+    screen.navigationStack_ = this;
+    connect(&screen, &Screen::titleChanged, this, &NavigationStack::backTitleChanged);
+    connect(&screen, &Screen::restorableStateChanged, this, &NavigationStack::restorableStateChanged);
 }
 
 NavigationStack::~NavigationStack() {
@@ -25,7 +33,7 @@ QString NavigationStack::backTitle() const {
 void NavigationStack::push(std::unique_ptr<Screen> screen, bool animated) {
     assert(screen);
     screens_.back()->setVisible(false);
-    screen->navigationStack_ = this;
+    adopt(*screen);
     screens_.push_back(std::move(screen));
     screens_.back()->setVisible(visible_);
     emit pushed(topScreen(), animated);
@@ -48,6 +56,7 @@ void NavigationStack::popTo(size_t count, bool animated) {
         // Its layout may still slide out of view, and the caller may be one of its own actions.
         leaving_.push_back(std::move(screens_.back()));
         leaving_.back()->navigationStack_ = nullptr;
+        disconnect(leaving_.back().get(), nullptr, this, nullptr);
         screens_.pop_back();
     }
     screens_.back()->setVisible(visible_);

@@ -14,7 +14,7 @@ class NavigationStack : public QObject {
     Q_OBJECT
     Q_PROPERTY(platform::Screen* rootScreen READ rootScreen CONSTANT)
     Q_PROPERTY(platform::Screen* topScreen READ topScreen NOTIFY changed)
-    Q_PROPERTY(QString backTitle READ backTitle NOTIFY changed)
+    Q_PROPERTY(QString backTitle READ backTitle NOTIFY backTitleChanged)
     Q_PROPERTY(bool canGoBack READ canGoBack NOTIFY changed)
  public:
     /// The identifier names the stack in saved states.
@@ -24,7 +24,11 @@ class NavigationStack : public QObject {
     const QString& restorationIdentifier() const { return restorationIdentifier_; }
     Screen* rootScreen() const { return screens_.front().get(); }
     Screen* topScreen() const { return screens_.back().get(); }
-    int count() const { return static_cast<int>(screens_.size()); }
+    Q_INVOKABLE int count() const { return static_cast<int>(screens_.size()); }
+    /// The screens from the root (0) upward.
+    Q_INVOKABLE platform::Screen* screenAt(int index) const {
+        return screens_.at(static_cast<size_t>(index)).get();
+    }
     bool canGoBack() const { return screens_.size() > 1; }
     /// The title of the screen below the top one; empty: none.
     QString backTitle() const;
@@ -42,6 +46,9 @@ class NavigationStack : public QObject {
 
  signals:
     void changed();
+    void backTitleChanged();
+    /// What a later session begins with may be another than before: other screens, or another state of one.
+    void restorableStateChanged();
     /// Sent after the change; those who lay the screens out follow.
     void pushed(platform::Screen* screen, bool animated);
     /// `count` screens went. They live on until transitionFinished() when animated, else until control
@@ -49,6 +56,7 @@ class NavigationStack : public QObject {
     void popped(int count, bool animated);
 
  private:
+    void adopt(Screen& screen);
     void popTo(size_t count, bool animated);
     QString restorationIdentifier_;
     std::vector<std::unique_ptr<Screen>> screens_;

@@ -21,7 +21,9 @@ FocusScope {
             visible: root.stack ? root.stack.canGoBack : false
             anchors.left: parent.left
             height: parent.height
-            width: Math.min(backText.implicitWidth + 36, parent.width / 3)
+            // A large title that would be cut leaves the chevron alone.
+            readonly property bool onlyChevron: SystemStyle.largeText && backText.implicitWidth + 36 > parent.width / 3
+            width: onlyChevron ? 44 : Math.min(backText.implicitWidth + 36, parent.width / 3)
             text: root.stack ? root.stack.backTitle : ""
             onClicked: root.stack.pop()
             Accessible.name: text
@@ -41,6 +43,7 @@ FocusScope {
                 Text {
                     id: backText
                     anchors { left: chevron.right; leftMargin: 6; right: parent.right; rightMargin: 4; verticalCenter: parent.verticalCenter }
+                    visible: !back.onlyChevron
                     text: back.text
                     color: SystemStyle.tint
                     font.pixelSize: SystemStyle.bodySize
@@ -58,6 +61,8 @@ FocusScope {
             color: SystemStyle.text
             font.pixelSize: SystemStyle.bodySize
             font.bold: true
+            fontSizeMode: SystemStyle.largeText ? Text.HorizontalFit : Text.FixedSize
+            minimumPixelSize: 17
             elide: Text.ElideRight
             Accessible.role: Accessible.Heading
             Accessible.name: text
@@ -104,7 +109,10 @@ FocusScope {
         }
     }
 
-    Component.onCompleted: screens.show(stack.rootScreen, false)
+    // A stack may be deep already when it is first laid out.
+    Component.onCompleted: {
+        for (let i = 0; i < stack.count(); ++i) screens.show(stack.screenAt(i), false)
+    }
 
     Keys.onPressed: event => {
         const backKey = root.mirrored ? Qt.Key_Right : Qt.Key_Left

@@ -17,7 +17,14 @@ void Screen::setTitle(const QString& title) {
     emit titleChanged();
 }
 
+void Screen::setUserActivity(std::shared_ptr<const UserActivity> activity) {
+    userActivity_ = std::move(activity);
+    if (visible_ && userActivity_) UserActivity::makeCurrent(userActivity_);
+}
+
 void Screen::restoreUserActivityState(const UserActivity&) {}
+void Screen::encodeRestorableState(RestorableState&) const {}
+void Screen::decodeRestorableState(const RestorableState&) {}
 
 void Screen::setVisible(bool visible) {
     if (visible_ == visible) return;

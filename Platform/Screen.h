@@ -8,6 +8,7 @@
 namespace platform {
 
 class NavigationStack;
+class RestorableState;
 struct UserActivity;
 
 /// One screen: what it shows and does, without a window. The QML file that lays it out gets it as its
@@ -30,14 +31,23 @@ class Screen : public QObject {
 
     /// What the user is at while the screen is shown: made current each time it has appeared. Null: nothing.
     std::shared_ptr<const UserActivity> userActivity() const { return userActivity_; }
-    void setUserActivity(std::shared_ptr<const UserActivity> activity) {
-        userActivity_ = std::move(activity);
-    }
+    /// Set anew (its texts are in another language now) it is current at once while the screen is shown.
+    void setUserActivity(std::shared_ptr<const UserActivity> activity);
     /// Brings the screen to where the activity was, after its stack was popped to its root.
     virtual void restoreUserActivityState(const UserActivity& activity);
 
+    /// Its name in saved states; empty: neither the screen nor those on top of it are there in a later
+    /// session.
+    virtual QString restorationIdentifier() const { return {}; }
+    /// What a later session begins with. Decoded before the screen is shown for the first time; values that
+    /// mean nothing (any more) are left alone.
+    virtual void encodeRestorableState(RestorableState& state) const;
+    virtual void decodeRestorableState(const RestorableState& state);
+
  signals:
     void titleChanged();
+    /// What encodeRestorableState() gives may be another than before.
+    void restorableStateChanged();
 
  protected:
     Screen();

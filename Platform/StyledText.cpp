@@ -10,6 +10,7 @@
 #include <variant>
 
 #include "Platform/Localization.h"
+#include "Platform/TextScale.h"
 
 namespace platform {
 
@@ -32,7 +33,8 @@ const QStringList& systemFontFamilies() {
 QFont makeSystemFont(double size, QFont::Weight weight) {
     QFont font;
     if (!systemFontFamilies().isEmpty()) font.setFamilies(systemFontFamilies());
-    font.setPixelSize(std::max(1, static_cast<int>(std::lround(size > 0 ? size : defaultFontSize))));
+    const double points = (size > 0 ? size : defaultFontSize) * textScale();
+    font.setPixelSize(std::max(1, static_cast<int>(std::lround(points))));
     font.setWeight(weight);
     // Widths must be the same on every screen and in every image, whatever its scale.
     font.setHintingPreference(QFont::PreferNoHinting);

@@ -10,7 +10,7 @@
 
 namespace platform {
 
-/// The system font at a size in points of the layout (device-independent pixels), scaled by nothing.
+/// The system font at a size in points of the layout (device-independent pixels), times textScale().
 /// A size of 0 means the platform's default size.
 QFont systemFont(double size);
 QFont boldSystemFont(double size);

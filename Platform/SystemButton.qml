@@ -19,6 +19,8 @@ T.Button {
         opacity: button.enabled ? (button.down && !button.filled ? 0.3 : 1) : 0.4
         font.pixelSize: SystemStyle.bodySize
         font.bold: button.emphasized
+        fontSizeMode: SystemStyle.largeText ? Text.HorizontalFit : Text.FixedSize
+        minimumPixelSize: 13
         horizontalAlignment: Text.AlignHCenter
         verticalAlignment: Text.AlignVCenter
         elide: Text.ElideRight

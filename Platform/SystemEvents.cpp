@@ -7,6 +7,10 @@
 
 #include <QCoreApplication>
 #include <QDBusConnection>
+#include <QDBusMessage>
+#include <QDBusPendingCallWatcher>
+#include <QDBusPendingReply>
+#include <QFile>
 #include <QFileSystemWatcher>
 #include <QSocketNotifier>
 #include <QTimer>
@@ -20,6 +24,7 @@
 #include "Vessa/Base/VSCalendar.h"
 #include "Vessa/Base/VSEnvironment.h"
 #include "Vessa/Base/VSLog.h"
+#include "Vessa/Base/VSSystemSettings.h"
 
 namespace platform {
 
@@ -51,7 +56,83 @@ void forgetZone() {
     icu::TimeZone::adoptDefault(icu::TimeZone::detectHostTimeZone());
 }
 
+constexpr std::chrono::milliseconds kFileIsWritten{200};
+
+const QString kSettingsGroup = QStringLiteral("org.gnome.desktop.interface");
+const QString kClockKey = QStringLiteral("clock-format");
+
+// Whether each variable is set in both or in neither, and to the same locale however it is written.
+bool meanTheSame(const VSLocaleVariables& a, const VSLocaleVariables& b) {
+    const auto same = [](const std::string& one, const std::string& other) {
+        return one.empty() == other.empty() &&
+               VSLocaleFromPOSIX(one.c_str()) == VSLocaleFromPOSIX(other.c_str());
+    };
+    return same(a.all, b.all) && same(a.time, b.time) && same(a.language, b.language);
+}
+
+// A session without a bus gets none: the library would start one.
+bool hasSessionBus() {
+    return qEnvironmentVariableIsSet("DBUS_SESSION_BUS_ADDRESS") ||
+           QFile::exists(qEnvironmentVariable("XDG_RUNTIME_DIR") + QStringLiteral("/bus"));
+}
+
+std::optional<bool> uses24HourClock(QVariant setting) {
+    while (setting.canConvert<QDBusVariant>()) setting = setting.value<QDBusVariant>().variant();
+    if (setting == QStringLiteral("24h")) return true;
+    if (setting == QStringLiteral("12h")) return false;
+    return std::nullopt;
+}
+
 }  // namespace
+
+// The user's locale as the host has it. The process's variables come from the host's settings when both were
+// the same at the start: then they follow when the settings change. Else somebody gave the process a locale
+// of its own, which stays.
+class HostLocale {
+ public:
+    HostLocale(SystemEvents& events, std::filesystem::path etc)
+        : events_(events), etc_(std::move(etc)), inFiles_(VSLocaleVariablesOfHost(etc_)) {
+        followsHost_ = meanTheSame(inFiles_, VSLocaleVariablesOfProcess());
+        said_ = inFiles_;
+        // Some write the file in place, and it is not read half.
+        reader_.setSingleShot(true);
+        reader_.setInterval(kFileIsWritten);
+        QObject::connect(&reader_, &QTimer::timeout, &events_, [this] { readFiles(); });
+    }
+    void filesDidChange() { reader_.start(); }
+    void hostSays(const VSLocaleVariables& variables) {
+        if (!followsHost_ || variables == said_) return;
+        said_ = variables;
+        locale_ = variables.strongest();
+        apply();
+    }
+    void clockPreferred(std::optional<bool> uses24HourClock) {
+        if (clock_ == uses24HourClock) return;
+        clock_ = uses24HourClock;
+        apply();
+    }
+
+ private:
+    void readFiles() {
+        const VSLocaleVariables variables = VSLocaleVariablesOfHost(etc_);
+        if (variables == inFiles_) return;
+        inFiles_ = variables;
+        hostSays(variables);
+    }
+    void apply() {
+        const std::string before = VSEnvironment::current()->localeIdentifier();
+        VSSystemEnvironment::setHostPreferences(locale_, clock_);
+        if (VSEnvironment::current()->localeIdentifier() != before) events_.postLocaleChange();
+    }
+
+    SystemEvents& events_;
+    const std::filesystem::path etc_;
+    bool followsHost_ = false;
+    VSLocaleVariables inFiles_, said_;  // last
+    std::optional<std::string> locale_;
+    std::optional<bool> clock_;
+    QTimer reader_;
+};
 
 struct SystemEvents::Private {
     explicit Private(SystemEvents& owner) : events(owner) {}
@@ -60,13 +141,20 @@ struct SystemEvents::Private {
         if (timer >= 0) close(timer);
     }
 
-    void start() {
+    void start(const std::filesystem::path& etc) {
         today = LocalDay::current();
+        if (etc != folder) {
+            folder = etc;
+            locale = std::make_unique<HostLocale>(events, etc);
+            startWatchingFiles();
+        }
         if (timer < 0) {
             startTimer();
-            startWatchingZoneFile();
             // The bus may take a moment to answer; the first screen need not wait for it.
-            QTimer::singleShot(0, &events, [this] { startListeningToBus(); });
+            QTimer::singleShot(0, &events, [this] {
+                startListeningToBus();
+                startListeningToSettings();
+            });
         }
         arm();
     }
@@ -126,16 +214,26 @@ struct SystemEvents::Private {
             check();
     }
 
-    void startWatchingZoneFile() {
-        // The link itself is replaced when the zone is changed, which only its folder notices.
+    // A link or a file that is replaced is noticed by its folder only, one written in place by itself only.
+    void startWatchingFiles() {
         watcher = std::make_unique<QFileSystemWatcher>();
-        watcher->addPaths({QStringLiteral("/etc/localtime"), QStringLiteral("/etc")});
-        QObject::connect(watcher.get(), &QFileSystemWatcher::fileChanged, &events,
-                         [this](const QString& path) {
-                             if (!watcher->files().contains(path)) watcher->addPath(path);
-                             check();
-                         });
-        QObject::connect(watcher.get(), &QFileSystemWatcher::directoryChanged, &events, [this] { check(); });
+        watchFiles();
+        const auto filesDidChange = [this] {
+            watchFiles();
+            check();
+            locale->filesDidChange();
+        };
+        QObject::connect(watcher.get(), &QFileSystemWatcher::fileChanged, &events, filesDidChange);
+        QObject::connect(watcher.get(), &QFileSystemWatcher::directoryChanged, &events, filesDidChange);
+    }
+
+    void watchFiles() {
+        const QStringList watched = watcher->files() + watcher->directories();
+        for (const char* name : {"", "localtime", "locale.conf", "default", "default/locale"}) {
+            const std::filesystem::path path = *name ? folder / name : folder;
+            const QString text = QString::fromStdString(path.string());
+            if (!watched.contains(text) && QFile::exists(text)) watcher->addPath(text);
+        }
     }
 
     // A machine without a system bus or without these services never sends anything, which is no error.
@@ -148,12 +246,37 @@ struct SystemEvents::Private {
         bus.connect(QStringLiteral("org.freedesktop.login1"), QStringLiteral("/org/freedesktop/login1"),
                     QStringLiteral("org.freedesktop.login1.Manager"), QStringLiteral("PrepareForSleep"),
                     &events, SLOT(busPrepareForSleep(bool)));
+        bus.connect(QStringLiteral("org.freedesktop.locale1"), QStringLiteral("/org/freedesktop/locale1"),
+                    QStringLiteral("org.freedesktop.DBus.Properties"), QStringLiteral("PropertiesChanged"),
+                    &events, SLOT(busLocaleChanged(QString, QVariantMap, QStringList)));
+    }
+
+    // The desktop's settings; the clock is the one that a locale does not tell.
+    void startListeningToSettings() {
+        if (!hasSessionBus()) return;
+        auto bus = QDBusConnection::sessionBus();
+        if (!bus.isConnected()) return;
+        const QString service = QStringLiteral("org.freedesktop.portal.Desktop");
+        const QString path = QStringLiteral("/org/freedesktop/portal/desktop");
+        const QString interface = QStringLiteral("org.freedesktop.portal.Settings");
+        bus.connect(service, path, interface, QStringLiteral("SettingChanged"), &events,
+                    SLOT(busSettingChanged(QString, QString, QDBusVariant)));
+        auto read = QDBusMessage::createMethodCall(service, path, interface, QStringLiteral("Read"));
+        read.setArguments({kSettingsGroup, kClockKey});
+        auto* answer = new QDBusPendingCallWatcher(bus.asyncCall(read), &events);
+        QObject::connect(answer, &QDBusPendingCallWatcher::finished, &events, [this, answer] {
+            answer->deleteLater();
+            const QDBusPendingReply<QDBusVariant> reply = *answer;
+            if (reply.isValid()) locale->clockPreferred(uses24HourClock(reply.value().variant()));
+        });
     }
 
     SystemEvents& events;
     LocalDay today;
     int timer = -1;
     std::unique_ptr<QSocketNotifier> notifier;
+    std::filesystem::path folder;  // of the host's settings
+    std::unique_ptr<HostLocale> locale;
     std::unique_ptr<QFileSystemWatcher> watcher;
 };
 
@@ -169,8 +292,8 @@ SystemEvents& SystemEvents::shared() {
     return *events;
 }
 
-void SystemEvents::start() {
-    private_->start();
+void SystemEvents::start(const std::filesystem::path& etc) {
+    private_->start(etc);
 }
 
 void SystemEvents::postSignificantTimeChange() {
@@ -183,6 +306,20 @@ void SystemEvents::busTimeDateChanged(const QString&, const QVariantMap&, const 
 
 void SystemEvents::busPrepareForSleep(bool goingToSleep) {
     if (!goingToSleep) private_->check();
+}
+
+void SystemEvents::busLocaleChanged(const QString&, const QVariantMap& changed, const QStringList&) {
+    if (!private_->locale) return;
+    const auto settings = changed.constFind(QStringLiteral("Locale"));
+    if (settings == changed.constEnd()) return private_->locale->filesDidChange();
+    VSLocaleVariables variables;
+    for (const QString& setting : settings->toStringList()) variables.assign(setting.toStdString());
+    private_->locale->hostSays(variables);
+}
+
+void SystemEvents::busSettingChanged(const QString& group, const QString& key, const QDBusVariant& value) {
+    if (private_->locale && group == kSettingsGroup && key == kClockKey)
+        private_->locale->clockPreferred(uses24HourClock(value.variant()));
 }
 
 void SystemEvents::postLocaleChange() {

@@ -1,5 +1,6 @@
 pragma Singleton
 import QtQuick
+import Qelvar.Items
 
 // The colours and measures of the system's light look.
 QtObject {
@@ -13,9 +14,14 @@ QtObject {
     readonly property color inactive: "#8a8a8f"
     readonly property color emphasis: "#d9d9dd" // behind what is pressed
     property real pixel: 1 // of the screen, in points; the window sets it
-    readonly property int navigationBarHeight: 44
-    readonly property int tabBarHeight: 49
-    readonly property int touchHeight: 44
-    readonly property int bodySize: 17
-    readonly property int captionSize: 13
+    // Texts are as large as the person wants them, and what holds them grows as a line of text does.
+    readonly property real textScale: TextScale.factor
+    readonly property bool largeText: textScale > 1
+    function scaled(points) { return Math.round(points * textScale) }
+    function grown(height, growth) { return Math.round(height + (textScale - 1) * growth) }
+    readonly property int navigationBarHeight: grown(44, 22)
+    readonly property int tabBarHeight: grown(49, 28)
+    readonly property int touchHeight: grown(44, 22)
+    readonly property int bodySize: scaled(17)
+    readonly property int captionSize: scaled(13)
 }

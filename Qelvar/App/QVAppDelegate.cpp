@@ -2,8 +2,11 @@
 
 #include "Platform/Localization.h"
 #include "Platform/SystemEvents.h"
-#include "Qelvar/App/QVPlaceholderViewController.h"
+#include "Qelvar/Controllers/QVPlaceholderViewController.h"
 #include "Qelvar/Controllers/QVUserActivityManager.h"
+#include "Qelvar/HealthData/QVDataCategoryDetailViewController.h"
+#include "Qelvar/HealthData/QVDataUnitGroupDetailViewController.h"
+#include "Qelvar/HealthData/QVHealthDataViewController.h"
 #include "Vessa/Base/VSLog.h"
 
 namespace {
@@ -24,28 +27,32 @@ std::optional<int> indexOfTab(const QString& tab) {
 }
 
 /// The screen of a tab whose rooms are not built yet.
-std::unique_ptr<platform::NavigationStack> placeholderStack(
-    const char* stackIdentifier, const char* titleKey, const char* icon, const char* messageKey,
-    const char* tab, std::vector<QVPlaceholderViewController::Action> actions = {}) {
+std::unique_ptr<platform::NavigationStack> placeholderStack(const char* stackIdentifier, const char* titleKey,
+                                                            const char* icon, const char* messageKey,
+                                                            const char* tab) {
     auto screen = std::make_unique<QVPlaceholderViewController>(
-        [titleKey] { return platform::localized(titleKey); }, QString::fromLatin1(icon), messageKey,
-        std::move(actions));
+        [titleKey] { return platform::localized(titleKey); }, QString::fromLatin1(icon), messageKey);
     screen->setIconIsGlyph(true);
-    screen->setUserActivity(QVUserActivityManager::activity(screen->title(), {}, tab));
+    screen->setActivityFactory(
+        [titleKey, tab] { return QVUserActivityManager::activity(platform::localized(titleKey), {}, tab); });
     return std::make_unique<platform::NavigationStack>(QString::fromLatin1(stackIdentifier),
                                                        std::move(screen));
 }
 
 }  // namespace
 
-QVAppDelegate::QVAppDelegate(std::shared_ptr<VSHealthStore> healthStore, bool medicalIDIsSupported)
-    : healthStore_(std::move(healthStore)), medicalIDIsSupported_(medicalIDIsSupported) {}
+QVAppDelegate::QVAppDelegate(std::shared_ptr<VSHealthStore> healthStore, std::filesystem::path stateFile,
+                             bool medicalIDIsSupported)
+    : healthStore_(std::move(healthStore)),
+      medicalIDIsSupported_(medicalIDIsSupported),
+      stateRestoration_(std::move(stateFile)) {}
 
 QVAppDelegate::~QVAppDelegate() = default;
 
 void QVAppDelegate::willFinishLaunching() {
     controllerManager_ = std::make_shared<QVControllerManager>(healthStore_, &QVDemoDataHead);
     importController_ = std::make_unique<QVImportController>(healthStore_);
+    exportController_ = std::make_unique<QVExportController>(controllerManager_);
 
     std::vector<QVTabBarController::Tab> tabs;
     tabs.push_back(
@@ -65,6 +72,25 @@ void QVAppDelegate::willFinishLaunching() {
         tabBarController_->updateTitles();
         emit localeChanged();
     });
+    restoreState();
+}
+
+void QVAppDelegate::restoreState() {
+    stateRestoration_.objects().add(QVControllerManager::RestorationIdentifier, controllerManager_);
+    stateRestoration_.setScreenFactory(QVDataCategoryDetailViewController::RestorationIdentifier(),
+                                       &QVDataCategoryDetailViewController::fromRestorableState);
+    stateRestoration_.setScreenFactory(QVDataUnitGroupDetailViewController::RestorationIdentifier(),
+                                       &QVDataUnitGroupDetailViewController::fromRestorableState);
+    const std::string tabBar = QVTabBarController::restorationIdentifier().toStdString();
+    const auto& saved = stateRestoration_.savedState();
+    const auto found = saved ? saved->find(tabBar) : VSValue::Dictionary::const_iterator();
+    if (saved && found != saved->end() && found->second.dictionary())
+        tabBarController_->decodeState(stateRestoration_, *found->second.dictionary());
+    stateRestoration_.setState([this, tabBar] {
+        return VSValue::Dictionary{{tabBar, tabBarController_->encodeState(stateRestoration_)}};
+    });
+    connect(tabBarController_.get(), &QVTabBarController::restorableStateChanged, &stateRestoration_,
+            &platform::StateRestoration::stateDidChange);
 }
 
 void QVAppDelegate::didFinishLaunching() {
@@ -72,9 +98,9 @@ void QVAppDelegate::didFinishLaunching() {
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::dashboardStack() {
-    auto detailScreen = [](const VSDataUnitGroup* group) -> std::unique_ptr<platform::Screen> {
-        return std::make_unique<QVPlaceholderViewController>([group] { return group->displayName(); },
-                                                             group->listIcon(), "DATA_TYPE_PENDING");
+    auto detailScreen =
+        [manager = controllerManager_](const VSDataUnitGroup* group) -> std::unique_ptr<platform::Screen> {
+        return std::make_unique<QVDataUnitGroupDetailViewController>(group, manager);
     };
     auto screen = std::make_unique<QVDashboardViewController>(controllerManager_, detailScreen);
     dashboard_ = screen.get();
@@ -84,9 +110,13 @@ std::unique_ptr<platform::NavigationStack> QVAppDelegate::dashboardStack() {
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::healthDataStack() {
-    return placeholderStack("Health Data Navigation Controller", "HEALTH_DATA", "healthdata_selected",
-                            "HEALTH_DATA_PENDING", QVUserActivityTab::HealthData,
-                            {{"IMPORT_ACTION", [this] { emit importRequested(); }}});
+    auto screen = std::make_unique<QVHealthDataViewController>(controllerManager_);
+    connect(screen.get(), &QVHealthDataViewController::importRequested, this,
+            &QVAppDelegate::importRequested);
+    connect(screen.get(), &QVHealthDataViewController::exportRequested, exportController_.get(),
+            &QVExportController::verifyExport);
+    return std::make_unique<platform::NavigationStack>(QStringLiteral("Health Data Navigation Controller"),
+                                                       std::move(screen));
 }
 
 std::unique_ptr<platform::NavigationStack> QVAppDelegate::sourcesStack() {

@@ -2,10 +2,13 @@
 
 #include <QColor>
 #include <QObject>
+#include <filesystem>
 #include <memory>
 
+#include "Platform/StateRestoration.h"
 #include "Platform/UserActivity.h"
 #include "Qelvar/App/QVDemoData.h"
+#include "Qelvar/App/QVExportController.h"
 #include "Qelvar/App/QVImportController.h"
 #include "Qelvar/App/QVTabBarController.h"
 #include "Qelvar/Controllers/QVControllerManager.h"
@@ -18,18 +21,26 @@ class QVAppDelegate : public QObject {
     Q_OBJECT
     Q_PROPERTY(QVTabBarController* tabBarController READ tabBarController CONSTANT)
     Q_PROPERTY(QVImportController* importController READ importController CONSTANT)
+    Q_PROPERTY(QVExportController* exportController READ exportController CONSTANT)
     Q_PROPERTY(QColor keyColor READ keyColor CONSTANT)
     Q_PROPERTY(bool rightToLeft READ isRightToLeft NOTIFY localeChanged)
     Q_PROPERTY(QString tabBarName READ tabBarName NOTIFY localeChanged)
  public:
+    /// `stateFile` keeps what the user was at for the next session; empty: nothing is kept.
     /// `medicalIDIsSupported`: whether this device can show a Medical ID; without it there is no such tab.
-    explicit QVAppDelegate(std::shared_ptr<VSHealthStore> healthStore, bool medicalIDIsSupported = true);
+    explicit QVAppDelegate(std::shared_ptr<VSHealthStore> healthStore, std::filesystem::path stateFile = {},
+                           bool medicalIDIsSupported = true);
     ~QVAppDelegate() override;
 
-    /// Builds everything but the window. Once.
+    /// Builds everything but the window, as the session before left it. Once. A link that the application is
+    /// started with is opened after this.
     void willFinishLaunching();
     /// The tabs are on the display from now on.
     void didFinishLaunching();
+    /// The window is out of sight: saves what the user is at.
+    void didEnterBackground() { stateRestoration_.save(); }
+    /// The same, and waits until it is written.
+    void willTerminate() { stateRestoration_.finish(); }
     /// Rebuilds the demonstration's records when demo data is in use and it is due.
     void didBecomeActive();
     bool isResettingDemoData() const { return loadingDemoData_ || (demoData_ && demoData_->isResetting()); }
@@ -44,6 +55,7 @@ class QVAppDelegate : public QObject {
     QVDashboardViewController* dashboard() const { return dashboard_; }
     QVTabBarController* tabBarController() const { return tabBarController_.get(); }
     QVImportController* importController() const { return importController_.get(); }
+    QVExportController* exportController() const { return exportController_.get(); }
     QColor keyColor() const;
     bool isRightToLeft() const;
     /// What a screen reader calls the row of tabs.
@@ -59,15 +71,18 @@ class QVAppDelegate : public QObject {
     std::unique_ptr<platform::NavigationStack> healthDataStack();
     std::unique_ptr<platform::NavigationStack> sourcesStack();
     std::unique_ptr<platform::NavigationStack> medicalIDStack();
+    void restoreState();
     bool shouldSelectTab(int index) const;
     void resetDemoData(VSResult<VSValue::Dictionary> dictionary, const std::string& demoDataSex);
 
     const std::shared_ptr<VSHealthStore> healthStore_;
     const bool medicalIDIsSupported_;
+    platform::StateRestoration stateRestoration_;
     std::shared_ptr<QVControllerManager> controllerManager_;
     std::unique_ptr<QVDemoData> demoData_;
     bool loadingDemoData_ = false;
     std::unique_ptr<QVImportController> importController_;
+    std::unique_ptr<QVExportController> exportController_;
     std::unique_ptr<QVTabBarController> tabBarController_;
     QVDashboardViewController* dashboard_ = nullptr;                 // in the first tab's stack
     platform::NavigationStack* medicalIDNavigationStack_ = nullptr;  // null: there is no such tab

@@ -16,10 +16,12 @@
 #include "Platform/Icons.h"
 #include "Platform/Localization.h"
 #include "Platform/SystemEvents.h"
+#include "Platform/TextScale.h"
 #include "Platform/UserDefaults.h"
 #include "Qelvar/App/QVAppDelegate.h"
 #include "Qelvar/App/QVScreenshots.h"
 #include "Qelvar/App/QVStartupTrace.h"
+#include "Qelvar/App/QVTerminationSignals.h"
 #include "Qelvar/App/QVWindow.h"
 #include "Qelvar/DataProviders/QVUserDefaults.h"
 
@@ -125,24 +127,38 @@ void finishDemoData(QVAppDelegate& app) {
 int runWindow(QGuiApplication& application, QVAppDelegate& app, const QVApplicationOptions& options) {
     app.willFinishLaunching();
     QVStartupTrace::note("controllers");
+    // Before the screens are laid out and ask for their records: a link leads elsewhere than the session
+    // before.
+    if (!options.openLink.isEmpty() && !app.openLink(options.openLink))
+        std::fprintf(stderr, "qelvar: not a link of the application: %s\n", qPrintable(options.openLink));
     // The pictures are of the finished demonstration; a person sees it grow.
     if (options.screenshots) finishDemoData(app);
     QVWindow window(app, options.size);
     if (!window.isUsable()) return 1;
     QVStartupTrace::note("screens laid out");
     app.didFinishLaunching();
-    if (!options.openLink.isEmpty() && !app.openLink(options.openLink))
-        std::fprintf(stderr, "qelvar: not a link of the application: %s\n", qPrintable(options.openLink));
     window.show();
     QVStartupTrace::watch(window);
     if (options.screenshots) return QVScreenshots(window, app, *options.screenshots).takeAll() ? 0 : 1;
 
     QObject::connect(&application, &QGuiApplication::applicationStateChanged, &app,
                      [&app](Qt::ApplicationState state) {
-                         if (state == Qt::ApplicationActive) app.didBecomeActive();
+                         if (state == Qt::ApplicationActive)
+                             app.didBecomeActive();
+                         else
+                             app.didEnterBackground();
                      });
     QMetaObject::invokeMethod(&app, &QVAppDelegate::didBecomeActive, Qt::QueuedConnection);
-    return QGuiApplication::exec();
+    const QVTerminationSignals terminationSignals;
+    const int status = QGuiApplication::exec();
+    app.willTerminate();
+    return status;
+}
+
+/// What the session before left. The demonstration and its pictures begin where they always do, and leave
+/// nothing.
+std::filesystem::path stateFile(const std::filesystem::path& folder, const QVApplicationOptions& options) {
+    return options.demo || options.screenshots ? std::filesystem::path() : folder / "state.json";
 }
 
 /// Says in a window what keeps the application from starting, for those who did not start it from a terminal;
@@ -186,7 +202,10 @@ int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options)
     QVStartupTrace::note("application object");
     platform::loadTranslations();
     QGuiApplication::setLayoutDirection(platform::isRightToLeft() ? Qt::RightToLeft : Qt::LeftToRight);
-    platform::SystemEvents::shared().start();
+    // Pictures show what the command line says, not what the desktop does meanwhile.
+    if (!options.screenshots) platform::SystemEvents::shared().start();
+    if (options.textScale > 0) platform::TextScale::shared().set(options.textScale);
+    platform::TextScale::shared().start();
 
     const std::filesystem::path folder = options.store.empty() ? QVStoreFolder(options.demo) : options.store;
     auto store = openStore(folder, options);
@@ -199,7 +218,7 @@ int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options)
         return 1;
     }
     QVStartupTrace::note("store open");
-    QVAppDelegate app(std::move(*store));
+    QVAppDelegate app(std::move(*store), stateFile(folder, options));
     const int status = runWindow(application, app, options);
     QVUserDefaults::sharedDefaults().setHealthStore(nullptr);
     return status;

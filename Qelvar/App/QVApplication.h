@@ -15,6 +15,8 @@ struct QVApplicationOptions {
     QSize size;
     /// Pixels per point of the screenshots; 0: the system's.
     double scale = 0;
+    /// How large texts are, from 1 to 3; 0: as the person's desktop says.
+    double textScale = 0;
     /// A link of the application, "qelvar://DashboardTab"; empty: none.
     QString openLink;
     /// The store's folder; empty: QVStoreFolder(demo). It also holds the local user defaults.

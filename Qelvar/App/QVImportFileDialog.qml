@@ -120,7 +120,7 @@ T.Popup {
                     Text {
                         anchors { left: parent.left; leftMargin: 16; right: arrow.left; rightMargin: 8; verticalCenter: parent.verticalCenter }
                         text: row.fileName
-                        font.pixelSize: 15
+                        font.pixelSize: SystemStyle.scaled(15)
                         color: row.fileIsDir ? SystemStyle.text : SystemStyle.tint
                         elide: Text.ElideMiddle
                     }
@@ -129,7 +129,7 @@ T.Popup {
                         anchors { right: parent.right; rightMargin: 16; verticalCenter: parent.verticalCenter }
                         visible: row.fileIsDir
                         text: row.mirrored ? "\u2039" : "\u203a"
-                        font.pixelSize: 20
+                        font.pixelSize: SystemStyle.scaled(20)
                         color: SystemStyle.inactive
                     }
                 }
@@ -146,7 +146,7 @@ T.Popup {
                 anchors { left: parent.left; right: parent.right; verticalCenter: parent.verticalCenter; margins: 24 }
                 visible: files.count === 0 && model.status === FolderListModel.Ready
                 text: qsTrId("IMPORT_NO_RECORDS_FILE")
-                font.pixelSize: 15
+                font.pixelSize: SystemStyle.scaled(15)
                 color: SystemStyle.secondaryText
                 horizontalAlignment: Text.AlignHCenter
                 wrapMode: Text.WordWrap

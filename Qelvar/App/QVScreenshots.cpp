@@ -6,12 +6,14 @@
 #include <algorithm>
 #include <cstdio>
 
+#include "Platform/TextScale.h"
 #include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
 
 namespace {
 
 constexpr int kPatienceMilliseconds = 60'000;
 constexpr double kAboveAndBelowCards = 44 + 39 + 1 + 4 + 50;  // bars, control, header, inset
+constexpr double kGrowthOfBars = 80;                          // with texts twice as large
 
 void collectCards(QQuickItem* item, QList<QVDashboardTableViewCell*>& cards) {
     if (auto* card = qobject_cast<QVDashboardTableViewCell*>(item)) cards.append(card);
@@ -45,6 +47,7 @@ bool QVScreenshots::takeAll() {
 }
 
 bool QVScreenshots::takeDashboard() {
+    app_.tabBarController()->setSelectedIndex(0);  // a link may have led elsewhere
     auto& groups = app_.controllerManager()->dashboardDataUnitGroupsController();
     if (!waitUntil([&groups] { return groups.hasLoadedDashboard(); }, "the dashboard's selection"))
         return false;
@@ -53,8 +56,9 @@ bool QVScreenshots::takeDashboard() {
 
     const QSize size = window_.size();
     const int cards = static_cast<int>(dashboard.dashboardDataUnitGroups().size());
-    const QSize full(size.width(), static_cast<int>(kAboveAndBelowCards +
-                                                    cards * QVDashboardTableViewCell::preferredCellHeight()));
+    const QSize full(size.width(),
+                     static_cast<int>(kAboveAndBelowCards + (platform::textScale() - 1) * kGrowthOfBars +
+                                      cards * QVDashboardTableViewCell::preferredCellHeight()));
     const char* const names[] = {"day", "week", "month", "year"};
     for (int index = 0; index < 4; ++index) {
         dashboard.timeScopeControl()->pick(index);

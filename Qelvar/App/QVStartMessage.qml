@@ -14,7 +14,7 @@ Rectangle {
         Text {
             width: parent.width
             text: root.title
-            font.pixelSize: 20
+            font.pixelSize: SystemStyle.scaled(20)
             font.bold: true
             color: SystemStyle.text
             horizontalAlignment: Text.AlignHCenter

@@ -4,8 +4,21 @@
 
 #include "Platform/Localization.h"
 
+namespace {
+
+// In saved states; never changed.
+constexpr const char* kSelectedStackKey = "Selected Stack";
+constexpr const char* kStacksKey = "Stacks";
+
+}  // namespace
+
 QVTabBarController::QVTabBarController(std::vector<Tab> tabs) : tabs_(std::move(tabs)) {
     assert(!tabs_.empty());
+    for (const Tab& tab : tabs_)
+        connect(tab.stack.get(), &platform::NavigationStack::restorableStateChanged, this,
+                &QVTabBarController::restorableStateChanged);
+    connect(this, &QVTabBarController::selectedIndexChanged, this,
+            &QVTabBarController::restorableStateChanged);
 }
 
 int QVTabBarController::rowCount(const QModelIndex& parent) const {
@@ -58,4 +71,27 @@ void QVTabBarController::show() {
 
 void QVTabBarController::updateTitles() {
     emit dataChanged(index(0), index(count() - 1));
+}
+
+// Tabs go by the names of their stacks: another device may not have all of them.
+VSValue::Dictionary QVTabBarController::encodeState(const platform::StateRestoration& restoration) const {
+    VSValue::Dictionary stacks;
+    for (const Tab& tab : tabs_)
+        stacks[tab.stack->restorationIdentifier().toStdString()] = restoration.encodeStack(*tab.stack);
+    return {{kSelectedStackKey, selectedStack()->restorationIdentifier().toStdString()},
+            {kStacksKey, std::move(stacks)}};
+}
+
+void QVTabBarController::decodeState(const platform::StateRestoration& restoration,
+                                     const VSValue::Dictionary& state) {
+    assert(!shown_);
+    const VSValue values(state);
+    const VSValue* stacks = values[kStacksKey];
+    const VSValue* selected = values[kSelectedStackKey];
+    for (int index = 0; index < count(); ++index) {
+        const std::string name = stack(index)->restorationIdentifier().toStdString();
+        const VSValue* screens = stacks ? (*stacks)[name] : nullptr;
+        if (screens && screens->array()) restoration.decodeStack(*stack(index), *screens->array());
+        if (selected && selected->string() && *selected->string() == name) setSelectedIndex(index);
+    }
 }

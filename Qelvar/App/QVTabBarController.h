@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "Platform/NavigationStack.h"
+#include "Platform/StateRestoration.h"
 
 /// The container of the application's tabs: each a navigation stack under a title and an image. Main thread
 /// only.
@@ -50,8 +51,15 @@ class QVTabBarController : public QAbstractListModel {
     /// The user's language changed.
     void updateTitles();
 
+    /// The selected tab, and what is in each.
+    VSValue::Dictionary encodeState(const platform::StateRestoration& restoration) const;
+    /// REQUIRES: not shown yet, and every stack has only its root.
+    void decodeState(const platform::StateRestoration& restoration, const VSValue::Dictionary& state);
+
  signals:
     void selectedIndexChanged();
+    /// What encodeState() gives may be another than before.
+    void restorableStateChanged();
 
  private:
     const std::vector<Tab> tabs_;

@@ -98,8 +98,12 @@ FocusScope {
                             y: 33
                             width: parent.width - 4
                             horizontalAlignment: Text.AlignHCenter
+                            height: parent.height - y
                             text: tab.title
-                            font.pixelSize: 10
+                            font.pixelSize: SystemStyle.scaled(10)
+                            fontSizeMode: SystemStyle.largeText ? Text.Fit : Text.FixedSize
+                            minimumPixelSize: 8
+                            wrapMode: SystemStyle.largeText ? Text.WordWrap : Text.NoWrap
                             color: tab.selected ? SystemStyle.tint : SystemStyle.inactive
                             elide: Text.ElideRight
                         }
@@ -175,5 +179,20 @@ FocusScope {
         id: importSheet
         readonly property bool needed: root.app.importController.state !== QVImportController.Idle
         onNeededChanged: if (needed && !item) setSource("QVImportSheet.qml", { controller: root.app.importController })
+    }
+    Loader { // the sheet of an export, likewise
+        readonly property bool needed: root.app.exportController.state !== QVExportController.Idle
+        onNeededChanged: if (needed && !item) setSource("QVExportSheet.qml", { controller: root.app.exportController })
+    }
+    Loader {
+        id: saveDialog
+        onLoaded: item.open()
+    }
+    Connections {
+        target: root.app.exportController
+        function onSaveDialogRequested() {
+            if (saveDialog.item) saveDialog.item.open()
+            else saveDialog.setSource("QVExportSaveDialog.qml", { controller: root.app.exportController })
+        }
     }
 }

@@ -25,6 +25,8 @@ void registerTypes() {
         qmlRegisterType<platform::AnnouncementItem>("Qelvar.Items", 1, 0, "Announcement");
         qmlRegisterUncreatableType<QVImportController>("Qelvar.Items", 1, 0, "QVImportController",
                                                        QStringLiteral("made by the application"));
+        qmlRegisterUncreatableType<QVExportController>("Qelvar.Items", 1, 0, "QVExportController",
+                                                       QStringLiteral("made by the application"));
     });
 }
 

@@ -23,6 +23,7 @@ class QVBarSeries : public QVChartSeries {
                              const QVEdgeInsets& insets,
                              std::shared_ptr<const QVChartDataSet> dataSet) override;
     void renderFill(QPainter& painter) const override;
+    bool drawsSecondaryFill() const override { return false; }
 
  protected:
     std::unique_ptr<QVChartSeries> clone() const override { return std::make_unique<QVBarSeries>(*this); }

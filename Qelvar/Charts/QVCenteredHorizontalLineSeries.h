@@ -18,6 +18,7 @@ class QVCenteredHorizontalLineSeries : public QVChartSeries {
 
     void renderChart(QPainter& painter) const override;
     void renderFill(QPainter& painter) const override;
+    bool drawsSecondaryFill() const override { return false; }
 
  protected:
     std::unique_ptr<QVChartSeries> clone() const override {

@@ -125,6 +125,7 @@ class QVChart {
     void layoutBackgroundView();
 
     void layoutAxisLabels();
+    std::vector<QVAxisLabel> shownAxisLabels() const;
     LayoutContext axisLabelLayout(const std::vector<QVAxisLabel>& labels) const;
     double xForDate(VSDate date) const;
     QRectF plotBounds() const;

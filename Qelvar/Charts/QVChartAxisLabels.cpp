@@ -3,6 +3,7 @@
 #include <QFontMetricsF>
 #include <algorithm>
 
+#include "Platform/TextScale.h"
 #include "Qelvar/Charts/QVChart.h"
 #include "Qelvar/Charts/QVChartDrawing.h"
 #include "Qelvar/Charts/QVChartSeries.h"
@@ -12,6 +13,8 @@ namespace {
 constexpr QVAnimationTime kAxisDuration{250'000};
 /// A text wider than its column by no more than this still fits.
 constexpr double kOverflowTolerance = 1.1920928955078125e-07;
+/// Larger texts shrink no further; rather some are left out.
+constexpr double kSmallestLargeRatio = 0.8;
 
 double textWidth(const QVAxisLabel& label) {
     return QFontMetricsF(label.labelFont).horizontalAdvance(label.text);
@@ -66,10 +69,26 @@ QVChart::LayoutContext QVChart::axisLabelLayout(const std::vector<QVAxisLabel>& 
     return context;
 }
 
+/// The labels of the axis; where larger texts are wanted and do not fit, every second or third.
+std::vector<QVAxisLabel> QVChart::shownAxisLabels() const {
+    if (!xAxisDescriptor_ || !xAxisDescriptor_->axisLabels()) return {};
+    std::vector<QVAxisLabel> labels = *xAxisDescriptor_->axisLabels();
+    if (platform::textScale() <= 1) return labels;
+    double widest = 0;
+    for (const QVAxisLabel& label : labels) widest = std::max(widest, textWidth(label));
+    const auto fits = [&](size_t step) {
+        const size_t count = (labels.size() + step - 1) / step;
+        return fittingRatio(widest, plotBounds().width() / static_cast<double>(count)) >= kSmallestLargeRatio;
+    };
+    size_t step = 1;
+    while (step < labels.size() && !fits(step)) ++step;
+    std::vector<QVAxisLabel> shown;
+    for (size_t i = 0; i < labels.size(); i += step) shown.push_back(std::move(labels[i]));
+    return shown;
+}
+
 void QVChart::layoutAxisLabels() {
-    static const std::vector<QVAxisLabel> kNone;
-    const auto* generated = xAxisDescriptor_ ? &xAxisDescriptor_->axisLabels() : nullptr;
-    const std::vector<QVAxisLabel>& labels = generated && *generated ? **generated : kNone;
+    const std::vector<QVAxisLabel> labels = shownAxisLabels();
     const LayoutContext context = axisLabelLayout(labels);
 
     const QVAnimationTime now = clock_();

@@ -46,7 +46,12 @@ QVChartRenderer::Images QVChartRenderer::Operation::draw() {
             series[i] = nullptr;
     }
     if (!separateFills) return {drawLayers({Layer::Fill, Layer::SecondaryFill, Layer::Chart}), {}, {}};
-    return {drawLayers({Layer::Chart}), drawLayers({Layer::Fill}), drawLayers({Layer::SecondaryFill})};
+    const auto any = [this](bool (QVChartSeries::*draws)() const) {
+        return std::any_of(series.begin(), series.end(),
+                           [draws](const auto& one) { return one && (one.get()->*draws)(); });
+    };
+    return {drawLayers({Layer::Chart}), any(&QVChartSeries::drawsFill) ? drawLayers({Layer::Fill}) : QImage(),
+            any(&QVChartSeries::drawsSecondaryFill) ? drawLayers({Layer::SecondaryFill}) : QImage()};
 }
 
 QImage QVChartRenderer::Operation::drawLayers(std::initializer_list<Layer> layers) const {

@@ -37,6 +37,9 @@ class QVChartSeries {
     virtual void renderChart(QPainter& painter) const;
     virtual void renderFill(QPainter& painter) const;
     virtual void renderSecondaryFill(QPainter& painter) const;
+    /// Whether the layer has anything on it, once prepared: one that is empty needs no image.
+    virtual bool drawsFill() const { return true; }
+    virtual bool drawsSecondaryFill() const { return true; }
     virtual void selectedPointIndexesUpdated(const std::vector<size_t>& indexes);
 
     QSizeF imageSize() const { return imageSize_; }

@@ -1,7 +1,12 @@
 #include "Qelvar/Charts/QVChartSeriesPointMarker.h"
 
+#include <QGuiApplication>
 #include <QPainter>
+#include <QScreen>
+#include <algorithm>
 #include <cmath>
+
+#include "Platform/TextScale.h"
 
 namespace {
 
@@ -46,4 +51,13 @@ QImage QVChartSeriesPointMarker::chartPointWithColor(const QColor& color, double
         painter.drawPolyline(style == QVPointStyle::DownwardChevron ? chevron : upsideDown(chevron, side));
     }
     return image;
+}
+
+QImage QVChartSeriesPointMarker::chartPointForText(const QColor& color, double radius, double lineWidth,
+                                                   QVPointStyle style) {
+    double pixels = 2;
+    for (const QScreen* screen : QGuiApplication::screens())
+        pixels = std::max(pixels, screen->devicePixelRatio());
+    const double scale = platform::textScale();
+    return chartPointWithColor(color, radius * scale, lineWidth * scale, style, pixels);
 }

@@ -12,4 +12,7 @@ class QVChartSeriesPointMarker {
     /// is its device pixel ratio); null for style None. Any thread.
     static QImage chartPointWithColor(const QColor& color, double radius, double lineWidth,
                                       QVPointStyle style, double scale = 2.0);
+    /// The same for a text: as large beside it as the person wants texts, and sharp on every screen. Main
+    /// thread only.
+    static QImage chartPointForText(const QColor& color, double radius, double lineWidth, QVPointStyle style);
 };

@@ -101,7 +101,7 @@ QString QVDottedAverageBackgroundView::boundText(double value, bool clampToDispl
 void QVDottedAverageBackgroundView::updateTexts() {
     minimumText_ = minValue() ? boundText(*minValue(), false) : QString();
     const std::optional<double> maximum = std::max(maxValue(), maxDataValue());  // none is less than any
-    maximumText_ = maxValue() && maximum ? boundText(*maximum, true) : QString();
+    maximumText_ = maximum ? boundText(*maximum, true) : QString();
 }
 
 void QVDottedAverageBackgroundView::layout(QSizeF size, double scale) {
@@ -124,7 +124,12 @@ void QVDottedAverageBackgroundView::layoutLabels() {
     maximumFrame_ = frame(maximumText_, labelPadding_);
     minimumFrame_ = frame(minimumText_, size().height() - height - labelPadding_);
 
-    const QFontMetricsF noDataMetrics(noDataLabelFont_);
+    shownNoDataFont_ = noDataLabelFont_;
+    const double noDataWidth = QFontMetricsF(noDataLabelFont_).horizontalAdvance(noDataText_);
+    if (noDataWidth > size().width() && noDataLabelFont_.pixelSize() > 0)
+        shownNoDataFont_.setPixelSize(
+            std::max(1, static_cast<int>(noDataLabelFont_.pixelSize() * size().width() / noDataWidth)));
+    const QFontMetricsF noDataMetrics(shownNoDataFont_);
     noDataFrame_ = QRectF(0, 0, upToPixel(noDataMetrics.horizontalAdvance(noDataText_)),
                           upToPixel(noDataMetrics.height()));
     noDataFrame_.moveTo(downToPixel((size().width() - noDataFrame_.width()) / 2),
@@ -181,5 +186,5 @@ void QVDottedAverageBackgroundView::paint(QPainter& painter) const {
     paintText(painter, maximumFrame_, maximumText_, labels);
     paintText(painter, minimumFrame_, minimumText_, labels);
     paintText(painter, noDataFrame_, noDataText_,
-              {noDataLabelFont_, noDataLabelColor_, noDataLabelFilter_, noDataOpacity_.value()});
+              {shownNoDataFont_, noDataLabelColor_, noDataLabelFilter_, noDataOpacity_.value()});
 }

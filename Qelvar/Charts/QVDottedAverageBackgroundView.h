@@ -70,7 +70,7 @@ class QVDottedAverageBackgroundView : public QVChartBackgroundView {
     double labelHeight_ = 0;
     QColor labelColor_ = Qt::white;
     QColor averageLineColor_ = Qt::white;
-    QFont noDataLabelFont_;
+    QFont noDataLabelFont_, shownNoDataFont_;
     QColor noDataLabelColor_ = Qt::white;
     QPainter::CompositionMode averageLineFilter_ = QPainter::CompositionMode_SourceOver;
     QPainter::CompositionMode labelFilter_ = QPainter::CompositionMode_SourceOver;

@@ -153,9 +153,13 @@ void QVLineSeries::fillBeneath(QPainter& layer, const QRectF& region, const QBru
     }
 }
 
+bool QVLineSeries::drawsGradient(const QVGradientObject& gradient, const std::vector<QRectF>& regions) const {
+    return dataPoints_.size() >= 2 && gradient.isValid() && !regions.empty();
+}
+
 void QVLineSeries::renderGradient(QPainter& painter, const QVGradientObject& gradient,
                                   const std::vector<QRectF>& regions) const {
-    if (dataPoints_.size() < 2 || !gradient.isValid() || regions.empty()) return;
+    if (!drawsGradient(gradient, regions)) return;
     QVPaintLayer(painter, imageSize(), 1, [&](QPainter& layer) {
         const QBrush brush(gradient.verticalGradient(0, imageSize().height()));
         for (const QRectF& region : regions) {

@@ -44,6 +44,8 @@ class QVLineSeries : public QVChartSeries {
     void renderChart(QPainter& painter) const override;
     void renderFill(QPainter& painter) const override;
     void renderSecondaryFill(QPainter& painter) const override;
+    bool drawsFill() const override { return drawsGradient(fillGradient_, regions_.connected); }
+    bool drawsSecondaryFill() const override { return drawsGradient(secondaryFillGradient_, regions_.gaps); }
 
     /// Stretches of the time axis, as full-height rectangles of the image: those where values follow each
     /// other, and those from the last value before missing ones to the first after them.
@@ -61,6 +63,7 @@ class QVLineSeries : public QVChartSeries {
     QPainterPath wavePath() const;
     void fillBeneath(QPainter& layer, const QRectF& region, const QBrush& brush) const;
     Regions findRegions() const;
+    bool drawsGradient(const QVGradientObject& gradient, const std::vector<QRectF>& regions) const;
     void renderGradient(QPainter& painter, const QVGradientObject& gradient,
                         const std::vector<QRectF>& regions) const;
     void strokeLine(QPainter& layer, const std::vector<QRectF>& regions, bool dashed) const;

@@ -28,6 +28,7 @@ class QVMinMaxSeries : public QVChartSeries {
                              std::shared_ptr<const QVChartDataSet> dataSet) override;
     void renderChart(QPainter& painter) const override;
     void renderFill(QPainter& painter) const override;
+    bool drawsSecondaryFill() const override { return false; }
 
  protected:
     std::unique_ptr<QVChartSeries> clone() const override { return std::make_unique<QVMinMaxSeries>(*this); }

@@ -21,6 +21,8 @@ class QVStackedDotSeries : public QVStackedValueSeries {
                              const QVEdgeInsets& insets,
                              std::shared_ptr<const QVChartDataSet> dataSet) override;
     void renderChart(QPainter& painter) const override;
+    bool drawsFill() const override { return false; }
+    bool drawsSecondaryFill() const override { return false; }
 
  protected:
     std::unique_ptr<QVChartSeries> clone() const override {

@@ -15,6 +15,7 @@ class QVStackedHorizontalLineSeries : public QVStackedValueSeries {
                              const QVEdgeInsets& insets,
                              std::shared_ptr<const QVChartDataSet> dataSet) override;
     void renderFill(QPainter& painter) const override;
+    bool drawsSecondaryFill() const override { return false; }
 
  protected:
     std::unique_ptr<QVChartSeries> clone() const override {

@@ -1,6 +1,7 @@
 #include "Qelvar/Charts/QVStackedValueSeries.h"
 
 #include <QFontMetricsF>
+#include <algorithm>
 
 #include "Qelvar/Charts/QVChartDrawing.h"
 
@@ -28,9 +29,13 @@ void QVStackedValueSeries::discardPreparation() {
 }
 
 void QVStackedValueSeries::renderChart(QPainter& painter) const {
-    const QFontMetricsF metrics(labelFont_);
+    QFont font = labelFont_;
+    const double rowHeight = yForRow(1) - yForRow(0);
+    if (const double height = QFontMetricsF(font).height(); height > rowHeight && font.pixelSize() > 0)
+        font.setPixelSize(std::max(1, static_cast<int>(font.pixelSize() * rowHeight / height)));
+    const QFontMetricsF metrics(font);
     painter.save();
-    painter.setFont(labelFont_);
+    painter.setFont(font);
     painter.setPen(labelColor_);
     for (size_t row = 0; row < enumeratedValueOrder_.size(); ++row) {
         const auto label = valueLabels_.find(enumeratedValueOrder_[row]);

@@ -16,6 +16,9 @@
 /// once, in the order in which they are declared, and live as long as it does. Main thread only.
 class QVControllerManager {
  public:
+    /// The name under which saved states refer to it, and the key of that reference.
+    static constexpr const char* RestorationIdentifier = "Controller Manager";
+
     /// The loader reads the demonstration's document; it is asked only when the local default "UseDemoData"
     /// is true.
     explicit QVControllerManager(std::shared_ptr<VSHealthStore> healthStore,

@@ -16,6 +16,14 @@ std::optional<int> integerItem(const QUrlQuery& query, const char* key) {
     return isNumber ? std::optional(value) : std::nullopt;
 }
 
+// Desktops put what looks like a host in lower case.
+QString tabOfAnyCase(const QString& name) {
+    for (const char* tab : {QVUserActivityTab::Dashboard, QVUserActivityTab::HealthData,
+                            QVUserActivityTab::Sources, QVUserActivityTab::MedicalID})
+        if (name.compare(QLatin1String(tab), Qt::CaseInsensitive) == 0) return QString::fromLatin1(tab);
+    return name;
+}
+
 }  // namespace
 
 std::shared_ptr<const platform::UserActivity> QVUserActivityManager::activity(
@@ -37,13 +45,13 @@ std::optional<platform::UserActivity> QVUserActivityManager::activityFromLink(co
     // Not QUrl::host(), which is in lower case.
     static const QString kScheme = QStringLiteral("qelvar://");
     if (!link.startsWith(kScheme, Qt::CaseInsensitive)) return std::nullopt;
-    const QString rest = link.mid(kScheme.size());
+    const QString rest = link.mid(kScheme.size()).section(QLatin1Char('#'), 0, 0);
     const qsizetype question = rest.indexOf(QLatin1Char('?'));
     QString tab = question < 0 ? rest : rest.left(question);
     while (tab.endsWith(QLatin1Char('/'))) tab.chop(1);
     const QUrlQuery query(question < 0 ? QString() : rest.mid(question + 1));
     const bool isCalendar = integerItem(query, QVUserActivityKey::Calendar).value_or(0) == 1;
-    return *activity({}, {}, tab.toUtf8().constData(), isCalendar,
+    return *activity({}, {}, tabOfAnyCase(tab).toUtf8().constData(), isCalendar,
                      integerItem(query, QVUserActivityKey::DataCategory),
                      integerItem(query, QVUserActivityKey::DataUnit));
 }

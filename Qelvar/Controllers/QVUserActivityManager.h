@@ -35,7 +35,8 @@ class QVUserActivityManager {
                                                                   std::optional<int> category = {},
                                                                   std::optional<int> dataUnit = {});
 
-    /// The activity that a link names: "qelvar://HealthDataTab", with "?DataCategory=6&DataUnit=59" or
-    /// "?Calendar=1". None when it is no link of the application. An unknown tab is kept as it is.
+    /// The activity that a link names: "qelvar://HealthDataTab", with "?DataCategory=2&DataUnit=59" or
+    /// "?Calendar=1". None when it is no link of the application. The case of the tab does not matter (those
+    /// who hand links on may change it); an unknown tab is kept as it is.
     static std::optional<platform::UserActivity> activityFromLink(const QString& link);
 };

@@ -16,17 +16,22 @@ constexpr double kFirstBaseline = 22;
 constexpr double kSecondBaseline = 36;
 constexpr double kAverageIconGap = 1.5, kAverageIconWidth = 7.5;
 constexpr double kChartTop = 44;
+constexpr double kHeight = 187, kAxisGutter = 33;
 constexpr int kSmallestFontPercent = 60, kFontStepPercent = 5;
+/// Larger texts shrink no further before the value gets a line of its own.
+constexpr double kSharedLineFactor = 0.85;
+/// What larger texts add to a card, for each further 100 %: to the header, to the axis, and half of what
+/// lines of their own take.
+constexpr double kHeaderGrowth = kChartTop, kAxisGrowth = 14, kOwnLineGrowth = 40;
 
-/// The largest factor of the fonts with which both texts fit; the smallest one when none does.
-double fittingFontFactor(const QVDashboardCellContent& content, double backgroundWidth, double iconRight,
-                         double iconGap) {
-    const double room = backgroundWidth - 2 * kMargin - iconRight - kTextGap - iconGap;
-    for (int percent = 100; percent > kSmallestFontPercent; percent -= kFontStepPercent) {
+/// The largest factor of the fonts with which the text fits; the smallest one when none does.
+double fittingFontFactor(const std::function<double(double)>& textWidth, double room,
+                         int smallestPercent = kSmallestFontPercent) {
+    for (int percent = 100; percent > smallestPercent; percent -= kFontStepPercent) {
         const double factor = percent / 100.0;
-        if (content.titleWidth(factor) + content.valueWidth(factor) <= room) return factor;
+        if (textWidth(factor) <= room) return factor;
     }
-    return kSmallestFontPercent / 100.0;
+    return smallestPercent / 100.0;
 }
 
 QRectF flooredToPixels(const QRectF& frame, double scale) {
@@ -35,54 +40,123 @@ QRectF flooredToPixels(const QRectF& frame, double scale) {
     return {floored(frame.x()), floored(frame.y()), floored(frame.width()), floored(frame.height())};
 }
 
+/// Everything in points of the background, from its left, as if in a left-to-right language.
+struct Header {
+    explicit Header(const QVDashboardCellContent& content)
+        : content_(content),
+          width_(std::max(0.0, content.width - 2 * kInset)),
+          right_(width_ - kTrailingMargin),
+          scale_(content.textScale) {
+        if (content.hasCategoryIcon)
+            icon = QRectF(kMargin, kIconTop * scale_, kIconWidth * scale_, kIconHeight * scale_);
+        left_ = content.hasCategoryIcon ? icon.right() + kIconGap : kMargin;
+        layOutFirstLine();
+        layOutSecondLine();
+        bottom = kChartTop * scale_ + ownLines_;
+    }
+
+    QRectF icon, title, value, average, averageIcon, updated;
+    double titleFactor = 1, valueFactor = 1;
+    double titleBaseline = 0, valueBaseline = 0, averageBaseline = 0, updatedBaseline = 0;
+    double bottom = 0;
+
+ private:
+    void layOutFirstLine() {
+        const double iconGap = content_.hasCategoryIcon ? kIconGap : 0;
+        const double room = width_ - 2 * kMargin - icon.right() - kTextGap - iconGap;
+        const auto bothWidths = [this](double factor) {
+            return content_.titleWidth(factor) + content_.valueWidth(factor);
+        };
+        titleFactor = valueFactor = fittingFontFactor(bothWidths, room);
+        titleBaseline = valueBaseline = kFirstBaseline * scale_;
+        const double lineHeight = content_.firstLineAscent + content_.firstLineDescent;
+        if (scale_ > 1 && titleFactor < kSharedLineFactor) {
+            const double wholeLine = std::max(0.0, right_ - left_);
+            // No further than to the size that texts have for others.
+            const int smallest = std::min(kSmallestFontPercent, static_cast<int>(std::ceil(100 / scale_)));
+            titleFactor = fittingFontFactor(content_.titleWidth, wholeLine, smallest);
+            valueFactor = fittingFontFactor(content_.valueWidth, wholeLine, smallest);
+            ownLines_ += lineHeight;
+            valueBaseline += lineHeight;
+            value = QRectF(left_, 0, std::min(wholeLine, content_.valueWidth(valueFactor)), 0);
+            title = QRectF(left_, 0, wholeLine, 0);
+        } else {
+            const double naturalTitle = content_.titleWidth(titleFactor);
+            const double naturalValue = content_.valueWidth(valueFactor);
+            const double tooClose = std::max(0.0, left_ + naturalTitle + kTextGap - (right_ - naturalValue));
+            const double valueWidth = std::max(0.0, naturalValue - tooClose);
+            value = QRectF(right_ - valueWidth, 0, valueWidth, 0);
+            title = QRectF(left_, 0, std::max(0.0, value.left() - kTextGap - left_), 0);
+        }
+        title.setTop(titleBaseline - content_.firstLineAscent * titleFactor);
+        title.setHeight(lineHeight * titleFactor);
+        value.setTop(valueBaseline - content_.firstLineAscent * valueFactor);
+        value.setHeight(lineHeight * valueFactor);
+    }
+
+    void layOutSecondLine() {
+        const double wholeLine = std::max(0.0, right_ - left_);
+        const double iconWidth = kAverageIconWidth * scale_;
+        averageBaseline = updatedBaseline = kSecondBaseline * scale_ + 1 / content_.screenScale + ownLines_;
+        const double lineHeight = content_.secondLineAscent + content_.secondLineDescent;
+        const double updatedWidth = std::min(content_.lastUpdatedWidth, wholeLine);
+        double updatedLeft = right_ - updatedWidth;
+        double averageWidth = content_.averageWidth;
+        const double overlap = std::max(0.0, left_ + averageWidth + kTextGap - updatedLeft);
+        if (scale_ > 1 && overlap > 0 && averageWidth > 0 && updatedWidth > 0) {
+            ownLines_ += lineHeight;
+            updatedBaseline += lineHeight;
+            updatedLeft = left_;
+            const double iconRoom = content_.hasAverageIcon ? kAverageIconGap + iconWidth : 0;
+            averageWidth = std::min(averageWidth, std::max(0.0, wholeLine - iconRoom));
+        } else if (updatedWidth > 0) {
+            averageWidth = std::max(0.0, averageWidth - overlap);
+        }
+        const double top = averageBaseline - content_.secondLineAscent;
+        average = QRectF(left_, top, averageWidth, lineHeight);
+        updated = QRectF(updatedLeft, updatedBaseline - content_.secondLineAscent, updatedWidth, lineHeight);
+        if (content_.hasAverageIcon)
+            averageIcon = QRectF(average.right() + kAverageIconGap, top, iconWidth, lineHeight);
+    }
+
+    const QVDashboardCellContent& content_;
+    const double width_, right_, scale_;
+    double left_ = 0;
+    double ownLines_ = 0;  // the height of the lines that texts have of their own
+};
+
 }  // namespace
 
+double QVDashboardCellLayout::preferredCellHeight(double textScale) {
+    return kHeight + std::round((textScale - 1) * (kHeaderGrowth + kAxisGrowth + kOwnLineGrowth));
+}
+
+double QVDashboardCellLayout::axisGutterHeight(double textScale) {
+    return kAxisGutter + std::round((textScale - 1) * kAxisGrowth);
+}
+
 QVDashboardCellLayout QVDashboardCellLayout::make(const QVDashboardCellContent& content) {
-    QVDashboardCellLayout layout;
-    const double pixel = 1 / content.screenScale;
+    const Header header(content);
     const double width = std::max(0.0, content.width - 2 * kInset);
-    // Everything below is in points of the background, from its left; the end moves and mirrors it.
-    const QRectF icon =
-        content.hasCategoryIcon ? QRectF(kMargin, kIconTop, kIconWidth, kIconHeight) : QRectF();
-    const double iconGap = content.hasCategoryIcon ? kIconGap : 0;
-    const double textLeft = content.hasCategoryIcon ? icon.right() + iconGap : kMargin;
-
-    layout.fontFactor = fittingFontFactor(content, width, icon.right(), iconGap);
-    const double naturalTitle = content.titleWidth(layout.fontFactor);
-    const double naturalValue = content.valueWidth(layout.fontFactor);
-    const double lineTop = kFirstBaseline - content.firstLineAscent * layout.fontFactor;
-    const double lineHeight = (content.firstLineAscent + content.firstLineDescent) * layout.fontFactor;
-    const double valueRight = width - kTrailingMargin;
-    const double tooClose = std::max(0.0, textLeft + naturalTitle + kTextGap - (valueRight - naturalValue));
-    const double valueWidth = std::max(0.0, naturalValue - tooClose);
-    QRectF value(valueRight - valueWidth, lineTop, valueWidth, lineHeight);
-    QRectF title(textLeft, lineTop, std::max(0.0, value.left() - kTextGap - textLeft), lineHeight);
-
-    const double secondBaseline = kSecondBaseline + pixel;
-    const double secondTop = secondBaseline - content.secondLineAscent;
-    const double secondHeight = content.secondLineAscent + content.secondLineDescent;
-    const double updatedWidth = std::min(content.lastUpdatedWidth, std::max(0.0, valueRight - textLeft));
-    const QRectF updated(valueRight - updatedWidth, secondTop, updatedWidth, secondHeight);
-    const double overlap = std::max(0.0, textLeft + content.averageWidth + kTextGap - updated.left());
-    const double averageWidth = std::max(0.0, content.averageWidth - (updatedWidth > 0 ? overlap : 0));
-    const QRectF average(textLeft, secondTop, averageWidth, secondHeight);
-    const QRectF averageIcon = content.hasAverageIcon ? QRectF(average.right() + kAverageIconGap, secondTop,
-                                                               kAverageIconWidth, secondHeight)
-                                                      : QRectF();
-
-    layout.background = QRectF(kInset, kInset, width, preferredCellHeight - kInset);
+    QVDashboardCellLayout layout;
+    layout.fontFactor = header.titleFactor;
+    layout.valueFactor = header.valueFactor;
+    layout.background = QRectF(kInset, kInset, width, preferredCellHeight(content.textScale) - kInset);
     const auto placed = [&](QRectF frame) {
         if (content.rightToLeft) frame.moveLeft(width - frame.right());
         return flooredToPixels(frame.translated(layout.background.topLeft()), content.screenScale);
     };
-    if (content.hasCategoryIcon) layout.categoryIcon = placed(icon);
-    layout.title = placed(title);
-    layout.value = placed(value);
-    layout.average = placed(average);
-    if (content.hasAverageIcon) layout.averageIcon = placed(averageIcon);
-    layout.lastUpdated = placed(updated);
-    layout.chart = placed(QRectF(0, kChartTop, width, layout.background.height() - kChartTop));
-    layout.firstBaseline = layout.background.top() + kFirstBaseline;
-    layout.secondBaseline = layout.background.top() + secondBaseline;
+    if (content.hasCategoryIcon) layout.categoryIcon = placed(header.icon);
+    layout.title = placed(header.title);
+    layout.value = placed(header.value);
+    layout.average = placed(header.average);
+    if (content.hasAverageIcon) layout.averageIcon = placed(header.averageIcon);
+    layout.lastUpdated = placed(header.updated);
+    layout.chart = placed(QRectF(0, header.bottom, width, layout.background.height() - header.bottom));
+    const double top = layout.background.top();
+    layout.firstBaseline = top + header.titleBaseline;
+    layout.valueBaseline = top + header.valueBaseline;
+    layout.secondBaseline = top + header.averageBaseline;
+    layout.lastUpdatedBaseline = top + header.updatedBaseline;
     return layout;
 }

@@ -3,6 +3,7 @@
 #include <QStringList>
 
 #include "Platform/Queue.h"
+#include "Platform/TextScale.h"
 #include "Qelvar/Formatters/QVDataUnitValueFormatter.h"
 #include "Qelvar/Formatters/QVNumberFormatters.h"
 
@@ -27,7 +28,9 @@ QVDashboardChartItem::QVDashboardChartItem(const VSDataUnitGroup* dataUnitGroup,
 
 void QVDashboardChartItem::setLocaleDidChange(bool changed) {
     localeDidChange_ = changed;
-    if (changed) dataProvider_->localeDidChange();
+    if (!changed) return;
+    dataProvider_->localeDidChange();
+    if (startDate_) chartRenderer_->setChartInsets(chartInsetsForTimeScope(timeScope_));
 }
 
 void QVDashboardChartItem::activate() {
@@ -55,7 +58,7 @@ void QVDashboardChartItem::updateDateRange(QVDateCache& dateCache, QVTimeScope t
     startDate_ = start;
     endDate_ = end;
     timeScope_ = timeScope;
-    if (same) return;
+    if (same) return dataProvider_->dayDidChange();
     chartRenderer_->setMinXValue(start);
     chartRenderer_->setMaxXValue(end);
     chartRenderer_->setChartInsets(chartInsetsForTimeScope(timeScope));
@@ -64,15 +67,17 @@ void QVDashboardChartItem::updateDateRange(QVDateCache& dateCache, QVTimeScope t
 }
 
 QVEdgeInsets QVDashboardChartItem::chartInsetsForTimeScope(QVTimeScope timeScope) {
+    // The labels of the axis and of the bounds stand there.
+    const double scale = platform::textScale();
     switch (timeScope) {
         case QVTimeScope::Day:
-            return {.top = 0, .left = 26, .bottom = 0, .right = 38};
+            return {.top = 0, .left = 26 * scale, .bottom = 0, .right = 38 * scale};
         case QVTimeScope::Week:
-            return {.top = 0, .left = 13, .bottom = 0, .right = 39};
+            return {.top = 0, .left = 13 * scale, .bottom = 0, .right = 39 * scale};
         case QVTimeScope::Month:
-            return {.top = 0, .left = 24, .bottom = 0, .right = 36};
+            return {.top = 0, .left = 24 * scale, .bottom = 0, .right = 36 * scale};
         case QVTimeScope::Year:
-            return {.top = 0, .left = 14, .bottom = 0, .right = 41};
+            return {.top = 0, .left = 14 * scale, .bottom = 0, .right = 41 * scale};
         case QVTimeScope::Hour:
             break;
     }
@@ -81,7 +86,7 @@ QVEdgeInsets QVDashboardChartItem::chartInsetsForTimeScope(QVTimeScope timeScope
 
 platform::StyledText QVDashboardChartItem::mostRecentValue(const QFont& valueFont,
                                                            const QFont& unitFont) const {
-    if (!dataProvider_->hasLoadedCurrentValueData()) return {};
+    if (!dataProvider_->holdsCurrentValueData()) return {};
     const auto& units = dataUnitGroup_->dataUnits();
     if (units.size() == 1) {
         const auto value = singleCurrentValue();

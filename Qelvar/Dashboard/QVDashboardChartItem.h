@@ -60,8 +60,8 @@ class QVDashboardChartItem final : public QVGroupDataProviderDelegate {
     void deactivate();
     /// Loads everything anew, after the order of the sources changed.
     void invalidateChart();
-    /// Takes the span of the time scope from the cache. Nothing happens when scope and span are the present
-    /// ones.
+    /// Takes the span of the time scope from the cache. When scope and span are the present ones, only what
+    /// concerned another day is asked for again.
     void updateDateRange(QVDateCache& dateCache, QVTimeScope timeScope);
 
     /// The current value with its unit; empty before it was loaded.

@@ -8,12 +8,14 @@
 
 #include "Platform/Icons.h"
 #include "Platform/Localization.h"
+#include "Platform/TextScale.h"
 #include "Qelvar/Charts/QVHourAxisDescriptor.h"
 #include "Qelvar/Charts/QVMonthAxisDescriptor.h"
 #include "Qelvar/Charts/QVYearAxisDescriptor.h"
 #include "Qelvar/Dashboard/QVDashboardViewController.h"
 #include "Qelvar/Formatters/QVDataUnitGroupLabels.h"
 #include "Qelvar/Formatters/QVDateFormatters.h"
+#include "Vessa/Base/VSEnvironment.h"
 
 namespace {
 
@@ -96,17 +98,14 @@ QVDashboardTableViewCell::QVDashboardTableViewCell(QQuickItem* parent)
       chartBackground_(std::make_shared<QVDottedAverageBackgroundView>()),
       observer_(std::make_shared<Observer>(*this)) {
     setFlag(ItemHasContents);
-    setImplicitHeight(preferredCellHeight());
 
     chart_.setChartFillCompositingFilter(QPainter::CompositionMode_Overlay);
     chart_.setChartSecondaryFillCompositingFilter(QPainter::CompositionMode_SoftLight);
     chart_.setAnimationStyle(QVChart::AnimationStyle::CrossFade);
     chart_.setAnimationDuration(kCrossFade);
     chart_.setDividerInset(kDividerInset);
-    chartBackground_->setLabelFont(platform::systemFont(kChartLabelFontSize));
     chartBackground_->setLabelColor(kHalfWhite);
     chartBackground_->setNoDataLabelColor(kHalfWhite);
-    chartBackground_->setNoDataLabelFont(platform::systemFont(kNoDataFontSize));
     chartBackground_->setLabelCompositingFilter(kPlusLighter);
     chartBackground_->setNoDataLabelCompositingFilter(kPlusLighter);
     chartBackground_->setAverageLineCompositingFilter(QPainter::CompositionMode_Overlay);
@@ -117,6 +116,22 @@ QVDashboardTableViewCell::QVDashboardTableViewCell(QQuickItem* parent)
     });
     chart_.setChartBackgroundView(chartBackground_);
     chart_.onNeedsRepaint = [this] { contentLooksDifferent(); };
+    takeTextScale();
+    connect(&platform::TextScale::shared(), &platform::TextScale::factorChanged, this,
+            &QVDashboardTableViewCell::takeTextScale);
+}
+
+double QVDashboardTableViewCell::preferredCellHeight() {
+    return QVDashboardCellLayout::preferredCellHeight(platform::textScale());
+}
+
+/// Takes the fonts and measures that are not asked for anew with each layout.
+void QVDashboardTableViewCell::takeTextScale() {
+    setImplicitHeight(preferredCellHeight());
+    chartBackground_->setLabelFont(platform::systemFont(kChartLabelFontSize));
+    chartBackground_->setNoDataLabelFont(platform::systemFont(kNoDataFontSize));
+    chart_.setXAxisGutterHeight(QVDashboardCellLayout::axisGutterHeight(platform::textScale()));
+    stillPartLooksDifferent();
 }
 
 QVDashboardTableViewCell::~QVDashboardTableViewCell() {
@@ -164,13 +179,17 @@ void QVDashboardTableViewCell::setDateCache(const std::shared_ptr<QVDateCache>& 
 void QVDashboardTableViewCell::setChartItem(std::shared_ptr<QVDashboardChartItem> item) {
     if (item != chartItem_) {
         chartItem_ = std::move(item);
+        still_.reset();
         if (!chartItem_) return;
         chartItem_->setDelegate(observer_);
         chart_.setChartRenderer(chartItem_->chartRenderer());
         if (timeScope_) rebuildTimeBasedContent();
         chart_.reloadData(false);
     }
-    if (chartItem_ && chartItem_->localeDidChange()) {
+    // Another card, on its way out, may have cleared the item's mark.
+    const bool isOutdated =
+        textsLocale_ != VSEnvironment::current()->localeIdentifier() || textsScale_ != platform::textScale();
+    if (chartItem_ && (chartItem_->localeDidChange() || (timeScope_ && isOutdated))) {
         chartItem_->setLocaleDidChange(false);
         if (timeScope_) rebuildTimeBasedContent();
     }
@@ -199,6 +218,8 @@ void QVDashboardTableViewCell::rebuildTimeBasedContent() {
 
 void QVDashboardTableViewCell::refreshTexts() {
     const VSDataUnitGroup& group = *chartItem_->dataUnitGroup();
+    textsLocale_ = VSEnvironment::current()->localeIdentifier();
+    textsScale_ = platform::textScale();
     title_ = group.displayName();
     categoryIconName_ = group.isNikeFuel() ? group.groupIcon() : QString();
     average_ = chartItem_->secondaryValue();
@@ -208,7 +229,7 @@ void QVDashboardTableViewCell::refreshTexts() {
     const auto updated = chartItem_->lastUpdated();
     lastUpdated_ = updated ? QVLastUpdatedString(*updated) : QString();
     emit contentChanged();
-    contentLooksDifferent();
+    stillPartLooksDifferent();
 }
 
 QString QVDashboardTableViewCell::accessibleValue() const {
@@ -246,6 +267,7 @@ QVDashboardCellContent QVDashboardTableViewCell::layoutContent() const {
     QVDashboardCellContent content;
     content.width = width();
     const double scale = content.screenScale = screenScale();
+    content.textScale = platform::textScale();
     content.rightToLeft = platform::isRightToLeft();
     content.hasCategoryIcon = !categoryIconName_.isEmpty();
     content.hasAverageIcon = !averageIconName_.isEmpty();
@@ -278,8 +300,8 @@ void QVDashboardTableViewCell::paintTexts(QPainter& painter, const QVDashboardCe
                           platform::icon(categoryIconName_, layout.categoryIcon.size(), scale));
     drawLine(painter, platform::StyledText(title_), layout.title, layout.firstBaseline, titleFont, kWhite,
              rightToLeft, layout.fontFactor);
-    drawLine(painter, value_, layout.value, layout.firstBaseline, titleFont, kWhite, !rightToLeft,
-             layout.fontFactor);
+    drawLine(painter, value_, layout.value, layout.valueBaseline, titleFont, kWhite, !rightToLeft,
+             layout.valueFactor);
 
     painter.setCompositionMode(kPlusLighter);
     drawLine(painter, average_, layout.average, layout.secondBaseline, secondFont, kHalfWhite, rightToLeft);
@@ -290,7 +312,7 @@ void QVDashboardTableViewCell::paintTexts(QPainter& painter, const QVDashboardCe
         painter.drawImage(layout.averageIcon, icon);
         painter.setOpacity(1);
     }
-    drawLine(painter, platform::StyledText(lastUpdated_), layout.lastUpdated, layout.secondBaseline,
+    drawLine(painter, platform::StyledText(lastUpdated_), layout.lastUpdated, layout.lastUpdatedBaseline,
              secondFont, kHalfWhite, !rightToLeft);
     painter.setCompositionMode(QPainter::CompositionMode_SourceOver);
 }
@@ -303,38 +325,50 @@ QImage QVDashboardTableViewCell::renderCard() {
     return renderOn(Qt::transparent, screenScale());
 }
 
-QImage QVDashboardTableViewCell::renderOn(const QColor& ground, double scale) {
+/// What does not move: the colours and the texts. No text stands where the chart draws.
+QVDashboardTableViewCell::StillPart QVDashboardTableViewCell::paintStillPart(const QColor& ground,
+                                                                             double scale) const {
     const QSize pixels(qCeil(width() * scale), qCeil(height() * scale));
-    QImage image(pixels, QImage::Format_ARGB32_Premultiplied);
-    image.setDevicePixelRatio(scale);
-    image.fill(ground);
-    if (!chartItem_ || pixels.isEmpty()) return image;
-    const QVDashboardCellLayout layout = cellLayout();
-    QPainter painter(&image);
+    // Without transparency the scene takes the image as it is.
+    const bool isOpaque = ground.alpha() == 255;
+    StillPart still{QImage(pixels, isOpaque ? QImage::Format_RGB32 : QImage::Format_ARGB32_Premultiplied),
+                    cellLayout()};
+    still.image.setDevicePixelRatio(scale);
+    still.image.fill(ground);
+    if (!chartItem_ || pixels.isEmpty()) return still;
+    const QRectF& background = still.layout.background;
+    QPainter painter(&still.image);
     painter.setRenderHints(QPainter::Antialiasing | QPainter::TextAntialiasing |
                            QPainter::SmoothPixmapTransform);
-    painter.drawImage(layout.background.topLeft(),
-                      chartItem_->dataCategory()->roundedGradient(layout.background.size(), scale));
-    chart_.setSize(layout.chart.size(), scale);
-    painter.save();
-    painter.setClipRect(layout.background);
-    chart_.paint(painter, layout.chart.topLeft());
-    painter.restore();
-    paintTexts(painter, layout);
+    painter.drawImage(background.topLeft(),
+                      chartItem_->dataCategory()->roundedGradient(background.size(), scale));
+    paintTexts(painter, still.layout);
+    return still;
+}
+
+QImage QVDashboardTableViewCell::renderOn(const QColor& ground, double scale) {
+    // While the chart moves every frame shows the same still part.
+    const bool isKept = ground == Qt::white && scale == screenScale();
+    StillPart still = isKept && still_ ? *still_ : paintStillPart(ground, scale);
+    if (isKept) still_ = still;
+    if (!chartItem_ || still.image.isNull()) return still.image;
+    chart_.setSize(still.layout.chart.size(), scale);
+    QPainter painter(&still.image);
+    painter.setClipRect(still.layout.background);
+    chart_.paint(painter, still.layout.chart.topLeft());
+    painter.end();
     describeChart();
-    return image;
+    return still.image;
 }
 
 bool QVDashboardTableViewCell::showsItsData() const {
     if (!chartItem_ || !timeScope_) return false;
-    const QVGroupDataProvider& provider = *chartItem_->dataProvider();
-    return provider.hasLoadedHistoricalData() && provider.hasLoadedCurrentValueData() &&
-           provider.hasLoadedSecondaryValueData() && chartItem_->chartRenderer()->finishedLoadingData();
+    return !chartItem_->dataProvider()->isWaiting() && chartItem_->chartRenderer()->finishedLoadingData();
 }
 
 void QVDashboardTableViewCell::geometryChange(const QRectF& newGeometry, const QRectF& oldGeometry) {
     QQuickItem::geometryChange(newGeometry, oldGeometry);
-    if (newGeometry.size() != oldGeometry.size()) contentLooksDifferent();
+    if (newGeometry.size() != oldGeometry.size()) stillPartLooksDifferent();
 }
 
 void QVDashboardTableViewCell::itemChange(ItemChange change, const ItemChangeData& data) {
@@ -350,7 +384,12 @@ void QVDashboardTableViewCell::itemChange(ItemChange change, const ItemChangeDat
                                  &QVDashboardTableViewCell::contentLooksDifferent);
         }
     }
-    if (change == ItemDevicePixelRatioHasChanged || change == ItemSceneChange) contentLooksDifferent();
+    if (change == ItemDevicePixelRatioHasChanged || change == ItemSceneChange) stillPartLooksDifferent();
+}
+
+void QVDashboardTableViewCell::stillPartLooksDifferent() {
+    still_.reset();
+    contentLooksDifferent();
 }
 
 void QVDashboardTableViewCell::contentLooksDifferent() {

@@ -4,6 +4,7 @@
 #include <QQuickItem>
 #include <memory>
 #include <optional>
+#include <string>
 
 #include "Platform/StyledText.h"
 #include "Qelvar/Charts/QVChart.h"
@@ -32,7 +33,8 @@ class QVDashboardTableViewCell : public QQuickItem {
     explicit QVDashboardTableViewCell(QQuickItem* parent = nullptr);
     ~QVDashboardTableViewCell() override;
 
-    static double preferredCellHeight() { return QVDashboardCellLayout::preferredCellHeight; }
+    /// What every card is high, with texts as large as the person wants them.
+    static double preferredCellHeight();
 
     QVDashboardViewController* screen() const { return screen_; }
     void setScreen(QVDashboardViewController* screen);
@@ -93,13 +95,20 @@ class QVDashboardTableViewCell : public QQuickItem {
     struct Observer;
 
     void prepare();
+    void takeTextScale();
     void rebuildTimeBasedContent();
     void refreshTexts();
     void describeChart();
     void contentLooksDifferent();
+    void stillPartLooksDifferent();
     void animateFrames();
     double screenScale() const;
     QVDashboardCellContent layoutContent() const;
+    struct StillPart {
+        QImage image;
+        QVDashboardCellLayout layout;
+    };
+    StillPart paintStillPart(const QColor& ground, double scale) const;
     QImage renderOn(const QColor& ground, double scale);
     void paintTexts(QPainter& painter, const QVDashboardCellLayout& layout) const;
 
@@ -112,6 +121,8 @@ class QVDashboardTableViewCell : public QQuickItem {
     platform::StyledText value_;
     platform::StyledText average_;
     QString title_, lastUpdated_, chartDescription_;
+    std::string textsLocale_;  // of which they are
+    double textsScale_ = 0;
 
     std::shared_ptr<QVDottedAverageBackgroundView> chartBackground_;
     std::weak_ptr<QVDateCache> dateCache_;
@@ -121,6 +132,7 @@ class QVDashboardTableViewCell : public QQuickItem {
 
     std::shared_ptr<Observer> observer_;
     QMetaObject::Connection frames_, sceneLoss_;
+    std::optional<StillPart> still_;  // at the screen's scale
     QImage image_;
     enum class Painted { Outdated, WithData, Settled };
     Painted painted_ = Painted::Outdated;

@@ -6,7 +6,9 @@
 #include "Platform/Announcement.h"
 #include "Platform/Localization.h"
 #include "Platform/NavigationStack.h"
+#include "Platform/RestorableState.h"
 #include "Platform/SystemEvents.h"
+#include "Platform/TextScale.h"
 #include "Qelvar/Controllers/QVUserActivityManager.h"
 #include "Qelvar/Dashboard/QVDashboardTable.h"
 #include "Qelvar/Dashboard/QVDashboardTableViewCell.h"
@@ -15,6 +17,11 @@
 namespace {
 
 constexpr double kDraggingViewOpacity = 0.8;
+
+// In saved states; never changed.
+constexpr const char* kTimeScopeKey = "Time Scope";
+constexpr const char* kTableKey = "Dashboard TableView";
+constexpr const char* kOffsetKey = "Offset";
 
 QVTimeScopeControl* makeControl() {
     return new QVTimeScopeControl(
@@ -71,6 +78,10 @@ QVDashboardViewController::QVDashboardViewController(std::shared_ptr<QVControlle
     setTitle(platform::localized("DASHBOARD"));
     connect(&platform::SystemEvents::shared(), &platform::SystemEvents::localeDidChange, this,
             &QVDashboardViewController::localeDidChange);
+    connect(&platform::TextScale::shared(), &platform::TextScale::factorChanged, this, [this] {
+        emit rowHeightChanged();
+        localeDidChange();
+    });
     setUserActivity(QVUserActivityManager::activity(title(), {}, QVUserActivityTab::Dashboard));
     connect(timeScopeControl_.get(), &QVTimeScopeControl::valueChanged, this,
             &QVDashboardViewController::timeScopeDidChange);
@@ -109,12 +120,13 @@ QString QVDashboardViewController::moveHelp() const {
 }
 
 double QVDashboardViewController::emptyStateHelpMargin(double screenWidth) {
-    if (screenWidth > 375) return 10;
+    if (screenWidth > 375 || platform::textScale() > 1) return 10;
     return screenWidth > 320 ? 50 : 20;
 }
 
 void QVDashboardViewController::willAppear() {
     controllerManager_->dashboardDataUnitGroupsController().addObserver(observer_);
+    controllerManager_->dashboardDataUnitGroupsController().loadAgainIfFailed();
     reloadDataUnitGroups();
     timeScopeControl_->setSelectedTimeScope(
         controllerManager_->selectedTimeScopeController().selectedTimeScope());
@@ -261,10 +273,12 @@ void QVDashboardViewController::timeScopeDidChange() {
     controllerManager_->selectedTimeScopeController().setSelectedTimeScope(
         timeScopeControl_->selectedTimeScope());
     reloadTable();
+    emit restorableStateChanged();
 }
 
 void QVDashboardViewController::localeDidChange() {
     setTitle(platform::localized("DASHBOARD"));
+    setUserActivity(QVUserActivityManager::activity(title(), {}, QVUserActivityTab::Dashboard));
     timeScopeControl_->updateTitles();
     emit textsChanged();
     table_->updateNames();
@@ -283,6 +297,20 @@ void QVDashboardViewController::dataProviderOrderUpdated(const VSObjectType* dat
 }
 
 // What a later session begins with
+
+void QVDashboardViewController::encodeRestorableState(platform::RestorableState& state) const {
+    state.setObject(QVControllerManager::RestorationIdentifier, controllerManager_.get());
+    state.set(kTimeScopeKey, static_cast<int64_t>(selectedTimeScope()));
+    state.set(kTableKey, VSValue::Dictionary{{kOffsetKey, scrollOffset()}});
+}
+
+void QVDashboardViewController::decodeRestorableState(const platform::RestorableState& state) {
+    if (const auto timeScope = state.integer(kTimeScopeKey))
+        restoreTimeScope(static_cast<QVTimeScope>(*timeScope));
+    const VSValue* table = state.value(kTableKey);
+    const VSValue* offset = table ? (*table)[kOffsetKey] : nullptr;
+    if (offset && offset->number()) restoreScrollOffset(*offset->number());
+}
 
 void QVDashboardViewController::restoreTimeScope(QVTimeScope timeScope) {
     if (!contains(timeScopeControl_->timeScopes(), timeScope)) return;

@@ -69,8 +69,11 @@ class QVDashboardViewController : public QVReorderableTableViewController {
     /// Makes every visible card take its row's content again.
     void reloadTable();
 
-    // What a later session may begin with.
+    // What a later session begins with.
 
+    QString restorationIdentifier() const override { return QStringLiteral("Dashboard View Controller"); }
+    void encodeRestorableState(platform::RestorableState& state) const override;
+    void decodeRestorableState(const platform::RestorableState& state) override;
     QVTimeScope selectedTimeScope() const { return timeScopeControl_->selectedTimeScope(); }
     /// A time scope that is not offered changes nothing.
     void restoreTimeScope(QVTimeScope timeScope);

@@ -13,7 +13,7 @@ FocusScope {
     Rectangle {
         id: paletteBar
         width: parent.width
-        height: 39
+        height: SystemStyle.grown(39, 18)
         color: SystemStyle.bar
         z: 1
         QVTimeScopeControlBar {
@@ -49,10 +49,11 @@ FocusScope {
         Accessible.description: screen.moveHelp
 
         // The screen computes with what the table looks like, and says where it is to be.
-        function tellGeometry() { screen.setTableGeometry(width, height, SystemStyle.pixel, screen.rowHeight, bottomMargin) }
+        function tellGeometry() { if (screen) screen.setTableGeometry(width, visible ? height : 0, SystemStyle.pixel, screen.rowHeight, bottomMargin) }
         function tellOffset() { screen.tableDidScroll(contentY - originY) }
         onWidthChanged: tellGeometry()
         onHeightChanged: tellGeometry()
+        onVisibleChanged: tellGeometry() // scrolled while it is covered it would not stay so
         onContentYChanged: tellOffset()
         onOriginYChanged: tellOffset()
         Component.onCompleted: tellGeometry()
@@ -173,15 +174,20 @@ FocusScope {
     onWindowIsActiveChanged: if (!windowIsActive) root.screen.finishReordering()
     Component.onDestruction: if (root.screen) root.screen.finishReordering()
 
-    Item {
+    Flickable {
         id: emptyState
         anchors.fill: table
         visible: root.screen.showsEmptyState
+        contentHeight: Math.max(height, importButton.y + importButton.height + 8)
+        interactive: contentHeight > height
+        boundsBehavior: Flickable.StopAtBounds
         readonly property real helpMargin: root.screen.emptyStateHelpMargin(width)
+        readonly property real belowIcon: Math.max(47, 8 + emptyTitle.height) + 10 + help.height + 8 + importButton.height + 8
         Icon {
             id: icon
             anchors.horizontalCenter: parent.horizontalCenter
-            anchors.bottom: parent.verticalCenter
+            // Above the middle; higher where what is beneath it needs the room.
+            y: Math.max(8, Math.min(emptyState.height / 2, emptyState.height - emptyState.belowIcon) - height)
             width: 64
             height: 64
             name: "dashboard_glyph_emptydashboard"
@@ -189,10 +195,10 @@ FocusScope {
         Text {
             id: emptyTitle
             width: parent.width
-            y: icon.y + icon.height + 47 - height
+            y: icon.y + icon.height + Math.max(8, 47 - height)
             text: root.screen.emptyStateTitle
             horizontalAlignment: Text.AlignHCenter
-            font.pixelSize: 27
+            font.pixelSize: SystemStyle.scaled(27)
             fontSizeMode: Text.HorizontalFit
             minimumPixelSize: 15
             maximumLineCount: 1
@@ -211,17 +217,20 @@ FocusScope {
             text: root.screen.emptyStateHelp
             horizontalAlignment: Text.AlignHCenter
             wrapMode: Text.WordWrap
-            font.pixelSize: 18
+            font.pixelSize: SystemStyle.scaled(18)
             color: SystemStyle.inactive
             Accessible.role: Accessible.StaticText
             Accessible.name: text
         }
         SystemButton {
+            id: importButton
             anchors.top: help.bottom
             anchors.topMargin: 8
             anchors.horizontalCenter: parent.horizontalCenter
+            width: Math.min(implicitWidth, parent.width)
             text: root.screen.importTitle
             onClicked: root.screen.importRequested()
+            onActiveFocusChanged: if (activeFocus) emptyState.contentY = emptyState.contentHeight - emptyState.height
         }
     }
 }

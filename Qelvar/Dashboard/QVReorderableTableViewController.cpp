@@ -46,6 +46,7 @@ void QVReorderableTableViewController::setTableGeometry(double width, double vis
 void QVReorderableTableViewController::tableDidScroll(double contentOffset) {
     if (placing_ || contentOffset == geometry_.contentOffset) return;
     geometry_.contentOffset = contentOffset;
+    emit restorableStateChanged();
     if (isDragging())
         followTouch();
     else if (phase_ != Phase::Idle)

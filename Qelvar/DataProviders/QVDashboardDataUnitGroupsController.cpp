@@ -62,6 +62,32 @@ Groups withoutRepetition(const Groups& groups) {
     return result;
 }
 
+/// Those of `groups` that `others` holds too.
+Groups sharedWith(const Groups& others, const Groups& groups) {
+    Groups result;
+    for (const VSDataUnitGroup* group : groups)
+        if (contains(others, group)) result.push_back(group);
+    return result;
+}
+
+/// `list` after what made `after` of `before`: what was removed is gone, what was moved stands in its new
+/// order in the places that these had, and what was added stands at the end. What `before` never held stays.
+Groups withChange(const Groups& list, const Groups& before, const Groups& after) {
+    Groups result = withoutRepetition(list);
+    std::erase_if(result, [&](const VSDataUnitGroup* group) {
+        return contains(before, group) && !contains(after, group);
+    });
+    if (sharedWith(after, before) != sharedWith(before, after)) {
+        const Groups ordered = sharedWith(result, withoutRepetition(after));
+        auto next = ordered.begin();
+        for (const VSDataUnitGroup*& group : result)
+            if (contains(ordered, group)) group = *next++;
+    }
+    for (const VSDataUnitGroup* group : after)
+        if (!contains(before, group) && !contains(result, group)) result.push_back(group);
+    return result;
+}
+
 const VSObjectType* typeForDemoIdentifier(const std::string& identifier) {
     if (const auto* type = VSObjectType::quantityTypeForIdentifier(identifier)) return type;
     if (const auto* type = VSObjectType::categoryTypeForIdentifier(identifier)) return type;
@@ -94,20 +120,49 @@ QVDashboardDataUnitGroupsController::~QVDashboardDataUnitGroupsController() {
 // Loading
 
 void QVDashboardDataUnitGroupsController::load() {
+    if (std::exchange(isReading_, true)) return;
     userDefaults_.valueForKey(dashboardKey, [this, alive = std::weak_ptr<bool>(alive_)](const auto& answer) {
-        platform::mainQueue().async([this, alive, ids = storedIDs(answer, dashboardKey)] {
-            if (!alive.expired()) dashboardRead(ids);
-        });
+        platform::mainQueue().async(
+            [this, alive, ids = storedIDs(answer, dashboardKey), wasRead = answer.ok()] {
+                if (!alive.expired()) dashboardRead(ids, wasRead);
+            });
     });
 }
 
-void QVDashboardDataUnitGroupsController::dashboardRead(const std::optional<std::vector<int>>& storedIDs) {
-    if (dashboard_) return loadSelection();  // set by the user, while it was being read
-    dashboard_ = groupsWithIDs(storedIDs ? *storedIDs : hardwareDefaultIDs());
+void QVDashboardDataUnitGroupsController::loadAgainIfFailed() {
+    if (loadState_ == LoadState::Failed)
+        load();
+    else if (selectionState_ == LoadState::Failed)
+        loadSelection();
+}
+
+void QVDashboardDataUnitGroupsController::dashboardRead(const std::optional<std::vector<int>>& storedIDs,
+                                                        bool wasRead) {
+    isReading_ = false;
+    if (loadState_ == LoadState::Loaded) return loadSelection();  // set by the user, while it was being read
+    if (!wasRead) return dashboardCouldNotBeRead();
+    const bool wasFailed = std::exchange(loadState_, LoadState::Loaded) == LoadState::Failed;
+    const Groups read = groupsWithIDs(storedIDs ? *storedIDs : hardwareDefaultIDs());
+    const bool wasChanged = wasFailed && *dashboard_ != standIn_;
+    dashboard_ = wasChanged ? withChange(read, standIn_, *dashboard_) : read;
+    if (wasChanged) persistDashboard();
     if (platform::PairedDevices::shared().hasActivePairedDevice()) addGroupsForPairedWatch();
     tellObservers();
     for (const auto& change : std::exchange(afterLoading_, {})) change();
     // Only now, so that the default selection sees the dashboard that it is taken from.
+    loadSelection();
+}
+
+void QVDashboardDataUnitGroupsController::dashboardCouldNotBeRead() {
+    if (loadState_ == LoadState::Failed) {
+        if (*dashboard_ != standIn_) VSLog(VSLogLevel::Error, "Error saving user defaults");
+        return;
+    }
+    loadState_ = LoadState::Failed;
+    standIn_ = groupsWithIDs(hardwareDefaultIDs());
+    dashboard_ = standIn_;
+    tellObservers();
+    for (const auto& change : std::exchange(afterLoading_, {})) change();
     loadSelection();
 }
 
@@ -122,14 +177,14 @@ void QVDashboardDataUnitGroupsController::loadSelection() {
 
 void QVDashboardDataUnitGroupsController::selectionRead(const std::optional<std::vector<int>>& storedIDs,
                                                         bool wasRead) {
-    if (selectionWasSet_) return;  // by the user, while it was being read
-    if (storedIDs) {
-        selected_ = withoutRepetition(groupsWithIDs(*storedIDs));
-        return;
-    }
-    selected_ = firstThreeOfDashboard();
+    if (selectionState_ == LoadState::Loaded) return;  // by the user, while it was being read
     // What could not be read may be there all the same, and is the user's.
-    if (wasRead && !selected_.empty()) persistSelection();
+    const bool isKnown = wasRead && (storedIDs || loadState_ == LoadState::Loaded);
+    selectionState_ = isKnown ? LoadState::Loaded : LoadState::Failed;
+    selected_ = storedIDs ? withoutRepetition(groupsWithIDs(*storedIDs)) : firstThreeOfDashboard();
+    if (!isKnown) return;
+    if (!storedIDs && !selected_.empty()) persistSelection();
+    if (std::exchange(dropUnshownWhenRead_, false)) dropUnshownFromSelection();
 }
 
 std::vector<int> QVDashboardDataUnitGroupsController::hardwareDefaultIDs() {
@@ -168,6 +223,7 @@ void QVDashboardDataUnitGroupsController::loadDemoSelection() {
         }
     }
     dashboard_ = std::move(groups);
+    loadState_ = selectionState_ = LoadState::Loaded;
     persistDashboard();
     selected_ = firstThreeOfDashboard();
     persistSelection();
@@ -177,6 +233,7 @@ void QVDashboardDataUnitGroupsController::loadDemoSelection() {
 
 void QVDashboardDataUnitGroupsController::setDataUnitGroupsForDashboard(Groups dataUnitGroups) {
     dashboard_ = std::move(dataUnitGroups);
+    if (loadState_ == LoadState::Loading) loadState_ = LoadState::Loaded;
     persistDashboard();
 }
 
@@ -203,14 +260,14 @@ bool QVDashboardDataUnitGroupsController::isOnDashboard(const VSDataUnitGroup* d
 }
 
 void QVDashboardDataUnitGroupsController::setSelectedDataUnitGroups(const Groups& dataUnitGroups) {
-    selectionWasSet_ = true;
+    selectionState_ = LoadState::Loaded;
     selected_ = withoutRepetition(dataUnitGroups);
     persistSelection();
 }
 
 void QVDashboardDataUnitGroupsController::addGroupsForPairedWatch() {
     // Before the list is loaded there is nothing to add to; loading looks for a paired watch itself.
-    if (!dashboard_) return;
+    if (loadState_ != LoadState::Loaded) return;
     std::vector<int>& ever = autoAddedIDs();
     std::vector<int> additions;
     for (const int id : watchGroupIDs) {
@@ -236,15 +293,26 @@ std::vector<int>& QVDashboardDataUnitGroupsController::autoAddedIDs() {
 // Persistence
 
 void QVDashboardDataUnitGroupsController::persistDashboard() {
+    if (loadState_ == LoadState::Failed) {
+        tellObservers();
+        return load();  // and then the change is made to what was read
+    }
     userDefaults_.setValue({{dashboardKey, arrayOf(idsOf(dataUnitGroupsForDashboard()))}}, dashboardKey,
                            [](bool success) {
                                if (!success) VSLog(VSLogLevel::Error, "Error saving user defaults");
                            });
     tellObservers();
-    const size_t before = selected_.size();
-    std::erase_if(selected_, [this](const VSDataUnitGroup* group) { return !isOnDashboard(group); });
-    if (selected_.size() != before) persistSelection();
+    dropUnshownFromSelection();
     if (autoAddedIDs_) platform::UserDefaults::standard().setValue(autoAddedKey, arrayOf(*autoAddedIDs_));
+}
+
+void QVDashboardDataUnitGroupsController::dropUnshownFromSelection() {
+    const auto unshown = [this](const VSDataUnitGroup* group) { return !isOnDashboard(group); };
+    const bool dropped = std::erase_if(selected_, unshown) > 0;
+    if (selectionState_ != LoadState::Loaded)
+        dropUnshownWhenRead_ = true;
+    else if (dropped)
+        persistSelection();
 }
 
 void QVDashboardDataUnitGroupsController::persistSelection() {

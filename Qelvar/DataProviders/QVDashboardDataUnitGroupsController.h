@@ -20,7 +20,9 @@ class QVDashboardDataUnitGroupsObserver {
 
 /// Which display types the dashboard shows, in which order, and which of them the landscape chart compares.
 /// Main thread only. The lists are read from the service's default values once, after construction, and
-/// written there with every change by the user.
+/// written there with every change by the user. A list that could not be read may be there all the same: the
+/// defaults are shown in its place, nothing is added on its own account, and the user's next change reads it
+/// again and is made to what is then read.
 class QVDashboardDataUnitGroupsController {
  public:
     using Groups = std::vector<const VSDataUnitGroup*>;
@@ -39,8 +41,11 @@ class QVDashboardDataUnitGroupsController {
 
     /// A copy; empty until first loaded.
     Groups dataUnitGroupsForDashboard() const { return dashboard_.value_or(Groups{}); }
-    /// Whether the list has been loaded (or set): before, an empty list says nothing.
+    /// Whether there is a list to show (the user's, or the defaults where that could not be read): before, an
+    /// empty list says nothing.
     bool hasLoadedDashboard() const { return dashboard_.has_value(); }
+    /// Reads again what could not be read; else nothing happens.
+    void loadAgainIfFailed();
     /// Replaces the whole list and stores it.
     void setDataUnitGroupsForDashboard(Groups dataUnitGroups);
     /// At the end; nothing happens when it is there already. Before the list is loaded, this and the next
@@ -59,9 +64,11 @@ class QVDashboardDataUnitGroupsController {
     void removeObserver(const QVDashboardDataUnitGroupsObserver* observer) { observers_.remove(observer); }
 
  private:
+    enum class LoadState { Loading, Loaded, Failed };
     void load();
     void loadSelection();
-    void dashboardRead(const std::optional<std::vector<int>>& storedIDs);
+    void dashboardRead(const std::optional<std::vector<int>>& storedIDs, bool wasRead);
+    void dashboardCouldNotBeRead();
     void selectionRead(const std::optional<std::vector<int>>& storedIDs, bool wasRead);
     void loadDemoSelection();
     static std::vector<int> hardwareDefaultIDs();
@@ -70,6 +77,7 @@ class QVDashboardDataUnitGroupsController {
     void addGroupsForPairedWatch();
     std::vector<int>& autoAddedIDs();
     void persistDashboard();
+    void dropUnshownFromSelection();
     void persistSelection();
     void tellObservers();
 
@@ -77,8 +85,12 @@ class QVDashboardDataUnitGroupsController {
     const DemoDataLoader demoDataLoader_;
     QVUserDefaults& userDefaults_;
     std::optional<Groups> dashboard_;
+    LoadState loadState_ = LoadState::Loading;
+    Groups standIn_;          // after a failed read: the defaults, without the user's changes since
+    bool isReading_ = false;  // the dashboard, for the first time or again
     Groups selected_;
-    bool selectionWasSet_ = false;
+    LoadState selectionState_ = LoadState::Loading;
+    bool dropUnshownWhenRead_ = false;
     std::vector<std::function<void()>> afterLoading_;  // changes asked for before there was a list to change
     std::optional<std::vector<int>> autoAddedIDs_;     // none: not read in this process
     platform::ObserverSet<QVDashboardDataUnitGroupsObserver> observers_;

@@ -26,6 +26,10 @@ std::string inTimeScope(const char* what, QVTimeScope timeScope) {
     return std::string(what) + " for time scope (" + std::to_string(static_cast<int64_t>(timeScope)) + ")";
 }
 
+std::string logLine(const char* className, std::string_view what, const VSError& error) {
+    return std::string(className) + ": " + std::string(what) + ": " + error.message;
+}
+
 bool isLate(QVDataProvider::Ticket ticket, QVDataProvider::Ticket& accepted) {
     if (ticket == 0) return false;
     if (ticket < accepted) return true;
@@ -96,6 +100,13 @@ void QVDataProvider::stopQueries() {
 
 void QVDataProvider::invalidateCachedData() {
     currentValueDataState_ = QVDataState::NotLoaded;
+    currentValueWasConverted_ = false;
+}
+
+void QVDataProvider::restartQueriesOfAnotherDay() {
+    const Today today = Today::now();
+    if (currentValueAskedOn_.value_or(today) != today || secondaryValueAskedOn_.value_or(today) != today)
+        restartQueries();
 }
 
 QVDataProvider::Today QVDataProvider::Today::now() {
@@ -107,6 +118,10 @@ bool QVDataProvider::needsCurrentValueQuery(const QVRunningQuery& query) const {
     return !query.isRunning() || !hasLoadedCurrentValue() || currentValueAskedOn_ != Today::now();
 }
 
+bool QVDataProvider::needsSecondaryValueQuery(const QVRunningQuery& query) const {
+    return !query.isRunning() || !hasLoadedSecondaryValues() || secondaryValueAskedOn_ != Today::now();
+}
+
 QVDataProvider::Ticket QVDataProvider::beginQuery(Answer answer, std::optional<QVTimeScope> timeScope) {
     const Ticket ticket = nextTicket();
     if (answer == Answer::CurrentValue) {
@@ -114,6 +129,7 @@ QVDataProvider::Ticket QVDataProvider::beginQuery(Answer answer, std::optional<Q
         currentValueAskedOn_ = Today::now();
         return ticket;
     }
+    if (answer == Answer::Secondary) secondaryValueAskedOn_ = Today::now();
     for (size_t i = 0; i < cacheValues_.size(); ++i) {
         if (timeScope && static_cast<size_t>(*timeScope) != i) continue;
         CacheValue& entry = cacheValues_[i];
@@ -169,6 +185,7 @@ void QVDataProvider::takeCurrentValue(Value value, std::optional<VSDate> date, c
     // After an invalidation nothing is shown until the answer comes, so it is told even when it is the same.
     const bool wasLoaded = hasLoadedCurrentValue();
     currentValueDataState_ = stateAfter(error);
+    currentValueWasConverted_ = false;
     if (error) intake().logError("Error updating current value data", *error);
     if (isForeign(unit)) value = converted(value, *unit, *keptUnit_);
     if (wasLoaded && presentAndEqual(currentValue_, value) && presentAndEqual(lastUpdatedDate_, date)) return;
@@ -181,37 +198,41 @@ void QVDataProvider::takeCurrentValue(Value value, std::optional<VSDate> date, c
 
 void QVDataProvider::Intake::updateHistoricalData(Points points, QVTimeScope timeScope, Error error,
                                                   Unit unit, Ticket ticket) const {
-    platform::mainQueue().async(
-        [provider = provider_, points = std::move(points), timeScope, error, unit, ticket] {
-            if (const auto self = provider.lock())
-                self->takeHistoricalData(points, timeScope, error, unit, ticket);
-        });
+    platform::mainQueue().async([provider = provider_, points = std::move(points), timeScope,
+                                 error = std::move(error), unit, ticket] {
+        if (const auto self = provider.lock())
+            self->takeHistoricalData(points, timeScope, error, unit, ticket);
+    });
 }
 
 void QVDataProvider::Intake::updateAverage(Value average, Value min, Value max, QVTimeScope timeScope,
                                            Error error, Unit unit, Ticket ticket) const {
-    platform::mainQueue().async([provider = provider_, average, min, max, timeScope, error, unit, ticket] {
-        if (const auto self = provider.lock())
-            self->takeAverage(average, min, max, timeScope, error, unit, ticket);
-    });
+    platform::mainQueue().async(
+        [provider = provider_, average, min, max, timeScope, error = std::move(error), unit, ticket] {
+            if (const auto self = provider.lock())
+                self->takeAverage(average, min, max, timeScope, error, unit, ticket);
+        });
 }
 
-void QVDataProvider::Intake::updateSecondaryValue(Value value, Error error, Ticket ticket) const {
+void QVDataProvider::Intake::updateSecondaryValue(Value value, const Error& error, Ticket ticket) const {
     for (int i = 0; i < QVTimeScopeCount; ++i)
         updateAverage(value, {}, {}, QVTimeScope{i}, error, {}, ticket);
 }
 
 void QVDataProvider::Intake::updateCurrentValue(Value value, std::optional<VSDate> date, Error error,
                                                 Unit unit, Ticket ticket) const {
-    platform::mainQueue().async([provider = provider_, value, date, error, unit, ticket] {
+    platform::mainQueue().async([provider = provider_, value, date, error = std::move(error), unit, ticket] {
         if (const auto self = provider.lock()) self->takeCurrentValue(value, date, error, unit, ticket);
     });
 }
 
 void QVDataProvider::Intake::logError(std::string_view what, const VSError& error) const {
     const VSLogLevel level = vs_isDatabaseAccessibilityError(error) ? VSLogLevel::Debug : VSLogLevel::Error;
-    if (!VSLogIsEnabled(level)) return;
-    VSLog(level, std::string(className_) + ": " + std::string(what) + ": " + error.message);
+    if (VSLogIsEnabled(level)) VSLog(level, logLine(className_, what, error));
+}
+
+void QVDataProvider::Intake::logErrorAlways(std::string_view what, const VSError& error) const {
+    if (VSLogIsEnabled(VSLogLevel::Error)) VSLog(VSLogLevel::Error, logLine(className_, what, error));
 }
 
 // Units
@@ -225,7 +246,9 @@ void QVDataProvider::unitPreferencesDidChange(const QSet<const VSObjectType*>& c
         keptUnit_ = preferredUnit();
         if (before != *keptUnit_) convertCachedValues(before, *keptUnit_);
     }
+    const bool held = holdsCurrentValue();
     invalidateCachedData();
+    currentValueWasConverted_ = held;
     restartQueries();
 }
 
@@ -241,6 +264,7 @@ void QVDataProvider::convertCachedValues(const VSUnit& from, const VSUnit& to) {
     if (!delegate) return;
     if (hasLoadedHistoricalData()) delegate->dataProviderDidUpdateHistoricalData(*this);
     if (hasLoadedSecondaryValues()) delegate->dataProviderDidUpdateSecondaryData(*this);
+    if (holdsCurrentValue()) delegate->dataProviderDidUpdateCurrentValueData(*this);
 }
 
 QVDataProvider::Value QVDataProvider::converted(Value value, const VSUnit& from, const VSUnit& to) const {

@@ -91,7 +91,19 @@ class QVDataProvider : public std::enable_shared_from_this<QVDataProvider> {
 
     bool hasLoadedHistoricalData() const { return historicalDataState() == QVDataState::Loaded; }
     bool hasLoadedCurrentValue() const { return currentValueDataState_ == QVDataState::Loaded; }
+    /// Whether the current value may be shown: it is loaded, or it was and has been expressed in another unit
+    /// since, while it is asked for again.
+    bool holdsCurrentValue() const { return hasLoadedCurrentValue() || currentValueWasConverted_; }
     bool hasLoadedSecondaryValues() const { return secondaryValueDataState() == QVDataState::Loaded; }
+
+    /// Whether the display type shows such values at all; what it does not show is never asked for.
+    virtual bool showsCurrentValue() const { return true; }
+    virtual bool showsSecondaryValues() const { return true; }
+    /// Whether something that it shows has not been loaded.
+    bool isWaiting() const {
+        return !hasLoadedHistoricalData() || (showsCurrentValue() && !hasLoadedCurrentValue()) ||
+               (showsSecondaryValues() && !hasLoadedSecondaryValues());
+    }
 
     std::optional<VSDate> startDate() const { return startDate_; }
     std::optional<VSDate> endDate() const { return endDate_; }
@@ -107,6 +119,9 @@ class QVDataProvider : public std::enable_shared_from_this<QVDataProvider> {
     virtual void stopQueries();
     /// Makes the next restartQueries ask for the current value again. What was loaded stays until replaced.
     void invalidateCachedData();
+    /// Asks again when what was asked for concerned another day, or a day of another time zone. For a span
+    /// that stays the same when the day turns.
+    void restartQueriesOfAnotherDay();
 
     /// The class's name, for logs. Lives until the process ends.
     virtual const char* className() const = 0;
@@ -121,11 +136,13 @@ class QVDataProvider : public std::enable_shared_from_this<QVDataProvider> {
         void updateAverage(Value average, Value min, Value max, QVTimeScope timeScope, Error error,
                            Unit unit = {}, Ticket ticket = 0) const;
         /// One value, the average of all time scopes.
-        void updateSecondaryValue(Value value, Error error, Ticket ticket = 0) const;
+        void updateSecondaryValue(Value value, const Error& error, Ticket ticket = 0) const;
         void updateCurrentValue(Value value, std::optional<VSDate> date, Error error, Unit unit = {},
                                 Ticket ticket = 0) const;
-        /// Writes "<class>: <what>: <error>" at the severity that the error deserves.
+        /// Writes "<class>: <what>: <error>": as an error, or quietly when the store is merely locked.
         void logError(std::string_view what, const VSError& error) const;
+        /// Writes it as an error whatever it is.
+        void logErrorAlways(std::string_view what, const VSError& error) const;
         const char* className() const { return className_; }
 
      private:
@@ -145,6 +162,8 @@ class QVDataProvider : public std::enable_shared_from_this<QVDataProvider> {
     /// Whether the query of the current value must be started: it is not running, has not answered, or was
     /// started on another day or in another time zone, when "today" meant something else.
     bool needsCurrentValueQuery(const QVRunningQuery& query) const;
+    /// The same of a secondary value that does not depend on the visible span.
+    bool needsSecondaryValueQuery(const QVRunningQuery& query) const;
     /// The ticket of a question that a running query raised.
     Ticket nextTicket() { return ++lastTicket_; }
 
@@ -210,12 +229,13 @@ class QVDataProvider : public std::enable_shared_from_this<QVDataProvider> {
 
     std::array<CacheValue, QVTimeScopeCount> cacheValues_;
     QVDataState currentValueDataState_ = QVDataState::NotLoaded;
+    bool currentValueWasConverted_ = false;
     Value currentValue_;
     std::optional<VSDate> lastUpdatedDate_;
     std::weak_ptr<QVDataProviderDelegate> delegate_;
     std::optional<VSDate> startDate_, endDate_;
     QVTimeScope timeScope_{};
-    std::optional<Today> currentValueAskedOn_;
+    std::optional<Today> currentValueAskedOn_, secondaryValueAskedOn_;
     Unit keptUnit_;  // of the numbers kept; none: not a quantity
     Ticket currentValueTicket_ = 0;
     Ticket lastTicket_ = 0;

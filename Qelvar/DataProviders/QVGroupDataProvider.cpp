@@ -51,6 +51,14 @@ bool QVGroupDataProvider::hasLoadedCurrentValueData() const {
     return allProviders([](const QVDataProvider& provider) { return provider.hasLoadedCurrentValue(); });
 }
 
+bool QVGroupDataProvider::isWaiting() const {
+    return !allProviders([](const QVDataProvider& provider) { return !provider.isWaiting(); });
+}
+
+bool QVGroupDataProvider::holdsCurrentValueData() const {
+    return allProviders([](const QVDataProvider& provider) { return provider.holdsCurrentValue(); });
+}
+
 bool QVGroupDataProvider::hasLoadedSecondaryValueData() const {
     return allProviders([](const QVDataProvider& provider) { return provider.hasLoadedSecondaryValues(); });
 }
@@ -92,6 +100,11 @@ void QVGroupDataProvider::invalidateCachedData() {
     for (const auto& [dataUnit, provider] : dataProviders_) provider->invalidateCachedData();
 }
 
+void QVGroupDataProvider::dayDidChange() {
+    if (!isActive_) return;
+    for (const auto& [dataUnit, provider] : dataProviders_) provider->restartQueriesOfAnotherDay();
+}
+
 void QVGroupDataProvider::localeDidChange() {
     chartSeries_ = QVChartSeriesForDataUnitGroup(dataUnitGroup_, timeScope_);
 }
@@ -108,7 +121,7 @@ platform::StyledText QVGroupDataProvider::bloodPressureSecondaryText() const {
     std::vector<StyledText> pieces;
     const auto& units = dataUnitGroup_->dataUnitsOrderedForDataEntry();
     for (size_t i = 0; i < units.size(); ++i) {
-        const QImage marker = QVChartSeriesPointMarker::chartPointWithColor(
+        const QImage marker = QVChartSeriesPointMarker::chartPointForText(
             Qt::white, markerRadius, markerLineWidth, QVPointStyleForDataUnitAtIndex(dataUnitGroup_, i));
         pieces.push_back(
             platform::prefixedWithImage(minMaxSecondaryTextForDataUnit(units[i]), marker, 0, markerSpacing));

@@ -43,6 +43,10 @@ class QVGroupDataProvider final : public QVChartRendererDataSource, public QVDat
     bool hasLoadedHistoricalData() const;
     bool hasLoadedCurrentValueData() const;
     bool hasLoadedSecondaryValueData() const;
+    /// Whether something that a data unit shows has not been loaded.
+    bool isWaiting() const;
+    /// Whether every data unit has a current value that may be shown.
+    bool holdsCurrentValueData() const;
 
     platform::StyledText secondaryValueText() const;
     std::optional<double> averageValueForDataUnit(const VSDataUnit* dataUnit) const;
@@ -66,6 +70,8 @@ class QVGroupDataProvider final : public QVChartRendererDataSource, public QVDat
     void activate();
     void deactivate();
     void invalidateCachedData();
+    /// For a span that stays the same when the day turns: asks again for what concerned the day before.
+    void dayDidChange();
     /// The user's language changed: makes the series anew, for some carry labels.
     void localeDidChange();
 

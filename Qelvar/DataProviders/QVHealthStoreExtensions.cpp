@@ -4,22 +4,30 @@
 #include "Vessa/Base/VSCalendar.h"
 #include "Vessa/Base/VSEnvironment.h"
 
-void mostRecentSampleOfType(VSHealthStore& store, const VSObjectType* type,
-                            const std::optional<VSPredicate>& predicate,
-                            std::function<void(const VSResult<VSSamplePtr>&)> completion) {
+void mostRecentSamplesOfType(VSHealthStore& store, const VSObjectType* type,
+                             const std::optional<VSPredicate>& predicate, int limit,
+                             std::function<void(const VSResult<std::vector<VSSamplePtr>>&)> completion) {
     const VSCalendar calendar = VSCalendar::current();
     const VSDate tomorrow = calendar.addDays(calendar.startOfDay(VSEnvironment::current()->now()), 1);
     VSPredicate narrowed = VSPredicate::samplesStartingBefore(tomorrow);
     if (predicate) narrowed = *predicate & narrowed;
-    store.executeQuery(std::make_shared<VSSampleQuery>(
-        type, narrowed, 1,
-        std::vector<VSSortDescriptor>{{VSSampleSortIdentifierEndDate, false},
-                                      {VSObjectSortIdentifierDataID, false}},
+    store.executeQuery(
+        std::make_shared<VSSampleQuery>(type, narrowed, limit,
+                                        std::vector<VSSortDescriptor>{{VSSampleSortIdentifierEndDate, false},
+                                                                      {VSObjectSortIdentifierDataID, false}},
+                                        std::move(completion)));
+}
+
+void mostRecentSampleOfType(VSHealthStore& store, const VSObjectType* type,
+                            const std::optional<VSPredicate>& predicate,
+                            std::function<void(const VSResult<VSSamplePtr>&)> completion) {
+    mostRecentSamplesOfType(
+        store, type, predicate, 1,
         [completion = std::move(completion)](const VSResult<std::vector<VSSamplePtr>>& answer) {
             if (!completion) return;
             if (!answer) return completion(answer.error());
             completion(answer->empty() ? VSSamplePtr() : answer->back());
-        }));
+        });
 }
 
 namespace {

@@ -14,6 +14,10 @@
 void mostRecentSampleOfType(VSHealthStore& store, const VSObjectType* type,
                             const std::optional<VSPredicate>& predicate,
                             std::function<void(const VSResult<VSSamplePtr>&)> completion);
+/// The same, and those that ended before it, latest first; at most so many.
+void mostRecentSamplesOfType(VSHealthStore& store, const VSObjectType* type,
+                             const std::optional<VSPredicate>& predicate, int limit,
+                             std::function<void(const VSResult<std::vector<VSSamplePtr>>&)> completion);
 
 /// The same, typed. REQUIRES: a quantity type, respectively a category type.
 void mostRecentQuantitySampleOfType(

@@ -29,6 +29,8 @@ FocusScope {
             anchors.horizontalCenter: parent.horizontalCenter
             y: header.isTall ? 12 : (selectAll.height - height) / 2
             width: Math.min(implicitWidth, parent.width - 32)
+            fontSizeMode: SystemStyle.largeText ? Text.HorizontalFit : Text.FixedSize
+            minimumPixelSize: 17
             text: root.screen.title
             color: SystemStyle.text
             font.pixelSize: SystemStyle.bodySize

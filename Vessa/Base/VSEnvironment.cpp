@@ -23,6 +23,27 @@ CurrentEnvironment& currentEnvironment() {
     return *instance;
 }
 
+/// What the host says while the process runs.
+struct HostPreferences {
+    std::mutex mutex;
+    // guarded by mutex
+    std::optional<std::string> locale;
+    std::optional<bool> uses24HourClock;
+};
+
+HostPreferences& hostPreferences() {
+    static auto* instance = new HostPreferences;  // never destroyed: as above
+    return *instance;
+}
+
+std::string localeOfVariables() {
+    for (const char* variable : {"LC_ALL", "LC_TIME", "LANG"}) {
+        const char* value = std::getenv(variable);
+        if (value && *value) return VSLocaleFromPOSIX(value);
+    }
+    return VSLocaleFromPOSIX(nullptr);
+}
+
 bool askWhether24HourClock(const std::string& locale) {
     UErrorCode status = U_ZERO_ERROR;
     const std::unique_ptr<icu::DateTimePatternGenerator> generator(
@@ -32,6 +53,16 @@ bool askWhether24HourClock(const std::string& locale) {
     return U_SUCCESS(status) && (pattern.indexOf(u'H') >= 0 || pattern.indexOf(u'k') >= 0);
 }
 
+// A pattern generator takes milliseconds to make, and every label of a time axis asks.
+bool localeUses24HourClock(const std::string& locale) {
+    static std::mutex mutex;
+    static std::map<std::string, bool> answers;
+    std::lock_guard lock(mutex);
+    const auto known = answers.find(locale);
+    if (known != answers.end()) return known->second;
+    return answers.emplace(locale, askWhether24HourClock(locale)).first->second;
+}
+
 VSDate systemNow() {
     return VSDate(std::chrono::floor<VSDuration>(std::chrono::system_clock::now()));
 }
@@ -39,14 +70,7 @@ VSDate systemNow() {
 }  // namespace
 
 bool VSEnvironment::uses24HourClock() const {
-    // A pattern generator takes milliseconds to make, and every label of a time axis asks.
-    static std::mutex mutex;
-    static std::map<std::string, bool> answers;
-    const std::string locale = localeIdentifier();
-    std::lock_guard lock(mutex);
-    const auto known = answers.find(locale);
-    if (known != answers.end()) return known->second;
-    return answers.emplace(locale, askWhether24HourClock(locale)).first->second;
+    return localeUses24HourClock(localeIdentifier());
 }
 
 std::shared_ptr<const VSEnvironment> VSEnvironment::current() {
@@ -77,11 +101,19 @@ std::string VSSystemEnvironment::timeZoneIdentifier() const {
 }
 
 std::string VSSystemEnvironment::localeIdentifier() const {
-    for (const char* variable : {"LC_ALL", "LC_TIME", "LANG"}) {
-        const char* value = std::getenv(variable);
-        if (value && *value) return VSLocaleFromPOSIX(value);
-    }
-    return VSLocaleFromPOSIX(nullptr);
+    auto& host = hostPreferences();
+    std::lock_guard lock(host.mutex);
+    const std::string locale = host.locale ? VSLocaleFromPOSIX(host.locale->c_str()) : localeOfVariables();
+    if (!host.uses24HourClock || *host.uses24HourClock == localeUses24HourClock(locale)) return locale;
+    return locale + (*host.uses24HourClock ? "@hours=h23" : "@hours=h12");
+}
+
+void VSSystemEnvironment::setHostPreferences(std::optional<std::string> locale,
+                                             std::optional<bool> uses24HourClock) {
+    auto& host = hostPreferences();
+    std::lock_guard lock(host.mutex);
+    host.locale = std::move(locale);
+    host.uses24HourClock = uses24HourClock;
 }
 
 struct VSFixedEnvironment::State {

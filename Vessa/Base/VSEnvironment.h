@@ -26,15 +26,20 @@ class VSEnvironment {
     static std::shared_ptr<const VSEnvironment> install(std::shared_ptr<const VSEnvironment> environment);
 };
 
-/// The system's clock, the zone of TZ or /etc/localtime, the locale of LC_ALL, LC_TIME, LANG; all read anew
-/// at each call, so that a change of the system's zone is seen. With `startAt` the clock starts there and
-/// runs on from the moment of construction.
+/// The system's clock, the zone of TZ or /etc/localtime, the locale of LC_ALL, LC_TIME, LANG or what the host
+/// has since said instead; all read anew at each call, so that a change of the system's zone or locale is
+/// seen. With `startAt` the clock starts there and runs on from the moment of construction.
 class VSSystemEnvironment final : public VSEnvironment {
  public:
     explicit VSSystemEnvironment(std::optional<VSDate> startAt = std::nullopt);
     VSDate now() const override;
     std::string timeZoneIdentifier() const override;
     std::string localeIdentifier() const override;
+
+    /// What the host says while the process runs, for every system environment: the locale by its POSIX name
+    /// (none: the process's variables stand), and the clock that the user prefers to the locale's (none: the
+    /// locale's).
+    static void setHostPreferences(std::optional<std::string> locale, std::optional<bool> uses24HourClock);
 
  private:
     VSDuration offset_{};

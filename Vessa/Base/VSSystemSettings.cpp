@@ -7,6 +7,7 @@
 #include <array>
 #include <cctype>
 #include <cstdio>
+#include <cstdlib>
 #include <fstream>
 #include <memory>
 #include <optional>
@@ -135,7 +136,46 @@ std::optional<std::string> zoneOfFile(const std::filesystem::path& path) {
     return line;
 }
 
+/// Assignments as a shell would read them, the way both files are written.
+VSLocaleVariables variablesOfFile(const std::filesystem::path& path) {
+    VSLocaleVariables variables;
+    std::ifstream file(path);
+    for (std::string line; std::getline(file, line);) {
+        std::string_view text = line;
+        while (!text.empty() && std::isspace(static_cast<unsigned char>(text.front()))) text.remove_prefix(1);
+        while (!text.empty() && std::isspace(static_cast<unsigned char>(text.back()))) text.remove_suffix(1);
+        if (text.starts_with("export ")) text.remove_prefix(7);
+        variables.assign(text);
+    }
+    return variables;
+}
+
 }  // namespace
+
+void VSLocaleVariables::assign(std::string_view assignment) {
+    const size_t equals = assignment.find('=');
+    if (equals == std::string_view::npos) return;
+    const std::string_view name = assignment.substr(0, equals);
+    std::string_view value = assignment.substr(equals + 1);
+    if (value.size() >= 2 && (value.front() == '"' || value.front() == '\'') && value.back() == value.front())
+        value = value.substr(1, value.size() - 2);
+    if (name == "LC_ALL") all = value;
+    if (name == "LC_TIME") time = value;
+    if (name == "LANG") language = value;
+}
+
+VSLocaleVariables VSLocaleVariablesOfProcess() {
+    const auto value = [](const char* name) {
+        const char* found = std::getenv(name);
+        return std::string(found ? found : "");
+    };
+    return {value("LC_ALL"), value("LC_TIME"), value("LANG")};
+}
+
+VSLocaleVariables VSLocaleVariablesOfHost(const std::filesystem::path& etc) {
+    const VSLocaleVariables variables = variablesOfFile(etc / "locale.conf");
+    return variables.strongest().empty() ? variablesOfFile(etc / "default/locale") : variables;
+}
 
 std::string VSTimeZoneFromSystem(const char* tz, const std::filesystem::path& etc) {
     if (tz) return zoneOfVariable(tz);

@@ -39,6 +39,10 @@ TEST(NavigationStack, TellsScreensWhenTheyComeAndGo) {
     stack.push(std::make_unique<LoggingScreen>("detail", log));
     EXPECT_EQ(take(), (QStringList{"root will disappear", "detail will appear", "detail appeared"}));
     EXPECT_EQ(stack.backTitle(), "root");
+    QSignalSpy backTitle(&stack, &NavigationStack::backTitleChanged);
+    stack.rootScreen()->setTitle("in another language");
+    EXPECT_EQ(backTitle.size(), 1);
+    EXPECT_EQ(stack.backTitle(), "in another language");
     EXPECT_EQ(stack.topScreen()->navigationStack(), &stack);
 
     stack.setVisible(false);

@@ -80,50 +80,22 @@ TEST(Catalogue, BuildsEveryRowOfItsTables) {
 }
 
 TEST(Catalogue, KeepsTheNumbersThatTheProgramSpeaksOf) {
-    const std::map<int, const char*> types{{3, "Height"},
-                                           {6, "HeartRate"},
-                                           {7, "DistanceWalkingRunning"},
-                                           {8, "ActiveEnergyBurned"},
-                                           {10, "FlightsClimbed"},
-                                           {13, "BloodPressureSystolic"},
-                                           {58, "SleepAnalysis"},
-                                           {59, "StepCount"},
-                                           {71, "DistanceCycling"},
-                                           {72, "Workout"},
-                                           {73, "DietaryWater"},
-                                           {75, "ZentroStandHour"},
-                                           {76, "BasalBodyTemperature"},
-                                           {77, "CervicalMucusQuality"},
-                                           {78, "OvulationTestResult"},
-                                           {79, "SexualActivity"},
-                                           {80, "MenstrualFlow"},
-                                           {81, "UVExposure"},
-                                           {82, "IntermenstrualBleeding"},
-                                           // Chosen here, and from then on as fixed as the others.
-                                           {1, "BodyMassIndex"},
-                                           {2, "BodyFatPercentage"},
-                                           {4, "BodyMass"},
-                                           {5, "LeanBodyMass"},
-                                           {9, "BasalEnergyBurned"},
-                                           {11, "NikeFuel"},
-                                           {12, "OxygenSaturation"},
-                                           {14, "BloodGlucose"},
-                                           {15, "BloodAlcoholContent"},
-                                           {16, "PeripheralPerfusionIndex"},
-                                           {18, "DietaryFatTotal"},
-                                           {55, "DietaryCaffeine"},
-                                           {56, "RespiratoryRate"},
-                                           {57, "BodyTemperature"},
-                                           {60, "NumberOfTimesFallen"},
-                                           {61, "InhalerUsage"},
-                                           {62, "ForcedVitalCapacity"},
-                                           {63, "ForcedExpiratoryVolume1"},
-                                           {64, "PeakExpiratoryFlowRate"},
-                                           {65, "WaistCircumference"},
-                                           {66, "DateOfBirth"},
-                                           {67, "BiologicalSex"},
-                                           {68, "BloodType"},
-                                           {69, "FitzpatrickSkinType"}};
+    // clang-format off
+    const std::pair<int, const char*> types[] = {
+        {3, "Height"}, {6, "HeartRate"}, {7, "DistanceWalkingRunning"}, {8, "ActiveEnergyBurned"},
+        {10, "FlightsClimbed"}, {13, "BloodPressureSystolic"}, {58, "SleepAnalysis"}, {59, "StepCount"},
+        {71, "DistanceCycling"}, {72, "Workout"}, {73, "DietaryWater"}, {75, "ZentroStandHour"},
+        {76, "BasalBodyTemperature"}, {77, "CervicalMucusQuality"}, {78, "OvulationTestResult"},
+        {79, "SexualActivity"}, {80, "MenstrualFlow"}, {81, "UVExposure"},
+        {82, "IntermenstrualBleeding"}, {1, "BodyMassIndex"}, {2, "BodyFatPercentage"}, {4, "BodyMass"},
+        {5, "LeanBodyMass"}, {9, "BasalEnergyBurned"}, {11, "NikeFuel"}, {12, "OxygenSaturation"},
+        {14, "BloodGlucose"}, {15, "BloodAlcoholContent"}, {16, "PeripheralPerfusionIndex"},
+        {18, "DietaryFatTotal"}, {55, "DietaryCaffeine"}, {56, "RespiratoryRate"},
+        {57, "BodyTemperature"}, {60, "NumberOfTimesFallen"}, {61, "InhalerUsage"},
+        {62, "ForcedVitalCapacity"}, {63, "ForcedExpiratoryVolume1"}, {64, "PeakExpiratoryFlowRate"},
+        {65, "WaistCircumference"}, {66, "DateOfBirth"}, {67, "BiologicalSex"}, {68, "BloodType"},
+        {69, "FitzpatrickSkinType"}};
+    // clang-format on
     for (const auto& [id, type] : types) {
         ASSERT_NE(group(id), nullptr) << id;
         EXPECT_EQ(group(id)->anyDataUnit()->dataType()->name(), type) << id;

@@ -12,6 +12,8 @@ bool waitUntil(const std::function<bool()>& condition) {
     while (!condition()) {
         if (deadline.hasExpired()) return false;
         QCoreApplication::processEvents(QEventLoop::AllEvents | QEventLoop::WaitForMoreEvents, 50);
+        // As an event loop does between events: what is to be deleted later would never be.
+        QCoreApplication::sendPostedEvents(nullptr, QEvent::DeferredDelete);
     }
     return true;
 }

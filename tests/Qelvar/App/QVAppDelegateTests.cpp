@@ -6,8 +6,9 @@
 #include <QSignalSpy>
 
 #include "Platform/Localization.h"
+#include "Platform/SystemEvents.h"
 #include "Platform/UserDefaults.h"
-#include "Qelvar/App/QVPlaceholderViewController.h"
+#include "Qelvar/Controllers/QVPlaceholderViewController.h"
 #include "Qelvar/Controllers/QVUserActivityManager.h"
 #include "Qelvar/DataProviders/QVUserDefaults.h"
 #include "QtTestSupport.h"
@@ -27,7 +28,7 @@ class AppDelegateTest : public testing::Test {
     ~AppDelegateTest() override { QVUserDefaults::sharedDefaults().setHealthStore(nullptr); }
 
     std::unique_ptr<QVAppDelegate> launch(bool medicalIDIsSupported = true) {
-        auto app = std::make_unique<QVAppDelegate>(store_, medicalIDIsSupported);
+        auto app = std::make_unique<QVAppDelegate>(store_, "", medicalIDIsSupported);
         app->willFinishLaunching();
         app->didFinishLaunching();
         return app;
@@ -81,24 +82,54 @@ TEST_F(AppDelegateTest, TappingTheMedicalIDAgainIsRefusedAndOthersReturnToTheirR
     EXPECT_TRUE(app->dashboard()->isVisible());
 }
 
-TEST_F(AppDelegateTest, ActivitiesLeadToTheirTabsRoot) {
+TEST_F(AppDelegateTest, LinksLeadAsFarAsThereIsSomething) {
     const auto app = launch();
     QVTabBarController& tabs = *app->tabBarController();
-    tabs.stack(2)->push(
-        std::make_unique<QVPlaceholderViewController>([] { return QString("deep"); }, "", "DONE"));
-    EXPECT_TRUE(
-        app->continueUserActivity(*QVUserActivityManager::activity("", {}, QVUserActivityTab::Sources)));
-    EXPECT_EQ(tabs.selectedIndex(), 2);
-    EXPECT_EQ(tabs.selectedStack()->count(), 1);
-    EXPECT_TRUE(app->openLink("qelvar://HealthDataTab?DataCategory=3"));
-    EXPECT_EQ(tabs.selectedIndex(), 1);
-    EXPECT_TRUE(app->openLink("qelvar://NoSuchTab"));
-    EXPECT_EQ(tabs.selectedIndex(), 1) << "unchanged";
-    EXPECT_FALSE(app->openLink("https://example.org/"));
+    const auto place = [&tabs] {
+        QStringList titles;
+        for (int i = 0; i < tabs.selectedStack()->count(); ++i)
+            titles << tabs.selectedStack()->screenAt(i)->title();
+        return titles.join(" > ");
+    };
+    const struct {
+        const char *link, *place, *activity;
+    } cases[] = {
+        {"qelvar://SourcesTab", "Sources", "Sources"},
+        {"qelvar://healthdatatab/", "Health Data", "Health Data"},
+        {"qelvar://HealthDataTab?DataCategory=2", "Health Data > Fitness", "Fitness"},
+        {"QELVAR://HealthDataTab?DataCategory=2&DataUnit=59#x", "Health Data > Fitness > Steps", "Steps"},
+        {"qelvar://HealthDataTab?DataCategory=2&DataUnit=6", "Health Data > Fitness", "Fitness"},
+        {"qelvar://HealthDataTab?DataCategory=99&DataUnit=59", "Health Data", "Health Data"},
+        {"qelvar://HealthDataTab?DataUnit=59&DataCategory=x", "Health Data", "Health Data"},
+        {"qelvar://HealthDataTab?Calendar=1&DataCategory=2", "Health Data", "Health Data Calendar"},
+        {"qelvar://NoSuchTab?DataCategory=2", "Health Data > Fitness", "Fitness"},
+        {"qelvar://HealthDataTab?Calendar=1", "Health Data", "Health Data Calendar"},
+        {"qelvar://DASHBOARDTAB?DataCategory=2", "Dashboard", "Dashboard"},
+        {"qelvar://", "Dashboard", "Dashboard"},
+    };
+    for (const auto& expected : cases) {
+        SCOPED_TRACE(expected.link);
+        // From a deep screen, mostly of another tab.
+        tabs.selectedStack()->push(
+            std::make_unique<QVPlaceholderViewController>([] { return QString("deep"); }, "", "DONE"));
+        EXPECT_TRUE(app->openLink(expected.link));
+        EXPECT_EQ(place(), expected.place);
+        EXPECT_EQ(platform::UserActivity::current()->title, expected.activity);
+    }
     platform::UserActivity other;
     other.activityType = "org.example.tab";
     EXPECT_FALSE(app->continueUserActivity(other));
-    EXPECT_EQ(tabs.selectedIndex(), 1);
+    for (const char* link : {"https://example.org/", "qelvar", "SourcesTab", ""})
+        EXPECT_FALSE(app->openLink(link)) << link;
+    EXPECT_EQ(place(), "Dashboard");
+
+    // What is shown can be opened again.
+    EXPECT_TRUE(app->openLink("qelvar://HealthDataTab?DataCategory=2&DataUnit=59"));
+    const auto steps = platform::UserActivity::current();
+    EXPECT_TRUE(steps->keywords.contains("walk")) << steps->keywords.join(", ").toStdString();
+    app->tabBarController()->tap(0);
+    EXPECT_TRUE(app->continueUserActivity(*steps));
+    EXPECT_EQ(place(), "Health Data > Fitness > Steps");
 }
 
 TEST_F(AppDelegateTest, WithoutMedicalIDThereIsNoSuchTab) {
@@ -114,21 +145,32 @@ TEST_F(AppDelegateTest, TheTabShownIsTheCurrentActivity) {
     EXPECT_EQ(tab(), "DashboardTab");
     app->tabBarController()->tap(3);
     EXPECT_EQ(tab(), "MedicalIDTab");
-    EXPECT_EQ(platform::UserActivity::current()->title, "Medical ID");
+    environment_->setLocale("de_DE");
+    platform::SystemEvents::shared().postLocaleChange();
+    EXPECT_EQ(platform::UserActivity::current()->title, "Notfallpass");
+    app->tabBarController()->tap(0);
+    EXPECT_EQ(platform::UserActivity::current()->title, "Übersicht");
+    environment_->setLocale("en_US");
+    platform::loadTranslations();
 }
 
-TEST_F(AppDelegateTest, TheHealthDataTabOffersToImport) {
+TEST_F(AppDelegateTest, TheHealthDataTabOffersToImportAndItsCategories) {
     const auto app = launch();
-    auto* screen =
-        qobject_cast<QVPlaceholderViewController*>(app->tabBarController()->stack(1)->rootScreen());
-    ASSERT_TRUE(screen);
     QSignalSpy requested(app.get(), &QVAppDelegate::importRequested);
-    ASSERT_EQ(screen->actionTitles().size(), 1);
-    EXPECT_TRUE(screen->actionTitles()[0].startsWith("Import"));
-    screen->runAction(0);
-    screen->runAction(1);
+    platform::NavigationStack& stack = *app->tabBarController()->stack(1);
+    const auto run = [&stack](const QString& title) {
+        auto* screen = qobject_cast<QVPlaceholderViewController*>(stack.topScreen());
+        screen->runAction(static_cast<int>(screen->actionTitles().indexOf(title)));
+    };
+    run("Import Records…");
+    run("no such row");
     EXPECT_EQ(requested.size(), 1);
-    EXPECT_FALSE(screen->message().isEmpty());
+    run("Calendar");
+    run("List");
+    run("Vitals");
+    run("Heart Rate");
+    EXPECT_EQ(stack.count(), 3);
+    EXPECT_EQ(stack.topScreen()->title(), "Heart Rate");
 }
 
 TEST_F(AppDelegateTest, DemoRecordsAreBuiltOnlyInTheDemonstration) {

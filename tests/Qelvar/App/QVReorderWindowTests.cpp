@@ -28,13 +28,13 @@ class ReorderWindowTest : public test::WindowTest {
         platform::loadTranslations();
         names_.clear();
         for (const auto* group : groups) names_ << group->displayName();
-        app_.reset();
-        window_.reset();
-        QVControllerManager manager(store_);
-        auto& controller = manager.dashboardDataUnitGroupsController();
-        ASSERT_TRUE(test::waitUntil([&controller] { return controller.hasLoadedDashboard(); }));
-        controller.setDataUnitGroupsForDashboard(groups);
-        relaunch([] {});
+        {
+            QVControllerManager manager(store_);
+            auto& controller = manager.dashboardDataUnitGroupsController();
+            ASSERT_TRUE(test::waitUntil([&controller] { return controller.hasLoadedDashboard(); }));
+            controller.setDataUnitGroupsForDashboard(groups);
+        }
+        relaunch();
         ASSERT_TRUE(test::waitUntil([&] { return shown() == QString("012345").left(qsizetype(count)); }));
         ASSERT_TRUE(waitForCards(3));
     }
@@ -329,8 +329,6 @@ TEST_P(DragPictures, TheCardHangsAtThePointerAboveTheTable) {
         release(to);
         ASSERT_TRUE(test::waitUntil([this] { return isStill(); }));
     }
-    environment_->setLocale("en_US");
-    platform::loadTranslations();
 }
 
 INSTANTIATE_TEST_SUITE_P(LeftToRightAndRightToLeft, DragPictures, testing::Values("en_US", "ar_EG"));

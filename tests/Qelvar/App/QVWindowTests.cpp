@@ -146,8 +146,6 @@ TEST_F(WindowTest, RightToLeftMirrorsTheTabs) {
     open({group(VSGroupID::Steps)});
     QTest::mouseClick(window_.get(), Qt::LeftButton, {}, QPoint(20, 650));
     EXPECT_EQ(app_->tabBarController()->selectedIndex(), 3);
-    environment_->setLocale("en_US");
-    platform::loadTranslations();
 }
 
 TEST_F(WindowTest, PicturesAreTakenOfEveryTabAndScope) {

@@ -1,12 +1,11 @@
 #include "ChartTestSupport.h"
 
-#include <QCoreApplication>
-#include <QDir>
 #include <QPainter>
 #include <algorithm>
 #include <chrono>
 #include <cstdlib>
 
+#include "PictureTestSupport.h"
 #include "Qelvar/Charts/QVChartDrawing.h"
 
 namespace test {
@@ -65,52 +64,9 @@ int alphaAt(const QImage& image, double x, double y) {
     return qAlpha(image.pixel(static_cast<int>(x * scale), static_cast<int>(y * scale)));
 }
 
-namespace {
-
-int channelDifference(QRgb a, QRgb b) {
-    return std::max({std::abs(qRed(a) - qRed(b)), std::abs(qGreen(a) - qGreen(b)),
-                     std::abs(qBlue(a) - qBlue(b)), std::abs(qAlpha(a) - qAlpha(b))});
-}
-
-}  // namespace
-
 testing::AssertionResult matchesGolden(const QImage& image, const std::string& name, int channelTolerance,
                                        double share) {
-    const QString file = QStringLiteral(QELVAR_TEST_DATA "/charts/%1.png").arg(QString::fromStdString(name));
-    const QImage actual = image.convertToFormat(QImage::Format_ARGB32_Premultiplied);
-    if (qEnvironmentVariableIntValue("QELVAR_UPDATE_GOLDEN") == 1)
-        return actual.save(file) ? testing::AssertionSuccess()
-                                 : testing::AssertionFailure() << "cannot write " << file.toStdString();
-
-    const QImage expected = QImage(file).convertToFormat(QImage::Format_ARGB32_Premultiplied);
-    const QString folder = QCoreApplication::applicationDirPath() + "/chart-goldens";
-    const auto keep = [&](const QImage& one, const char* kind) {
-        QDir().mkpath(folder);
-        one.save(
-            QStringLiteral("%1/%2-%3.png").arg(folder, QString::fromStdString(name), QLatin1String(kind)));
-    };
-    if (expected.size() != actual.size()) {
-        keep(actual, "actual");
-        return testing::AssertionFailure()
-               << name << ": " << actual.width() << " x " << actual.height() << " pixels instead of "
-               << expected.width() << " x " << expected.height() << "; see " << folder.toStdString();
-    }
-    QImage difference(actual.size(), QImage::Format_RGB32);
-    int differing = 0;
-    for (int y = 0; y < actual.height(); ++y) {
-        for (int x = 0; x < actual.width(); ++x) {
-            const int off = channelDifference(actual.pixel(x, y), expected.pixel(x, y));
-            if (off > channelTolerance) ++differing;
-            difference.setPixel(
-                x, y, qRgb(off, off > channelTolerance ? 0 : off, off > channelTolerance ? 0 : off));
-        }
-    }
-    const double differingShare = static_cast<double>(differing) / (actual.width() * actual.height());
-    if (differingShare <= share) return testing::AssertionSuccess();
-    keep(actual, "actual");
-    keep(difference, "difference");
-    return testing::AssertionFailure() << name << ": " << differing << " pixels differ ("
-                                       << 100 * differingShare << " %); see " << folder.toStdString();
+    return matchesPicture(image, "charts/" + name, channelTolerance, share);
 }
 
 void ManualQueue::async(std::function<void()> block) {

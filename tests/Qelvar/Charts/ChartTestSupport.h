@@ -47,10 +47,7 @@ QImage draw(QVChartSeries& series, const std::vector<QVChartPointPtr>& points, L
 /// The alpha of the pixel whose top left is at that point of the image, from 0 to 255.
 int alphaAt(const QImage& image, double x, double y);
 
-/// Compares with tests/data/charts/<name>.png: a pixel differs when a channel is off by more than
-/// `channelTolerance`; at most `share` of the pixels may. On failure the actual image and the difference are
-/// written to chart-goldens/ beside the test program. `QELVAR_UPDATE_GOLDEN=1 ChartsTests` writes the files
-/// anew.
+/// Compares with tests/data/charts/<name>.png.
 testing::AssertionResult matchesGolden(const QImage& image, const std::string& name,
                                        int channelTolerance = 12, double share = 0.002);
 

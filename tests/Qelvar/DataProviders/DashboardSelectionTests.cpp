@@ -47,6 +47,14 @@ class SelectionTest : public ProviderTest {
         platform::MotionHardware::install(nullptr);
         platform::PairedDevices::shared().setActivePairedDevice(false);
     }
+    /// What a process does that ends and is started again.
+    void relaunch() {
+        userDefaults.setHealthStore(nullptr);
+        openStore();
+        userDefaults.setHealthStore(store);
+        platform::UserDefaults::setStandard(
+            std::make_unique<platform::UserDefaults>(folder.path() / "defaults"));
+    }
     std::unique_ptr<QVDashboardDataUnitGroupsController> makeController() {
         auto controller = std::make_unique<QVDashboardDataUnitGroupsController>(
             VSDataUnitGroupController::shared(), [this] { return demo; }, userDefaults);
@@ -123,6 +131,7 @@ TEST_F(SelectionTest, ChangesAreKeptAndTold) {
         controller->setDataUnitGroupsForDashboard({group(6), group(59)});
     }
     ASSERT_TRUE(waitUntilStored(dashboardKey, {6, 59}));
+    relaunch();
     auto controller = loadedController();
     EXPECT_EQ(ids(controller->dataUnitGroupsForDashboard()), (IDs{6, 59}));
     ASSERT_TRUE(waitUntil([&] { return ids(controller->selectedDataUnitGroupsArray()) == IDs{59}; }));
@@ -143,16 +152,57 @@ TEST_F(SelectionTest, AChangeBeforeTheListIsLoadedLosesNothing) {
     EXPECT_EQ(ids(controller->dataUnitGroupsForDashboard()), (IDs{6, 59}));
 }
 
-TEST_F(SelectionTest, ASelectionThatCannotBeReadIsNotReplaced) {
-    storeIDs(selectionKey, {13, 6});
-    userDefaults.setHealthStore(nullptr);
-    auto controller = makeController();
-    // Behind the failed read of the dashboard and before the answer to that of the selection.
-    platform::mainQueue().async([this] { userDefaults.setHealthStore(store); });
-    ASSERT_TRUE(waitUntil([&] { return !controller->selectedDataUnitGroupsArray().empty(); }));
-    EXPECT_EQ(ids(controller->selectedDataUnitGroupsArray()), (IDs{59, 7, 10}));
-    storeIDs("behind the saves before", {});
-    EXPECT_EQ(stored(selectionKey), (IDs{13, 6}));
+TEST_F(SelectionTest, WhatCannotBeReadIsNotReplaced) {
+    struct Case {
+        const char* what;
+        void (*change)(QVDashboardDataUnitGroupsController& controller);
+        IDs list, selection;
+    };
+    const Case cases[] = {
+        {"looked at again",
+         [](auto& controller) { controller.loadAgainIfFailed(); },
+         {13, 7, 59, 6},
+         {13, 6}},
+        {"added",
+         [](auto& controller) { controller.addDataUnitGroupToDashboard(group(VSGroupID::Height)); },
+         {13, 7, 59, 6, VSGroupID::Height},
+         {13, 6}},
+        {"removed, and removed what only the stored list holds",
+         [](auto& controller) {
+             controller.removeDataUnitGroupFromDashboard(group(7));
+             controller.removeDataUnitGroupFromDashboard(group(13));
+         },
+         {13, 59, 6},
+         {13, 6}},
+        {"put in another order",
+         [](auto& controller) {
+             controller.setDataUnitGroupsForDashboard({group(10), group(59), group(6), group(7)});
+         },
+         {13, 59, 6, 7},
+         {13, 6}},
+    };
+    platform::PairedDevices::shared().setActivePairedDevice(true);
+    platform::UserDefaults::standard().setValue("AutoAddedDataUnitGroupIDs", VSValue::Array{8});
+    for (const Case& each : cases) {
+        SCOPED_TRACE(each.what);
+        storeIDs(dashboardKey, {13, 7, 59, 6});
+        storeIDs(selectionKey, {13, 6});
+        userDefaults.setHealthStore(nullptr);
+        auto controller = loadedController();
+        ASSERT_TRUE(waitUntil([&] { return !controller->selectedDataUnitGroupsArray().empty(); }));
+        EXPECT_EQ(ids(controller->dataUnitGroupsForDashboard()), (IDs{59, 7, 10}))
+            << "no watch adds to a list that was not read";
+        userDefaults.setHealthStore(store);
+        EXPECT_EQ(stored(dashboardKey), (IDs{13, 7, 59, 6}));
+        each.change(*controller);
+        ASSERT_TRUE(waitUntil([&] { return ids(controller->dataUnitGroupsForDashboard()) == each.list; }));
+        ASSERT_TRUE(
+            waitUntil([&] { return ids(controller->selectedDataUnitGroupsArray()) == each.selection; }));
+        EXPECT_EQ(ids(observer->last), each.list);
+        storeIDs("behind the saves before", {});
+        EXPECT_EQ(stored(dashboardKey), each.list);
+        EXPECT_EQ(stored(selectionKey), each.selection);
+    }
 }
 
 TEST_F(SelectionTest, APairedWatchAddsItsDisplayTypesOnce) {
@@ -164,7 +214,7 @@ TEST_F(SelectionTest, APairedWatchAddsItsDisplayTypesOnce) {
         controller->removeDataUnitGroupFromDashboard(group(6));
         ASSERT_TRUE(waitUntilStored(dashboardKey, {59, 7, 10, 8}));
     }
-    platform::UserDefaults::setStandard(std::make_unique<platform::UserDefaults>(folder.path() / "defaults"));
+    relaunch();
     const auto added = platform::UserDefaults::standard().value("AutoAddedDataUnitGroupIDs");
     ASSERT_TRUE(added && added->array());
     EXPECT_EQ(*added->array(), (VSValue::Array{8, 6}));
@@ -205,6 +255,8 @@ TEST_F(SelectionTest, WithoutAStoreTheDefaultsApply) {
     drainMainQueue();
     EXPECT_EQ(ids(controller->dataUnitGroupsForDashboard()), (IDs{59, 7, 10}));
     controller->removeDataUnitGroupFromDashboard(group(59));
+    controller->setSelectedDataUnitGroups({group(7)});
+    drainMainQueue();
     VSSetLogSink(before);
     EXPECT_EQ(ids(controller->dataUnitGroupsForDashboard()), (IDs{7, 10}));
     std::lock_guard lock(mutex);
@@ -255,4 +307,27 @@ TEST_F(SelectionTest, TheOrderOfSourcesIsStoredAndTold) {
     ASSERT_TRUE(waitUntil([&] { return orderObserver->type != nullptr; }));
     EXPECT_EQ(orderObserver->order, *order);
     EXPECT_EQ(sources(), order);
+}
+
+TEST_F(SelectionTest, AnOrderThatTheStoreRefusesIsTold) {
+    VSHealthStore::Options options;
+    options.readOnly = true;
+    openStore(options);
+    std::mutex mutex;
+    std::vector<std::string> lines;
+    const auto before = VSSetLogSink([&](VSLogLevel, std::string_view line) {
+        std::lock_guard lock(mutex);
+        lines.emplace_back(line);
+    });
+    QVDataProviderOrderController controller(store);
+    auto orderObserver = std::make_shared<OrderObserver>();
+    controller.addObserver(orderObserver);
+    const std::vector<VSSource> order{VSSource::forImportedName("Phone")};
+    controller.setOrderedDataProviderSources(order, type(VSCode::StepCount));
+    const bool told = waitUntil([&] { return orderObserver->type != nullptr; });
+    VSSetLogSink(before);
+    EXPECT_TRUE(told);
+    EXPECT_EQ(orderObserver->order, order);
+    std::lock_guard lock(mutex);
+    EXPECT_EQ(std::count(lines.begin(), lines.end(), "Error saving source order"), 1);
 }

@@ -23,7 +23,13 @@ class ProviderTest : public ::testing::Test {
  protected:
     ProviderTest() {
         platform::loadTranslations();
-        auto opened = VSHealthStore::open(folder.path());
+        openStore();
+    }
+    /// Closes the store, if it is open, and opens it again, as the next session does.
+    void openStore(VSHealthStore::Options options = {}) {
+        unitController.reset();
+        store.reset();
+        auto opened = VSHealthStore::open(folder.path(), options);
         if (!opened) ADD_FAILURE() << opened.error().message;
         store = opened.value();
         unitController = std::make_shared<VSUnitController>(store);

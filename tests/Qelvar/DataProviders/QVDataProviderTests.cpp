@@ -194,8 +194,10 @@ TEST_F(DataProviderTest, UnitPreferencesConcernOnlyTheirTypes) {
     EXPECT_EQ(weight->restarts, restarts);
     EXPECT_TRUE(weight->hasLoadedCurrentValue());
 
-    const int told = delegate->historical;
+    const int told = delegate->historical, toldCurrent = delegate->current;
     unitController->updatePreferredUnit(lb, bodyMass->anyDataUnit());
+    EXPECT_EQ(delegate->current, toldCurrent + 1);
+    EXPECT_TRUE(weight->holdsCurrentValue()) << "it is shown while it is asked for again";
     EXPECT_EQ(weight->restarts, restarts + 1);
     EXPECT_EQ(weight->currentValueDataState(), QVDataState::NotLoaded);
     EXPECT_EQ(delegate->historical, told + 1);

@@ -29,18 +29,14 @@ QVDateSpan spanOf(QVTimeScope timeScope, bool noon = false) {
 
 TEST(QVTimeScope, NamesAndZoomLevels) {
     test::FixedEnvironment environment;
-    EXPECT_EQ(QVTimeScopeDisplayName(QVTimeScope::Hour), "Hour");
     EXPECT_EQ(QVTimeScopeDisplayName(QVTimeScope::Year), "Year");
     EXPECT_TRUE(QVTimeScopeDisplayName(QVTimeScope{5}).isNull());
     EXPECT_TRUE(QVTimeScopeDisplayName(QVTimeScope{-1}).isNull());
-
-    EXPECT_EQ(QVDateZoomForTimeScope(QVTimeScope::Hour), VSDateZoom::Hour);
-    EXPECT_EQ(QVDateZoomForTimeScope(QVTimeScope::Day), VSDateZoom::Day);
-    EXPECT_EQ(QVDateZoomForTimeScope(QVTimeScope::Year), VSDateZoom::Year);
     for (const auto timeScope : {QVTimeScope::Day, QVTimeScope::Week, QVTimeScope::Month, QVTimeScope::Year})
         EXPECT_EQ(QVTimeScopeForDateZoom(QVDateZoomForTimeScope(timeScope)), timeScope);
     // The hour level comes back as a day, which is the level before it.
-    EXPECT_EQ(QVDateZoomForTimeScope(QVTimeScopeForDateZoom(VSDateZoom::Hour)), VSDateZoom::Day);
+    EXPECT_EQ(QVDateZoomForTimeScope(QVTimeScope::Hour), VSDateZoom::Hour);
+    EXPECT_EQ(QVTimeScopeForDateZoom(VSDateZoom::Hour), QVTimeScope::Day);
     EXPECT_EQ(QVTimeScopeForDateZoom(VSDateZoom{9}), QVTimeScope::Hour);
 }
 
@@ -126,6 +122,11 @@ TEST(QVDateCache, KeepsItsDatesUntilTheSignificantTimeChange) {
 
     cache.removeObserver(observer.get());
     platform::SystemEvents::shared().postSignificantTimeChange();
+    {
+        QVDateCache gone;
+        gone.addObserver(observer);
+    }
+    platform::SystemEvents::shared().postSignificantTimeChange();
     EXPECT_EQ(observer->updates, 2);
 }
 
@@ -143,20 +144,6 @@ TEST(QVDateCache, LooksUpEveryScopeAndVariant) {
             EXPECT_EQ(QVDateCacheEndDate(cache, none, noon), std::nullopt);
         }
     }
-    EXPECT_EQ(cache.endOfYearMidnight(), date("2015-11-30T23:59:59"));
-    EXPECT_EQ(cache.endOfMonthNoon(), date("2015-11-16T12:00"));
-    EXPECT_EQ(cache.startOfWeek(true), cache.startOfWeekNoon());
-    EXPECT_EQ(cache.startOfWeek(false), cache.startOfWeekMidnight());
-}
-
-TEST(QVDateCache, CacheThatIsGoneHearsNothing) {
-    test::FixedEnvironment environment;
-    auto observer = std::make_shared<CacheObserver>();
-    auto cache = std::make_unique<QVDateCache>();
-    cache->addObserver(observer);
-    cache.reset();
-    platform::SystemEvents::shared().postSignificantTimeChange();
-    EXPECT_EQ(observer->updates, 0);
 }
 
 struct ScopeObserver : QVSelectedTimeScopeControllerObserver {
@@ -185,8 +172,6 @@ TEST(QVTimePeriod, IsAValueOfTwoDates) {
     QVTimePeriod period(VSCategorySample(type, 1, date("2020-03-30T23:00"), date("2020-03-31T07:00")));
     EXPECT_EQ(period, QVTimePeriod(date("2020-03-30T23:00"), date("2020-03-31T07:00")));
     EXPECT_EQ(period.description(), "2020-03-30T23:00:00+02:00 - 2020-03-31T07:00:00+02:00");
-    EXPECT_EQ(std::hash<QVTimePeriod>()(period),
-              std::hash<VSDate>()(period.startDate()) ^ std::hash<VSDate>()(period.endDate()));
     QVTimePeriod copy = period;
     copy.setEndDate(date("2020-03-31T08:00"));
     EXPECT_NE(copy, period);

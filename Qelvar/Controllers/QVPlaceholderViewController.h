@@ -2,11 +2,13 @@
 
 #include <QStringList>
 #include <functional>
+#include <memory>
 #include <vector>
 
 #include "Platform/Screen.h"
 
-/// A screen whose rooms are not built yet: says what will be here, and offers what can be done already.
+/// A screen whose rooms are not built yet: says what will be here, and offers what can be done already. Its
+/// texts follow the user's language. Main thread only.
 class QVPlaceholderViewController : public platform::Screen {
     Q_OBJECT
     Q_PROPERTY(QString icon READ icon CONSTANT)
@@ -15,13 +17,14 @@ class QVPlaceholderViewController : public platform::Screen {
     Q_PROPERTY(QStringList actionTitles READ actionTitles NOTIFY textsChanged)
  public:
     struct Action {
-        const char* titleKey;
+        std::function<QString()> title;
         std::function<void()> run;
     };
-    /// The icon is the name of one (platform::icon), or empty; `title`
-    /// gives the title in the user's language.
-    QVPlaceholderViewController(std::function<QString()> title, QString icon, const char* messageKey,
-                                std::vector<Action> actions = {});
+    using ActivityFactory = std::function<std::shared_ptr<const platform::UserActivity>()>;
+
+    /// The icon is the name of one (platform::icon), or empty; `title` gives the title in the user's
+    /// language.
+    QVPlaceholderViewController(std::function<QString()> title, QString icon, const char* messageKey);
 
     QUrl view() const override;
     QString icon() const { return icon_; }
@@ -32,12 +35,21 @@ class QVPlaceholderViewController : public platform::Screen {
     QStringList actionTitles() const;
     Q_INVOKABLE void runAction(int index);
 
+    void setContent(const char* messageKey, std::vector<Action> actions);
+    /// Makes the screen's user activity, now and whenever the language changes.
+    void setActivityFactory(ActivityFactory factory);
+
  signals:
     void textsChanged();
+
+ protected:
+    /// What the user is at is another.
+    void updateActivity();
 
  private:
     const QString icon_;
     bool iconIsGlyph_ = false;
-    const char* const messageKey_;
-    const std::vector<Action> actions_;
+    const char* messageKey_;
+    std::vector<Action> actions_;
+    ActivityFactory activityFactory_;
 };

@@ -9,7 +9,12 @@ FocusScope {
     Rectangle { anchors.fill: parent; color: SystemStyle.groupedBackground }
 
     Flickable {
+        id: rows
         anchors.fill: parent
+        function show(row) {
+            const top = row.mapToItem(contentItem, 0, 0).y
+            contentY = Math.max(Math.min(contentY, top), top + row.height - height)
+        }
         contentHeight: content.height + 48
         boundsBehavior: Flickable.StopAtBounds
         Column {
@@ -28,10 +33,11 @@ FocusScope {
                         required property string modelData
                         required property int index
                         width: content.width
-                        height: SystemStyle.touchHeight
+                        height: Math.max(SystemStyle.touchHeight, actionText.implicitHeight + 16)
                         text: modelData
                         focus: index === 0
                         onClicked: root.screen.runAction(index)
+                        onVisualFocusChanged: if (visualFocus) rows.show(action)
                         Accessible.name: text
                         Keys.onReturnPressed: action.clicked()
                         Keys.onEnterPressed: action.clicked()
@@ -41,6 +47,8 @@ FocusScope {
                             Rectangle { width: parent.width; height: SystemStyle.pixel; color: SystemStyle.hairline; y: parent.height - height }
                         }
                         contentItem: Text {
+                            id: actionText
+                            wrapMode: Text.Wrap
                             leftPadding: 16
                             rightPadding: 16
                             text: action.text

@@ -1,0 +1,49 @@
+#include "Qelvar/App/QVTerminationSignals.h"
+
+#include <fcntl.h>
+#include <signal.h>
+#include <unistd.h>
+
+#include <QCoreApplication>
+#include <cerrno>
+
+namespace {
+
+constexpr int kSignals[] = {SIGTERM, SIGINT};
+
+// The handler's end of the pipe; there is one application in the process.
+int writeEnd = -1;
+
+// A handler may do next to nothing: it wakes the event loop. A second signal ends the process at once.
+void handle(int signal) {
+    const int error = errno;
+    const auto number = static_cast<unsigned char>(signal);
+    if (write(writeEnd, &number, 1) != 1) _exit(128 + signal);
+    errno = error;
+}
+
+}  // namespace
+
+QVTerminationSignals::QVTerminationSignals() {
+    int ends[2];
+    if (pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0) return;  // then they end the process as they always do
+    readEnd_ = ends[0];
+    writeEnd = ends[1];
+    notifier_ = std::make_unique<QSocketNotifier>(readEnd_, QSocketNotifier::Read);
+    QObject::connect(notifier_.get(), &QSocketNotifier::activated, notifier_.get(), [this] {
+        unsigned char number = 0;
+        if (read(readEnd_, &number, 1) == 1) QCoreApplication::exit(128 + number);
+    });
+    struct sigaction action {};
+    action.sa_handler = handle;
+    action.sa_flags = static_cast<int>(SA_RESETHAND);
+    for (const int number : kSignals) sigaction(number, &action, nullptr);
+}
+
+QVTerminationSignals::~QVTerminationSignals() {
+    if (readEnd_ < 0) return;
+    for (const int number : kSignals) ::signal(number, SIG_DFL);
+    notifier_.reset();
+    close(readEnd_);
+    close(writeEnd);
+}
