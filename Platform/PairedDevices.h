@@ -4,7 +4,8 @@
 
 namespace platform {
 
-/// The watches paired with this machine. Main thread only; one object for the process.
+/// The watches paired with this machine. Main thread only; one object for the process. Nothing on this
+/// platform pairs a watch with the program yet: whoever does tells it here.
 class PairedDevices : public QObject {
     Q_OBJECT
  public:

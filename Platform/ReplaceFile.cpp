@@ -5,6 +5,7 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <string>
 #include <system_error>
 
 namespace platform {
@@ -50,7 +51,8 @@ bool replaceFile(const fs::path& path, std::string_view text, bool durable) {
     std::error_code ignored;
     if (fs::create_directories(path.parent_path(), ignored))
         fs::permissions(path.parent_path(), fs::perms::owner_all, ignored);
-    const fs::path beside = fs::path(path).concat(".new");
+    // Another process may be replacing it too; whole files follow each other.
+    const fs::path beside = fs::path(path).concat(".new-" + std::to_string(getpid()));
     if (!writeNewFile(beside, text, durable) || rename(beside.c_str(), path.c_str()) != 0) {
         const int error = errno;
         fs::remove(beside, ignored);

@@ -71,11 +71,12 @@ void StateRestoration::save() {
     if (!state_ || file_.empty()) return;
     const VSValue value(VSValue::Dictionary{{kVersionKey, kVersion}, {kStateKey, state_()}});
     std::string text = value.serialized();
-    if (text == written_) return;
+    if (text == written_ && !*writingFailed_) return;
     written_ = std::move(text);
     if (!worker_) worker_ = makeSerialQueue("saved state");
-    worker_->async([file = file_, content = written_] {
-        if (!replaceFile(file, content, false))
+    worker_->async([file = file_, content = written_, failed = writingFailed_] {
+        *failed = !replaceFile(file, content, false);
+        if (*failed)
             VSLog(VSLogLevel::Error, "What the next session is to begin with cannot be written to " +
                                          file.string() + ": " + std::strerror(errno));
     });

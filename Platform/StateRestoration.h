@@ -3,6 +3,7 @@
 #include <QObject>
 #include <QString>
 #include <QTimer>
+#include <atomic>
 #include <filesystem>
 #include <functional>
 #include <map>
@@ -61,6 +62,8 @@ class StateRestoration : public QObject {
     std::optional<VSValue::Dictionary> savedState_;
     std::function<VSValue::Dictionary()> state_;
     std::string written_;  // what the file holds, or will when the worker is through
+    // Set by the worker; then it is not what the file holds.
+    std::shared_ptr<std::atomic<bool>> writingFailed_ = std::make_shared<std::atomic<bool>>(false);
     QTimer idleTimer_;
     std::shared_ptr<Queue> worker_;
 };

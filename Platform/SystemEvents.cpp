@@ -7,9 +7,6 @@
 
 #include <QCoreApplication>
 #include <QDBusConnection>
-#include <QDBusMessage>
-#include <QDBusPendingCallWatcher>
-#include <QDBusPendingReply>
 #include <QFile>
 #include <QFileSystemWatcher>
 #include <QSocketNotifier>
@@ -20,6 +17,7 @@
 #include <cstring>
 #include <tuple>
 
+#include "Platform/DesktopSettings.h"
 #include "Platform/Localization.h"
 #include "Vessa/Base/VSCalendar.h"
 #include "Vessa/Base/VSEnvironment.h"
@@ -70,14 +68,8 @@ bool meanTheSame(const VSLocaleVariables& a, const VSLocaleVariables& b) {
     return same(a.all, b.all) && same(a.time, b.time) && same(a.language, b.language);
 }
 
-// A session without a bus gets none: the library would start one.
-bool hasSessionBus() {
-    return qEnvironmentVariableIsSet("DBUS_SESSION_BUS_ADDRESS") ||
-           QFile::exists(qEnvironmentVariable("XDG_RUNTIME_DIR") + QStringLiteral("/bus"));
-}
-
-std::optional<bool> uses24HourClock(QVariant setting) {
-    while (setting.canConvert<QDBusVariant>()) setting = setting.value<QDBusVariant>().variant();
+std::optional<bool> uses24HourClock(const QVariant& packed) {
+    const QVariant setting = unpackedSetting(packed);
     if (setting == QStringLiteral("24h")) return true;
     if (setting == QStringLiteral("12h")) return false;
     return std::nullopt;
@@ -253,22 +245,7 @@ struct SystemEvents::Private {
 
     // The desktop's settings; the clock is the one that a locale does not tell.
     void startListeningToSettings() {
-        if (!hasSessionBus()) return;
-        auto bus = QDBusConnection::sessionBus();
-        if (!bus.isConnected()) return;
-        const QString service = QStringLiteral("org.freedesktop.portal.Desktop");
-        const QString path = QStringLiteral("/org/freedesktop/portal/desktop");
-        const QString interface = QStringLiteral("org.freedesktop.portal.Settings");
-        bus.connect(service, path, interface, QStringLiteral("SettingChanged"), &events,
-                    SLOT(busSettingChanged(QString, QString, QDBusVariant)));
-        auto read = QDBusMessage::createMethodCall(service, path, interface, QStringLiteral("Read"));
-        read.setArguments({kSettingsGroup, kClockKey});
-        auto* answer = new QDBusPendingCallWatcher(bus.asyncCall(read), &events);
-        QObject::connect(answer, &QDBusPendingCallWatcher::finished, &events, [this, answer] {
-            answer->deleteLater();
-            const QDBusPendingReply<QDBusVariant> reply = *answer;
-            if (reply.isValid()) locale->clockPreferred(uses24HourClock(reply.value().variant()));
-        });
+        listenToDesktopSetting(&events, "busSettingChanged", kSettingsGroup, kClockKey);
     }
 
     SystemEvents& events;

@@ -1,27 +1,23 @@
 #include "Platform/TextScale.h"
 
 #include <QCoreApplication>
-#include <QDBusConnection>
-#include <QDBusMessage>
-#include <QDBusPendingCallWatcher>
-#include <QDBusPendingReply>
 #include <QFont>
 #include <QGuiApplication>
 #include <QQmlEngine>
+#include <QTimer>
 #include <algorithm>
 #include <cmath>
+
+#include "Platform/DesktopSettings.h"
 
 namespace platform {
 
 namespace {
 
-constexpr double kSmallest = 1, kLargest = 3;
+constexpr double kSmallest = 1, kLargest = 2;
 /// The size of the largest of the fonts that desktops come with, in points, and how far theirs are apart.
 constexpr double kDesktopFontSize = 11, kNoticeable = 1.15;
 
-const QString kPortal = QStringLiteral("org.freedesktop.portal.Desktop");
-const QString kPortalPath = QStringLiteral("/org/freedesktop/portal/desktop");
-const QString kPortalSettings = QStringLiteral("org.freedesktop.portal.Settings");
 const QString kGroup = QStringLiteral("org.gnome.desktop.interface");
 const QString kKey = QStringLiteral("text-scaling-factor");
 
@@ -30,15 +26,6 @@ double factorOfFont(const QFont& font) {
     const double points = font.pointSizeF() > 0 ? font.pointSizeF() : font.pixelSize() * 0.75;
     const double factor = points / kDesktopFontSize;
     return factor < kNoticeable ? 1 : factor;
-}
-
-/// The number in a value that may be packed more than once.
-std::optional<double> number(QVariant value) {
-    while (value.metaType() == QMetaType::fromType<QDBusVariant>())
-        value = value.value<QDBusVariant>().variant();
-    bool isNumber = false;
-    const double result = value.toDouble(&isNumber);
-    return isNumber && std::isfinite(result) ? std::optional(result) : std::nullopt;
 }
 
 void registerForLayouts() {
@@ -86,29 +73,19 @@ void TextScale::start() {
     if (wasSet_) return;
     if (const auto factor = fromText(qgetenv("QELVAR_TEXT_SCALE"))) return set(*factor);
     take(factorOfFont(QGuiApplication::font()));
-    // On the other platforms the factor is already in the size of the points.
-    if (QGuiApplication::platformName().startsWith(QLatin1String("wayland"))) askPortal();
-}
-
-/// A desktop without the portal never answers, which is no error.
-void TextScale::askPortal() {
-    auto bus = QDBusConnection::sessionBus();
-    if (!bus.isConnected()) return;
-    bus.connect(kPortal, kPortalPath, kPortalSettings, QStringLiteral("SettingChanged"), this,
-                SLOT(portalSettingChanged(QString, QString, QDBusVariant)));
-    auto call = QDBusMessage::createMethodCall(kPortal, kPortalPath, kPortalSettings, QStringLiteral("Read"));
-    call << kGroup << kKey;
-    auto* watcher = new QDBusPendingCallWatcher(bus.asyncCall(call), this);
-    connect(watcher, &QDBusPendingCallWatcher::finished, this, [this](QDBusPendingCallWatcher* finished) {
-        const QDBusPendingReply<QDBusVariant> reply = *finished;
-        if (reply.isValid()) portalSettingChanged(kGroup, kKey, reply.value());
-        finished->deleteLater();
-    });
+    // On the other platforms the factor is already in the size of the points. The first screen need not wait
+    // for the bus.
+    if (QGuiApplication::platformName().startsWith(QLatin1String("wayland")))
+        QTimer::singleShot(0, this,
+                           [this] { listenToDesktopSetting(this, "portalSettingChanged", kGroup, kKey); });
 }
 
 void TextScale::portalSettingChanged(const QString& group, const QString& key, const QDBusVariant& value) {
     if (wasSet_ || group != kGroup || key != kKey) return;
-    if (const auto factor = number(value.variant())) take(*factor);
+    bool isNumber = false;
+    const double factor = unpackedSetting(value.variant()).toDouble(&isNumber);
+    // The portal says 1 to somebody who has chosen a larger font in its place.
+    if (isNumber && std::isfinite(factor)) take(std::max(factor, factorOfFont(QGuiApplication::font())));
 }
 
 }  // namespace platform

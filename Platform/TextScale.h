@@ -6,7 +6,7 @@
 
 namespace platform {
 
-/// How large the person wants texts: a factor of the layout's sizes, from 1 to 3. Layouts know it as the
+/// How large the person wants texts: a factor of the layout's sizes, from 1 to 2. Layouts know it as the
 /// singleton `TextScale`. Main thread only; one object for the process.
 class TextScale : public QObject {
     Q_OBJECT
@@ -19,7 +19,7 @@ class TextScale : public QObject {
     /// Takes QELVAR_TEXT_SCALE when it is set, else what the desktop says, and follows that. Does nothing
     /// after set(). The desktop's answer may come after the first frame.
     void start();
-    /// A factor as a person writes it: a number from 1 to 3.
+    /// A factor as a person writes it: a number from 1 to 2.
     static std::optional<double> fromText(const QByteArray& text);
 
  signals:
@@ -31,7 +31,6 @@ class TextScale : public QObject {
  private:
     TextScale() = default;
     void take(double factor);
-    void askPortal();
 
     double factor_ = 1;
     bool wasSet_ = false;

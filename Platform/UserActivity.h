@@ -8,6 +8,7 @@
 namespace platform {
 
 /// What the user is looking at, in a form that can be searched for and opened again. Main thread only.
+/// Nothing on this platform lists them yet: a link on the command line opens them.
 struct UserActivity {
     QString activityType;
     QString title;

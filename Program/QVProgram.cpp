@@ -11,9 +11,9 @@
 
 namespace {
 
-constexpr const QVCommand* kCommands[] = {&QVImportCommand, &QVExportCommand, &QVStatisticsCommand, &QVSamplesCommand,
-                                          &QVTypesCommand,  &QVSourcesCommand,    &QVBatchesCommand,
-                                          &QVUndoCommand,   &QVCheckCommand,      &QVSalvageCommand};
+constexpr const QVCommand* kCommands[] = {
+    &QVImportCommand,  &QVExportCommand,  &QVStatisticsCommand, &QVSamplesCommand, &QVTypesCommand,
+    &QVSourcesCommand, &QVBatchesCommand, &QVUndoCommand,       &QVCheckCommand,   &QVSalvageCommand};
 
 constexpr QVCommandOption kCommonOptions[] = {{"store", true}, {"now", true}, {"help", false}};
 constexpr QVCommandOption kProgramOptions[] = {
@@ -30,7 +30,7 @@ Without a command the application is started.
   --screenshots DIR   draw every tab and time scope into PNG files in DIR and end; needs no display
   --size WxH          the window's size in points (375x667)
   --scale S           pixels per point of the screenshots
-  --text-scale T      how large texts are, from 1 to 3 (QELVAR_TEXT_SCALE, or as the desktop says)
+  --text-scale T      how large texts are, from 1 to 2 (QELVAR_TEXT_SCALE, or as the desktop says)
   --open LINK         open a link of the application, such as qelvar://HealthDataTab?DataCategory=2&DataUnit=59
 
 For the application and every command:
@@ -136,7 +136,7 @@ QVExitStatus runApplication(char* program, const QVCommandArguments& arguments) 
     }
     if (const auto text = arguments.value("text-scale")) {
         const auto factor = platform::TextScale::fromText(QByteArray::fromStdString(*text));
-        if (!factor) return QVFailUsage({}, "--text-scale: " + *text + " is not a number from 1 to 3");
+        if (!factor) return QVFailUsage({}, "--text-scale: " + *text + " is not a number from 1 to 2");
         options.textScale = *factor;
     }
     if (const auto link = arguments.value("open")) options.openLink = QString::fromStdString(*link);

@@ -146,7 +146,7 @@ VSTimeSpan spanOfSample(const VSSample& sample, VSDuration shift, const VSTimePe
         const VSDate day = VSStartOfNoonDay(span.start + shift, calendar);
         span.end = calendar.addDays(day, 1) - shift;
     }
-    if (span.start < rules.now && rules.now < span.end) span.end = rules.now;
+    span.end = std::min(span.end, rules.now);
     return span;
 }
 
@@ -156,6 +156,7 @@ std::vector<Account> accounts(const std::vector<VSSamplePtr>& samples, const VST
     std::map<const VSSourceRevision*, size_t> ranks;
     RecordedHours recordedHours(calendar);
     for (const VSSamplePtr& sample : samples) {
+        if (sample->startDate() > rules.now) continue;
         const VSSourceRevision& revision = sample->sourceRevision();
         const auto [rank, isNew] = ranks.try_emplace(&revision);
         if (isNew)
@@ -206,6 +207,11 @@ VSDate VSLastMomentOfSample(const VSSample& sample, const VSCalendar& calendar) 
     const VSDate end = sample.endDate();
     const bool endsADay = sample.startDate() < end && calendar.startOfDay(end) == end;
     return endsADay ? end - std::chrono::seconds(1) : end;
+}
+
+bool VSContinuesSection(VSDate last, VSDate start, const VSCalendar& calendar) {
+    return start - last <= VSMaximumGapForConsecutiveSections &&
+           calendar.startOfDay(start) <= calendar.addDays(calendar.startOfDay(last), 1);
 }
 
 std::vector<VSTimeSpan> VSCoalesceTimePeriodsFromSamples(const std::vector<VSSamplePtr>& samples,

@@ -23,7 +23,7 @@ struct VSTimePeriodRules {
     std::optional<VSPredicate> counted;
     /// The order in which sources count. One that is not in it comes after all that are.
     std::vector<VSSource> sources;
-    /// What has begun and has not ended by now has lasted until now.
+    /// What has begun and has not ended by now has lasted until now; what has not begun does not count.
     VSDate now;
     /// Days reach from noon to noon, and a night stands at the hours at which the sleeper lived it.
     bool nights = false;
@@ -75,6 +75,11 @@ std::vector<VSDurationInBucket> VSCalculateTotalDurations(const std::vector<VSTi
 /// that ends its last day, the second before.
 VSDate VSLastMomentOfSample(const VSSample& sample, const VSCalendar& calendar);
 
-/// Days of the same kind follow each other when no more than this lies between the end of one record and the
-/// start of the next: from a morning to the evening of the next day.
-inline constexpr VSDuration VSMaximumGapForConsecutiveSections = std::chrono::hours(36);
+/// The longest time that can lie between two moments of days that follow each other, of which one may have 25
+/// hours. Days further apart never belong together.
+inline constexpr VSDuration VSMaximumGapForConsecutiveSections = std::chrono::hours(49);
+/// Whether a record that starts then goes on with what was so until `last` (VSLastMomentOfSample): on the
+/// same calendar day, an earlier one or the next. No length of time alone would tell: 34 hours lie between a
+/// morning and the evening of the next day, and between an evening and the morning after the next, which has
+/// left a day out.
+bool VSContinuesSection(VSDate last, VSDate start, const VSCalendar& calendar);

@@ -137,6 +137,7 @@ bool QVAppDelegate::shouldSelectTab(int index) const {
 }
 
 void QVAppDelegate::didBecomeActive() {
+    controllerManager_->dashboardDataUnitGroupsController().loadAgainIfFailed();
     if (!QVUsesDemoData() || isResettingDemoData()) return;
     const std::string demoDataSex = demoDataSexDefault();
     if (!demoData_)

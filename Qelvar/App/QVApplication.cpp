@@ -201,7 +201,6 @@ int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options)
         QIcon(QPixmap::fromImage(platform::icon(QStringLiteral("qelvar"), {128, 128}, 1))));
     QVStartupTrace::note("application object");
     platform::loadTranslations();
-    QGuiApplication::setLayoutDirection(platform::isRightToLeft() ? Qt::RightToLeft : Qt::LeftToRight);
     // Pictures show what the command line says, not what the desktop does meanwhile.
     if (!options.screenshots) platform::SystemEvents::shared().start();
     if (options.textScale > 0) platform::TextScale::shared().set(options.textScale);

@@ -76,7 +76,7 @@ SystemSheet {
         }
         SystemButton {
             id: up
-            anchors { top: field.bottom; topMargin: 4; left: parent.left; right: parent.right }
+            anchors { top: field.bottom; topMargin: 4; left: parent.left; right: parent.right; leftMargin: 12; rightMargin: 12 }
             enabled: model.parentFolder.toString().length > 0
             readonly property string path: decodeURIComponent(model.folder.toString().replace(/^file:\/\//, "")) || "/"
             text: (enabled ? "\u2191  " : "") + path

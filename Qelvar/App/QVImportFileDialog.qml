@@ -62,7 +62,7 @@ T.Popup {
             font.bold: true
             color: SystemStyle.text
             horizontalAlignment: Text.AlignHCenter
-            elide: Text.ElideRight
+            wrapMode: Text.Wrap
             Accessible.role: Accessible.Heading
             Accessible.name: text
         }

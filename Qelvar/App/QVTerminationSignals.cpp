@@ -1,15 +1,12 @@
 #include "Qelvar/App/QVTerminationSignals.h"
 
 #include <fcntl.h>
-#include <signal.h>
 #include <unistd.h>
 
 #include <QCoreApplication>
 #include <cerrno>
 
 namespace {
-
-constexpr int kSignals[] = {SIGTERM, SIGINT};
 
 // The handler's end of the pipe; there is one application in the process.
 int writeEnd = -1;
@@ -37,12 +34,16 @@ QVTerminationSignals::QVTerminationSignals() {
     struct sigaction action {};
     action.sa_handler = handle;
     action.sa_flags = static_cast<int>(SA_RESETHAND);
-    for (const int number : kSignals) sigaction(number, &action, nullptr);
+    for (size_t i = 0; i < signals_.size(); ++i) {
+        sigaction(signals_[i], nullptr, &before_[i]);
+        // What whoever started the program has it ignore stays ignored.
+        if (before_[i].sa_handler != SIG_IGN) sigaction(signals_[i], &action, nullptr);
+    }
 }
 
 QVTerminationSignals::~QVTerminationSignals() {
     if (readEnd_ < 0) return;
-    for (const int number : kSignals) ::signal(number, SIG_DFL);
+    for (size_t i = 0; i < signals_.size(); ++i) sigaction(signals_[i], &before_[i], nullptr);
     notifier_.reset();
     close(readEnd_);
     close(writeEnd);

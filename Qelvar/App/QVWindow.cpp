@@ -41,6 +41,7 @@ QVWindow::QVWindow(QVAppDelegate& app, QSize size) {
     setMinimumSize(kSmallestSize);
     resize(size.isValid() ? size : kPhoneSize);
     setInitialProperties({{QStringLiteral("app"), QVariant::fromValue(&app)}});
+    connect(&app, &QVAppDelegate::localeChanged, engine(), &QQmlEngine::retranslate);
     connect(engine(), &QQmlEngine::quit, qGuiApp, &QGuiApplication::quit);
     setSource(QUrl(QStringLiteral("qrc:/Qelvar/QVTabBarController.qml")));
 }

@@ -106,7 +106,8 @@ class QVChart {
     const std::vector<AxisLabelView>& xAxisLabels() const { return axisLabels_; }
 
  private:
-    struct LayoutContext;  // of the axis labels
+    using AxisLabels = std::vector<const QVAxisLabel*>;  // the descriptor's
+    struct LayoutContext;                                // of the axis labels
     struct ShownImage {
         QImage image;
         QVAnimatedNumber opacity;
@@ -125,8 +126,9 @@ class QVChart {
     void layoutBackgroundView();
 
     void layoutAxisLabels();
-    std::vector<QVAxisLabel> shownAxisLabels() const;
-    LayoutContext axisLabelLayout(const std::vector<QVAxisLabel>& labels) const;
+    AxisLabels shownAxisLabels() const;
+    LayoutContext axisLabelLayout(const AxisLabels& labels) const;
+    double centerForText(double x, double width) const;
     double xForDate(VSDate date) const;
     QRectF plotBounds() const;
     void reuseAxisLabelViews(size_t count, QVAnimationTime now, QVAnimationTime duration);

@@ -15,9 +15,17 @@ constexpr QVAnimationTime kAxisDuration{250'000};
 constexpr double kOverflowTolerance = 1.1920928955078125e-07;
 /// Larger texts shrink no further; rather some are left out.
 constexpr double kSmallestLargeRatio = 0.8;
+/// A text that would come nearer to the edge of the chart seems cut.
+constexpr double kEdgeMargin = 4;
 
 double textWidth(const QVAxisLabel& label) {
     return QFontMetricsF(label.labelFont).horizontalAdvance(label.text);
+}
+
+double widestText(const std::vector<const QVAxisLabel*>& labels) {
+    double widest = 0;
+    for (const QVAxisLabel* label : labels) widest = std::max(widest, textWidth(*label));
+    return widest;
 }
 
 /// 1 when the text fits, else the first of 0.9, 0.8, ... 0.1 at which it does, else practically 0.
@@ -54,41 +62,51 @@ double QVChart::xForDate(VSDate date) const {
     return onPixelGrid(plotBounds().left() + position * plotBounds().width());
 }
 
-QVChart::LayoutContext QVChart::axisLabelLayout(const std::vector<QVAxisLabel>& labels) const {
+/// Under its date; where the edge would cut it, it begins or ends with the divider.
+double QVChart::centerForText(double x, double width) const {
+    const double room = size_.width();
+    if (width > room - 2 * dividerInset_) return x;
+    if (x - width / 2 < kEdgeMargin) return dividerInset_ + width / 2;
+    if (x + width / 2 > room - kEdgeMargin) return room - dividerInset_ - width / 2;
+    return x;
+}
+
+QVChart::LayoutContext QVChart::axisLabelLayout(const AxisLabels& labels) const {
     LayoutContext context;
     const double columnWidth = plotBounds().width() / static_cast<double>(labels.size());
     const double centerLine = onPixelGrid(size_.height() - xAxisGutterHeight_ / 2);
-    double widest = 0;
-    for (const QVAxisLabel& label : labels) {
-        widest = std::max(widest, textWidth(label));
-        QRectF frame(0, 0, columnWidth, QFontMetricsF(label.labelFont).height());
-        frame.moveCenter({xForDate(label.location), centerLine});
+    context.fontRatio = fittingRatio(widestText(labels), columnWidth);
+    for (const QVAxisLabel* label : labels) {
+        QRectF frame(0, 0, columnWidth, QFontMetricsF(label->labelFont).height());
+        const double width = textWidth(*label) * context.fontRatio;
+        frame.moveCenter({centerForText(xForDate(label->location), width), centerLine});
         context.targetFrames.push_back(frame);
     }
-    context.fontRatio = fittingRatio(widest, columnWidth);
     return context;
 }
 
-/// The labels of the axis; where larger texts are wanted and do not fit, every second or third.
-std::vector<QVAxisLabel> QVChart::shownAxisLabels() const {
-    if (!xAxisDescriptor_ || !xAxisDescriptor_->axisLabels()) return {};
-    std::vector<QVAxisLabel> labels = *xAxisDescriptor_->axisLabels();
-    if (platform::textScale() <= 1) return labels;
-    double widest = 0;
-    for (const QVAxisLabel& label : labels) widest = std::max(widest, textWidth(label));
+/// The labels of the axis; where larger texts are wanted and do not fit, the first and the last (the one
+/// names the month or the year, the other is now) and as many evenly between them as do.
+QVChart::AxisLabels QVChart::shownAxisLabels() const {
+    AxisLabels labels;
+    if (!xAxisDescriptor_ || !xAxisDescriptor_->axisLabels()) return labels;
+    for (const QVAxisLabel& label : *xAxisDescriptor_->axisLabels()) labels.push_back(&label);
+    if (platform::textScale() <= 1 || labels.size() < 2) return labels;
+    const double widest = widestText(labels);
+    const size_t spaces = labels.size() - 1;
     const auto fits = [&](size_t step) {
-        const size_t count = (labels.size() + step - 1) / step;
-        return fittingRatio(widest, plotBounds().width() / static_cast<double>(count)) >= kSmallestLargeRatio;
+        const double columnWidth = plotBounds().width() / static_cast<double>(spaces / step + 1);
+        return fittingRatio(widest, columnWidth) >= kSmallestLargeRatio;
     };
     size_t step = 1;
-    while (step < labels.size() && !fits(step)) ++step;
-    std::vector<QVAxisLabel> shown;
-    for (size_t i = 0; i < labels.size(); i += step) shown.push_back(std::move(labels[i]));
+    while (step < spaces && (spaces % step != 0 || !fits(step))) ++step;
+    AxisLabels shown;
+    for (size_t i = 0; i < labels.size(); i += step) shown.push_back(labels[i]);
     return shown;
 }
 
 void QVChart::layoutAxisLabels() {
-    const std::vector<QVAxisLabel> labels = shownAxisLabels();
+    const AxisLabels labels = shownAxisLabels();
     const LayoutContext context = axisLabelLayout(labels);
 
     const QVAnimationTime now = clock_();
@@ -97,10 +115,10 @@ void QVChart::layoutAxisLabels() {
     reuseAxisLabelViews(labels.size(), now, duration);
     for (size_t i = 0; i < labels.size(); ++i) {
         AxisLabelView& view = axisLabels_[i];
-        view.text = labels[i].text;
-        view.font = labels[i].labelFont;
-        view.color = labels[i].labelColor;
-        view.filter = labels[i].compositingFilter;
+        view.text = labels[i]->text;
+        view.font = labels[i]->labelFont;
+        view.color = labels[i]->labelColor;
+        view.filter = labels[i]->compositingFilter;
         view.fontRatio = context.fontRatio;
         view.width = context.targetFrames[i].width();
         view.height = context.targetFrames[i].height();

@@ -5,9 +5,9 @@
 
 std::optional<std::vector<QVAxisLabel>> QVHourAxisDescriptor::generateAxisLabels() const {
     VSDate middle = VSMidDate(*minValue(), *maxValue());
-    // A day that ends a moment before midnight, or that lost an hour, has its middle before noon: name noon
-    // all the same.
-    if (VSCalendar::current().component(VSCalendarUnit::Hour, middle) == 11)
+    // A day that ends a moment before midnight, or that lost an hour, has its middle before noon, and a night
+    // of 23 hours before midnight: name noon and midnight all the same.
+    if (VSCalendar::current().component(VSCalendarUnit::Hour, middle) % 12 == 11)
         middle = middle + std::chrono::hours(1);
 
     const QVDateFormatter formatter = QVHourOfDayFormatter();

@@ -28,16 +28,24 @@ QStringList QVPlaceholderViewController::actionTitles() const {
     return titles;
 }
 
+QVariantList QVPlaceholderViewController::actionStates() const {
+    QVariantList states;
+    for (const Action& action : actions_) states.append(action.isOn ? QVariant(action.isOn()) : QVariant());
+    return states;
+}
+
 void QVPlaceholderViewController::runAction(int index) {
     if (index < 0 || index >= static_cast<int>(actions_.size())) return;
     const auto run = actions_[static_cast<size_t>(index)].run;  // which may set other actions
     run();
+    emit actionStatesChanged();
 }
 
 void QVPlaceholderViewController::setContent(const char* messageKey, std::vector<Action> actions) {
     messageKey_ = messageKey;
     actions_ = std::move(actions);
     emit textsChanged();
+    emit actionStatesChanged();
 }
 
 void QVPlaceholderViewController::setActivityFactory(ActivityFactory factory) {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <QStringList>
+#include <QVariantList>
 #include <functional>
 #include <memory>
 #include <vector>
@@ -15,10 +16,13 @@ class QVPlaceholderViewController : public platform::Screen {
     Q_PROPERTY(bool iconIsGlyph READ iconIsGlyph CONSTANT)
     Q_PROPERTY(QString message READ message NOTIFY textsChanged)
     Q_PROPERTY(QStringList actionTitles READ actionTitles NOTIFY textsChanged)
+    Q_PROPERTY(QVariantList actionStates READ actionStates NOTIFY actionStatesChanged)
  public:
     struct Action {
         std::function<QString()> title;
         std::function<void()> run;
+        /// Whether it is on, for what can be switched on and off; empty: it cannot.
+        std::function<bool()> isOn = {};
     };
     using ActivityFactory = std::function<std::shared_ptr<const platform::UserActivity>()>;
 
@@ -33,6 +37,8 @@ class QVPlaceholderViewController : public platform::Screen {
     void setIconIsGlyph(bool isGlyph) { iconIsGlyph_ = isGlyph; }
     QString message() const;
     QStringList actionTitles() const;
+    /// For each action true or false, or nothing where it is no switch.
+    QVariantList actionStates() const;
     Q_INVOKABLE void runAction(int index);
 
     void setContent(const char* messageKey, std::vector<Action> actions);
@@ -41,6 +47,7 @@ class QVPlaceholderViewController : public platform::Screen {
 
  signals:
     void textsChanged();
+    void actionStatesChanged();
 
  protected:
     /// What the user is at is another.

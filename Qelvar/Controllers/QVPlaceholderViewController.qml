@@ -34,11 +34,16 @@ FocusScope {
                         required property int index
                         width: content.width
                         height: Math.max(SystemStyle.touchHeight, actionText.implicitHeight + 16)
+                        readonly property var onState: root.screen.actionStates[index]
+                        readonly property bool isSwitch: onState === true || onState === false
                         text: modelData
                         focus: index === 0
                         onClicked: root.screen.runAction(index)
                         onVisualFocusChanged: if (visualFocus) rows.show(action)
                         Accessible.name: text
+                        Accessible.role: isSwitch ? Accessible.CheckBox : Accessible.Button
+                        Accessible.checkable: isSwitch
+                        Accessible.checked: onState === true
                         Keys.onReturnPressed: action.clicked()
                         Keys.onEnterPressed: action.clicked()
                         background: Rectangle {
@@ -49,13 +54,21 @@ FocusScope {
                         contentItem: Text {
                             id: actionText
                             wrapMode: Text.Wrap
-                            leftPadding: 16
-                            rightPadding: 16
+                            leftPadding: action.isSwitch && action.mirrored ? 44 : 16
+                            rightPadding: action.isSwitch && !action.mirrored ? 44 : 16
                             text: action.text
                             color: SystemStyle.tint
                             font.pixelSize: SystemStyle.bodySize
                             horizontalAlignment: Text.AlignLeft
                             verticalAlignment: Text.AlignVCenter
+                        }
+                        Icon {
+                            anchors { right: parent.right; rightMargin: 16; verticalCenter: parent.verticalCenter }
+                            visible: action.onState === true
+                            width: 20
+                            height: 20
+                            name: "checkmark"
+                            tint: SystemStyle.tint
                         }
                         FocusRing { anchors.margins: 2; shown: action.visualFocus }
                     }

@@ -120,7 +120,7 @@ QString QVDashboardViewController::moveHelp() const {
 }
 
 double QVDashboardViewController::emptyStateHelpMargin(double screenWidth) {
-    if (screenWidth > 375 || platform::textScale() > 1) return 10;
+    if (screenWidth > 375) return 10;
     return screenWidth > 320 ? 50 : 20;
 }
 
@@ -300,7 +300,9 @@ void QVDashboardViewController::dataProviderOrderUpdated(const VSObjectType* dat
 
 void QVDashboardViewController::encodeRestorableState(platform::RestorableState& state) const {
     state.setObject(QVControllerManager::RestorationIdentifier, controllerManager_.get());
-    state.set(kTimeScopeKey, static_cast<int64_t>(selectedTimeScope()));
+    // The control takes it over only when it appears.
+    state.set(kTimeScopeKey,
+              static_cast<int64_t>(controllerManager_->selectedTimeScopeController().selectedTimeScope()));
     state.set(kTableKey, VSValue::Dictionary{{kOffsetKey, scrollOffset()}});
 }
 
@@ -331,7 +333,7 @@ void QVDashboardViewController::restoreScrollOffset(double offset) {
 void QVDashboardViewController::applyScrollOffset() {
     const QVTableGeometry geometry = tableGeometry();
     if (!wantedScrollOffset_ || isDragging() || geometry.visibleHeight <= 0 ||
-        !controllerManager_->dashboardDataUnitGroupsController().hasLoadedDashboard())
+        !controllerManager_->dashboardDataUnitGroupsController().hasReadDashboard())
         return;
     const double offset = geometry.restingOffset(*wantedScrollOffset_);
     wantedScrollOffset_.reset();

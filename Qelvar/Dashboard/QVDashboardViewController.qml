@@ -181,7 +181,7 @@ FocusScope {
         contentHeight: Math.max(height, importButton.y + importButton.height + 8)
         interactive: contentHeight > height
         boundsBehavior: Flickable.StopAtBounds
-        readonly property real helpMargin: root.screen.emptyStateHelpMargin(width)
+        readonly property real helpMargin: SystemStyle.largeText ? 10 : root.screen.emptyStateHelpMargin(width)
         readonly property real belowIcon: Math.max(47, 8 + emptyTitle.height) + 10 + help.height + 8 + importButton.height + 8
         Icon {
             id: icon

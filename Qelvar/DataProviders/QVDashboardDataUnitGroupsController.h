@@ -44,6 +44,8 @@ class QVDashboardDataUnitGroupsController {
     /// Whether there is a list to show (the user's, or the defaults where that could not be read): before, an
     /// empty list says nothing.
     bool hasLoadedDashboard() const { return dashboard_.has_value(); }
+    /// Whether that is the user's own list, and not what stands in for one that could not be read.
+    bool hasReadDashboard() const { return loadState_ == LoadState::Loaded; }
     /// Reads again what could not be read; else nothing happens.
     void loadAgainIfFailed();
     /// Replaces the whole list and stores it.

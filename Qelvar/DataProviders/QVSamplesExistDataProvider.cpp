@@ -7,6 +7,7 @@
 #include "Qelvar/DataProviders/QVHealthStoreExtensions.h"
 #include "Qelvar/Formatters/QVDateFormatters.h"
 #include "Qelvar/Formatters/QVNumberFormatters.h"
+#include "Vessa/Base/VSEnvironment.h"
 #include "VessaUI/VSTimePeriods.h"
 
 namespace {
@@ -84,9 +85,11 @@ void QVSamplesExistDataProvider::updateMostRecentObject(const Error& error) {
         *healthStore(), dataUnit()->sampleType(), std::nullopt,
         [intake = intake(), ticket](const VSResult<std::shared_ptr<const VSCategorySample>>& answer) {
             if (answer && *answer) {
-                intake.updateCurrentValue((*answer)->value(),
-                                          VSLastMomentOfSample(**answer, VSCalendar::current()), std::nullopt,
-                                          {}, ticket);
+                VSDate last = VSLastMomentOfSample(**answer, VSCalendar::current());
+                // Today as a whole is so until now, and not until a moment that is to come.
+                const VSDate now = VSEnvironment::current()->now();
+                if ((*answer)->startDate() <= now) last = std::min(last, now);
+                intake.updateCurrentValue((*answer)->value(), last, std::nullopt, {}, ticket);
                 return;
             }
             if (!answer) intake.logError("Error fetching most recent sample", answer.error());
@@ -169,15 +172,17 @@ void QVSamplesExistDataProvider::updateHistoricalData(const VSPredicate& predica
 QVDataProvider::Points QVSamplesExistDataProvider::sectionPointsFromSamples(
     const std::vector<VSSamplePtr>& samples) {
     Points points;
-    std::optional<VSDate> end;  // of the open section
+    const VSCalendar calendar = VSCalendar::current();
+    std::optional<VSDate> end, lastMoment;  // of the open section
     for (const VSSamplePtr& sample : samples) {
-        if (end && sample->startDate() - *end > VSMaximumGapForConsecutiveSections) {
+        if (end && !VSContinuesSection(*lastMoment, sample->startDate(), calendar)) {
             points.push_back(QVChartPointNumeric::chartPoint(*end, sectionY));
-            end.reset();
+            end = lastMoment = std::nullopt;
         }
         if (!end) points.push_back(QVChartPointNumeric::chartPoint(sample->startDate(), sectionY));
         // A sample inside the section must not shorten it.
-        end = end ? std::max(*end, sample->endDate()) : sample->endDate();
+        end = std::max(end, std::optional(sample->endDate()));
+        lastMoment = std::max(lastMoment, std::optional(VSLastMomentOfSample(*sample, calendar)));
     }
     if (end) points.push_back(QVChartPointNumeric::chartPoint(*end, sectionY));
     return points;

@@ -22,7 +22,8 @@ class QVSamplesExistDataProvider : public QVDataProvider {
     platform::StyledText secondaryValueText() const override;
     const char* className() const override { return "QVSamplesExistDataProvider"; }
 
-    /// The points of stretches of samples, which are in ascending order of their starts. Any thread.
+    /// The points of stretches of samples, which are in ascending order of their starts; a day left out ends
+    /// a stretch (VSContinuesSection). Any thread.
     static Points sectionPointsFromSamples(const std::vector<VSSamplePtr>& samples);
 
  protected:

@@ -11,7 +11,6 @@ namespace {
 using Points = QVDataProvider::Points;
 using Samples = std::vector<VSSamplePtr>;
 constexpr VSDateComponents oneDay{.days = 1};
-constexpr int samplesLookedAt = 16;
 
 using Spans = std::vector<VSTimeSpan>;
 
@@ -181,6 +180,9 @@ void QVTimePeriodDataProvider::restartHistoricalDataQuery() {
         range.start = calendar.yesterdayAtNoon(range.start);
         // The end of a year span is its last second: the noon meant is that before the midnight that follows.
         range.end = calendar.yesterdayAtNoon(range.end + std::chrono::seconds(1));
+        // What begins after today's noon is tomorrow's, in a year as in a week.
+        const VSDate noon = calendar.noonOfDay(VSEnvironment::current()->now());
+        if (range.start < noon) range.end = std::min(range.end, noon);
     }
     beginQuery(Answer::Historical, timeScope());
     beginQuery(Answer::Secondary, timeScope());
@@ -248,7 +250,19 @@ void QVTimePeriodDataProvider::updateDailyAverage(QVTimeScope timeScope, Ticket 
     });
 }
 
-// The current value: an observer, then the most recent sample, then the time of its day.
+// The current value: an observer, then the most recent samples, then the time of their days.
+
+/// The way back to the most recent day that has time. The latest sample's may have none: a sample may have no
+/// length, or lie in what a source that counts before its own has watched.
+struct QVTimePeriodDataProvider::Search {
+    static constexpr int mostSamples = 4096, growth = 16;
+    static constexpr size_t mostDays = 32;
+
+    Ticket ticket;
+    int samples = 16;                            // asked for; more when none of them has time
+    bool thereAreMore = false;                   // than these
+    std::set<VSDate> days = {}, emptyDays = {};  // by their starts: still to look at, and without time
+};
 
 void QVTimePeriodDataProvider::restartCurrentValueQuery() {
     beginQuery(Answer::CurrentValue);
@@ -265,38 +279,58 @@ void QVTimePeriodDataProvider::updateCurrentValue(const Error& error) {
         intake().updateCurrentValue({}, {}, error, {}, ticket);
         return;
     }
-    // Several, for the one that ended last may be one that has no length, or that nobody ended.
-    mostRecentSamplesOfType(
-        *healthStore(), dataUnit()->sampleType(),
-        dataUnit()->chartingPredicateForTimeScope(QVTimeScopeIndex(timeScope())), samplesLookedAt,
-        onMainQueue(this, [ticket](QVTimePeriodDataProvider& self, const VSResult<Samples>& answer) {
-            if (answer) return self.updateCurrentValue(*answer, ticket);
-            self.intake().logError("Error getting most recent start date", answer.error());
-            self.intake().updateCurrentValue({}, {}, answer.error(), {}, ticket);
-        }));
+    lookAtMostRecentSamples(std::make_shared<Search>(Search{ticket}));
 }
 
-void QVTimePeriodDataProvider::updateCurrentValue(const Samples& mostRecent, Ticket ticket) {
-    const VSCalendar calendar = VSCalendar::current();
-    const bool nights = chartingRules().shouldStartDayAtNoon();
-    std::optional<VSDate> latest;
-    for (const VSSamplePtr& sample : mostRecent) {
-        if (sample->startDate() == sample->endDate()) continue;
-        latest =
-            std::max(latest, std::optional(nights ? VSStartOfNight(*sample, calendar) : sample->startDate()));
+void QVTimePeriodDataProvider::lookAtMostRecentSamples(const std::shared_ptr<Search>& search) {
+    // The week's predicate, as for the total: what does not count has no day.
+    VSPredicate begun =
+        VSPredicate::samplesStartingBefore(VSEnvironment::current()->now() + std::chrono::microseconds(1));
+    if (const auto charted = dataUnit()->chartingPredicateForTimeScope(QVTimeScopeIndex(QVTimeScope::Week)))
+        begun = *charted & begun;
+    const auto take = [search](QVTimePeriodDataProvider& self, const VSResult<Samples>& answer) {
+        if (!answer) {
+            self.intake().logError("Error getting most recent start date", answer.error());
+            return self.intake().updateCurrentValue({}, {}, answer.error(), {}, search->ticket);
+        }
+        const VSCalendar calendar = VSCalendar::current();
+        const bool nights = self.chartingRules().shouldStartDayAtNoon();
+        for (const VSSamplePtr& sample : *answer) {
+            if (sample->startDate() == sample->endDate()) continue;
+            const VSDate day = nights ? VSStartOfNoonDay(VSStartOfNight(*sample, calendar), calendar)
+                                      : calendar.startOfDay(sample->startDate());
+            if (!search->emptyDays.contains(day)) search->days.insert(day);
+        }
+        search->thereAreMore = static_cast<int>(answer->size()) == search->samples;
+        self.lookAtLatestDay(search);
+    };
+    mostRecentSamplesOfType(*healthStore(), dataUnit()->sampleType(), begun, search->samples,
+                            onMainQueue(this, take));
+}
+
+void QVTimePeriodDataProvider::lookAtLatestDay(const std::shared_ptr<Search>& search) {
+    const bool mayGoOn = search->emptyDays.size() < Search::mostDays;
+    if (mayGoOn && search->days.empty() && search->thereAreMore && search->samples < Search::mostSamples) {
+        search->samples *= Search::growth;
+        return lookAtMostRecentSamples(search);
     }
-    if (!latest) return intake().updateCurrentValue({}, {}, std::nullopt, {}, ticket);
-    const VSDate start = nights ? VSStartOfNoonDay(*latest, calendar) : calendar.startOfDay(*latest);
-    const Range day{start, calendar.addDays(start, 1), QVTimeScope::Week};
-    fetchSamples(day, [intake = intake(), day, ticket](const VSResult<Samples>& answer,
-                                                       const VSTimePeriodRules& rules) {
+    if (!mayGoOn || search->days.empty())
+        return intake().updateCurrentValue({}, {}, std::nullopt, {}, search->ticket);
+    const VSDate start = *search->days.rbegin();
+    search->days.erase(start);
+    search->emptyDays.insert(start);
+    const Range day{start, VSCalendar::current().addDays(start, 1), QVTimeScope::Week};
+    const auto lookBefore =
+        onMainQueue(this, [search](QVTimePeriodDataProvider& self) { self.lookAtLatestDay(search); });
+    fetchSamples(day, [intake = intake(), day, lookBefore, ticket = search->ticket](
+                          const VSResult<Samples>& answer, const VSTimePeriodRules& rules) {
         if (!answer) {
             intake.logError("Error calculating total duration", answer.error());
             intake.updateCurrentValue({}, {}, answer.error(), {}, ticket);
             return;
         }
         const auto [hours, end] = totalOf(spansOf(*answer, rules), day.start, day.end);
-        if (hours <= 0) return intake.updateCurrentValue({}, {}, std::nullopt, {}, ticket);
+        if (hours <= 0) return lookBefore();
         intake.updateCurrentValue(hours, end, std::nullopt, {}, ticket);
     });
 }

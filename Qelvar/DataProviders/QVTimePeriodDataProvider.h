@@ -1,6 +1,7 @@
 #pragma once
 
 #include <map>
+#include <memory>
 #include <vector>
 
 #include "Qelvar/DataProviders/QVDataProvider.h"
@@ -10,10 +11,11 @@
 /// (VSCoalesceTimePeriodsFromSamples says how): the day scope shows each span as a pair of points, the longer
 /// scopes the hours in each bucket that has any. The secondary value is the mean of the daily totals of days
 /// that have any (of the last 7 days in the day scope, of the visible ones in the year scope; of the visible
-/// buckets else), the current value the hours of the most recent day that has data; both in hours.
+/// buckets else), the current value the hours of the most recent day that has time that counts in longer
+/// scopes, whatever is visible; both in hours. What starts after now counts nowhere.
 ///
 /// Where the charting rules start days at noon, a day reaches from the noon before to its own noon, and
-/// nights stand at the hours at which they were lived.
+/// nights stand at the hours at which they were lived; the longer scopes end at today's noon.
 class QVTimePeriodDataProvider : public QVDataProvider {
  public:
     using QVDataProvider::QVDataProvider;
@@ -43,7 +45,9 @@ class QVTimePeriodDataProvider : public QVDataProvider {
  private:
     void restartCurrentValueQuery();
     void updateCurrentValue(const Error& error);
-    void updateCurrentValue(const std::vector<VSSamplePtr>& mostRecent, Ticket ticket);
+    struct Search;
+    void lookAtMostRecentSamples(const std::shared_ptr<Search>& search);
+    void lookAtLatestDay(const std::shared_ptr<Search>& search);
     void restartHistoricalDataQuery();
     void updateHistoricalData(const Range& range, const Error& error);
     void updateDailyAverage(QVTimeScope timeScope, Ticket ticket);

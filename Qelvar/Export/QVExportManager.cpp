@@ -148,7 +148,9 @@ void QVExportManager::openDocuments() {
     const auto environment = VSEnvironment::current();
     const int offset = VSCalendar::current().secondsFromGMT(environment->now());
     writer_ = std::make_unique<QVRecordsDocument>(paths_.filePath, offset, units_);
-    writer_->open(environment->localeIdentifier());
+    // Without what the person prefers beside the locale, such as a clock of 24 hours.
+    const std::string locale = environment->localeIdentifier();
+    writer_->open(locale.substr(0, locale.find('@')));
     writerCDA_ = std::make_unique<QVClinicalDocument>(paths_.CDAFilePath, offset);
     writerCDA_->open();
 }

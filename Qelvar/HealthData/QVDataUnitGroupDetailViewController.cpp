@@ -1,5 +1,6 @@
 #include "Qelvar/HealthData/QVDataUnitGroupDetailViewController.h"
 
+#include "Platform/Localization.h"
 #include "Platform/RestorableState.h"
 #include "Platform/UserActivity.h"
 #include "Qelvar/Controllers/QVUserActivityManager.h"
@@ -9,6 +10,14 @@ namespace {
 constexpr const char* kDataUnitGroupKey = "Data Unit Group Detail View Controller Data Unit Group";
 
 }  // namespace
+
+struct QVDataUnitGroupDetailViewController::Observer final : QVDashboardDataUnitGroupsObserver {
+    explicit Observer(QVDataUnitGroupDetailViewController& owner) : screen(owner) {}
+    void dashboardDataUnitGroupsUpdated(const std::vector<const VSDataUnitGroup*>&) override {
+        emit screen.actionStatesChanged();
+    }
+    QVDataUnitGroupDetailViewController& screen;
+};
 
 std::unique_ptr<platform::Screen> QVDataUnitGroupDetailViewController::fromRestorableState(
     const platform::RestorableState& state) {
@@ -26,12 +35,30 @@ QVDataUnitGroupDetailViewController::QVDataUnitGroupDetailViewController(
     : QVPlaceholderViewController([dataUnitGroup] { return dataUnitGroup->displayName(); },
                                   dataUnitGroup->listIcon(), "DATA_TYPE_PENDING"),
       dataUnitGroup_(dataUnitGroup),
-      controllerManager_(std::move(controllerManager)) {
+      controllerManager_(std::move(controllerManager)),
+      observer_(std::make_shared<Observer>(*this)) {
     setActivityFactory([dataUnitGroup] {
         return QVUserActivityManager::activity(dataUnitGroup->displayName(), dataUnitGroup->keywords(),
                                                QVUserActivityTab::HealthData, false,
                                                dataUnitGroup->categoryID(), dataUnitGroup->dataUnitGroupID());
     });
+    if (dataUnitGroup->isCharacteristic()) return;  // which has no chart
+    setContent("DATA_TYPE_PENDING",
+               {{[] { return platform::localized("SHOW_ON_DASHBOARD"); },
+                 [this] { setIsOnDashboard(!isOnDashboard()); }, [this] { return isOnDashboard(); }}});
+    controllerManager_->dashboardDataUnitGroupsController().addObserver(observer_);
+}
+
+bool QVDataUnitGroupDetailViewController::isOnDashboard() const {
+    return controllerManager_->dashboardDataUnitGroupsController().isOnDashboard(dataUnitGroup_);
+}
+
+void QVDataUnitGroupDetailViewController::setIsOnDashboard(bool isOnDashboard) {
+    auto& dashboard = controllerManager_->dashboardDataUnitGroupsController();
+    if (isOnDashboard)
+        dashboard.addDataUnitGroupToDashboard(dataUnitGroup_);
+    else
+        dashboard.removeDataUnitGroupFromDashboard(dataUnitGroup_);
 }
 
 void QVDataUnitGroupDetailViewController::encodeRestorableState(platform::RestorableState& state) const {

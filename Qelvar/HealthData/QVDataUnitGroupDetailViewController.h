@@ -5,7 +5,8 @@
 #include "Qelvar/Controllers/QVControllerManager.h"
 #include "Qelvar/Controllers/QVPlaceholderViewController.h"
 
-/// The screen of a display type. Its rows are still to come. Main thread only.
+/// The screen of a display type: whether the dashboard shows it. Its other rows are still to come. Main
+/// thread only.
 class QVDataUnitGroupDetailViewController : public QVPlaceholderViewController {
     Q_OBJECT
  public:
@@ -24,6 +25,11 @@ class QVDataUnitGroupDetailViewController : public QVPlaceholderViewController {
     void encodeRestorableState(platform::RestorableState& state) const override;
 
  private:
+    struct Observer;
+    bool isOnDashboard() const;
+    void setIsOnDashboard(bool isOnDashboard);
+
     const VSDataUnitGroup* const dataUnitGroup_;
     const std::shared_ptr<QVControllerManager> controllerManager_;
+    const std::shared_ptr<Observer> observer_;
 };

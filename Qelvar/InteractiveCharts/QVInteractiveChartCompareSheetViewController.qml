@@ -144,6 +144,11 @@ FocusScope {
             }
             contentItem: Item {
                 opacity: row.canToggle ? 1 : 0.4
+                TextMetrics { // of the longest word: larger texts shrink before one is broken
+                    id: longestWord
+                    font.pixelSize: SystemStyle.bodySize
+                    text: row.text.split(" ").reduce((longest, word) => word.length > longest.length ? word : longest, "")
+                }
                 Icon {
                     id: mark
                     anchors { left: parent.left; leftMargin: 16; verticalCenter: parent.verticalCenter }
@@ -156,10 +161,10 @@ FocusScope {
                     anchors { left: mark.right; leftMargin: 14; right: box.left; rightMargin: 12; verticalCenter: parent.verticalCenter }
                     text: row.text
                     color: SystemStyle.text
-                    font.pixelSize: SystemStyle.bodySize
+                    font.pixelSize: SystemStyle.largeText ? Math.max(17, Math.floor(SystemStyle.bodySize * Math.min(1, width / (longestWord.advanceWidth + 1)))) : SystemStyle.bodySize
                     horizontalAlignment: Text.AlignLeft
                     wrapMode: Text.Wrap
-                    maximumLineCount: 3
+                    maximumLineCount: SystemStyle.largeText ? 6 : 3
                     elide: Text.ElideRight
                 }
                 Rectangle {

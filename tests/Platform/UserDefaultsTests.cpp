@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <fstream>
@@ -80,8 +81,8 @@ TEST_F(UserDefaultsTest, FailedWriteLeavesTheOldFileAndSaysSo) {
     UserDefaults defaults(file());
     defaults.setValue("flag", true);
     // The name of the new file is taken by a folder: the write fails whoever runs the test.
-    fs::create_directory(fs::path(file()).concat(".new"));
-    std::ofstream(fs::path(file()).concat(".new") / "in the way") << "x";
+    fs::create_directory(fs::path(file()).concat(".new-" + std::to_string(getpid())));
+    std::ofstream(fs::path(file()).concat(".new-" + std::to_string(getpid())) / "in the way") << "x";
     defaults.setValue("flag", false);
     EXPECT_EQ(log_.size(), 1u);
     EXPECT_FALSE(defaults.boolean("flag"));
@@ -91,7 +92,7 @@ TEST_F(UserDefaultsTest, FailedWriteLeavesTheOldFileAndSaysSo) {
 TEST_F(UserDefaultsTest, LeftOverOfAKilledProcessDoesNoHarm) {
     UserDefaults defaults(file());
     defaults.setValue("flag", true);
-    std::ofstream(fs::path(file()).concat(".new")) << "{\"fl";
+    std::ofstream(fs::path(file()).concat(".new-" + std::to_string(getpid()))) << "{\"fl";
     UserDefaults again(file());
     EXPECT_TRUE(again.boolean("flag"));
     again.setValue("flag", false);

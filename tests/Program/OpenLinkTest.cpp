@@ -74,6 +74,11 @@ TEST_F(OpenLinkTest, TheLinkGoesBeforeTheSessionBefore) {
     std::ofstream(state_) << "\xff{";
     run({});
     EXPECT_EQ(place(), "Dashboard");
+
+    // Nobody has seen the dashboard, or chosen its time scope, which begins with the week.
+    fs::remove(state_);
+    run({"qelvar://SourcesTab"});
+    EXPECT_NE(test::contentOf(state_).find("\"Time Scope\":2"), std::string::npos) << test::contentOf(state_);
 }
 
 }  // namespace

@@ -52,7 +52,7 @@ class QuarterByQuarter {
     std::map<int64_t, double> hoursByDay(const std::vector<Tracked>& samples, bool onlyAsleep) {
         std::map<VSDate, std::map<int, std::vector<const Tracked*>>> seen;  // by quarter and source
         for (const Tracked& each : samples)
-            for (VSDate at = each.start; at < endOf(each); at = at + quarter)
+            for (VSDate at = each.start; at < std::min(endOf(each), now_); at = at + quarter)
                 seen[at][each.source].push_back(&each);
         const auto counts = [&](const Tracked* each) { return !onlyAsleep || each->value == asleep; };
         // A source watches in a run of quarters in which something counts.
@@ -115,7 +115,7 @@ class QuarterByQuarter {
             end = each.start + quarter;
             while (dayOf(end + moved) == dayOf(each.start + moved)) end = end + quarter;
         }
-        return each.start < now_ && now_ < end ? now_ : end;
+        return end;
     }
 
     const Zone& zone_;

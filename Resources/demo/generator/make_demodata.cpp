@@ -392,7 +392,11 @@ void write(const Profile& profile) {
 <array>)");
     for (const char* identifier : {"VSQuantityTypeIdentifierStepCount", "VSQuantityTypeIdentifierDistanceWalkingRunning", "VSQuantityTypeIdentifierFlightsClimbed",
                                    "VSQuantityTypeIdentifierActiveEnergyBurned", "VSQuantityTypeIdentifierHeartRate", "VSQuantityTypeIdentifierBodyMass",
-                                   "VSQuantityTypeIdentifierBloodGlucose"})
+                                   "VSQuantityTypeIdentifierBloodGlucose", "VSCategoryTypeIdentifierSleepAnalysis", "VSWorkoutTypeIdentifier",
+                                   "VSCategoryTypeIdentifierZentroStandHour", "VSCategoryTypeIdentifierMenstrualFlow",
+                                   "VSCategoryTypeIdentifierIntermenstrualBleeding", "VSCategoryTypeIdentifierOvulationTestResult",
+                                   "VSCategoryTypeIdentifierCervicalMucusQuality", "VSQuantityTypeIdentifierBasalBodyTemperature",
+                                   "VSCategoryTypeIdentifierSexualActivity"})
         std::printf("<string>%s</string>\n", identifier);
     std::puts("</array>\n<key>samples</key>\n<array>");
     for (const auto& entry : profile.entries) {

@@ -171,6 +171,16 @@ TEST_F(AppDelegateTest, TheHealthDataTabOffersToImportAndItsCategories) {
     run("Heart Rate");
     EXPECT_EQ(stack.count(), 3);
     EXPECT_EQ(stack.topScreen()->title(), "Heart Rate");
+    auto& dashboard = app->controllerManager()->dashboardDataUnitGroupsController();
+    ASSERT_TRUE(test::waitUntil([&] { return dashboard.hasReadDashboard(); }));
+    const auto before = dashboard.dataUnitGroupsForDashboard();
+    run("Show on Dashboard");
+    auto* detail = qobject_cast<QVPlaceholderViewController*>(stack.topScreen());
+    EXPECT_EQ(detail->actionStates(), QVariantList{true});
+    EXPECT_EQ(dashboard.dataUnitGroupsForDashboard().size(), before.size() + 1);
+    run("Show on Dashboard");
+    EXPECT_EQ(detail->actionStates(), QVariantList{false});
+    EXPECT_EQ(dashboard.dataUnitGroupsForDashboard(), before);
 }
 
 TEST_F(AppDelegateTest, DemoRecordsAreBuiltOnlyInTheDemonstration) {

@@ -1,16 +1,33 @@
-#include <QDir>
+#include <fstream>
 
 #include "Platform/SystemEvents.h"
 #include "Platform/TextScale.h"
 #include "WindowTest.h"
+#include "WindowTexts.h"
 
 namespace {
+
+namespace fs = std::filesystem;
+using State = QVExportController::State;
 
 using test::date;
 
 /// The window of a person who wants texts twice as large.
 class LargeTextTest : public test::WindowTest {
  protected:
+    LargeTextTest() {
+        // A home of its own, with names of every length, and all that a desktop may offer for an archive.
+        fs::create_directories(home_ / "Health");
+        fs::create_directories(home_ / "Records of the clinic in which I was last autumn");
+        std::ofstream(home_ / "records.xml") << "<HealthData/>";
+        for (const char* name : {"xdg-open", "xdg-email"}) {
+            std::ofstream(home_ / name) << "#!/bin/sh\n";
+            fs::permissions(home_ / name, fs::perms::owner_all);
+        }
+        qputenv("HOME", home_.c_str());
+        qputenv("PATH", home_.c_str());
+        qputenv("DBUS_SESSION_BUS_ADDRESS", "unix:path=/nowhere");  // no dialogs of this machine's desktop
+    }
     ~LargeTextTest() override {
         environment_->setLocale("en_US");
         platform::loadTranslations();
@@ -43,44 +60,62 @@ class LargeTextTest : public test::WindowTest {
             [&] { return frames >= 3 && !window_->rootObject()->property("busy").toBool(); }));
         QObject::disconnect(connection);
     }
-    static void collectTexts(QQuickItem* item, QRectF seen, QList<std::pair<QQuickItem*, QRectF>>& texts) {
-        if (!item->isVisible() || item->opacity() == 0) return;
-        const QRectF rect = item->mapRectToScene(QRectF(0, 0, item->width(), item->height()));
-        if (item->clip()) seen = seen.intersected(rect);
-        if (item->inherits("QQuickText") && !item->property("text").toString().isEmpty()) {
-            // Where its lines are, which may be less than its item.
-            const double height = item->property("contentHeight").toDouble();
-            const QRectF lines(rect.x(), rect.center().y() - height / 2, rect.width(), height);
-            const bool isTop = rect.height() <= height || item->property("verticalAlignment") == Qt::AlignTop;
-            texts.append({item, isTop ? QRectF(rect.topLeft(), QSizeF(rect.width(), height)) : lines});
-            if (!seen.intersects(texts.back().second)) texts.removeLast();
-        }
-        for (QQuickItem* child : item->childItems()) collectTexts(child, seen, texts);
+    void expectFits(const QString& name, const char* object = nullptr) {
+        waitForFrames();
+        auto* popup = object ? window_->findChild<QObject*>(object) : nullptr;
+        ASSERT_EQ(popup != nullptr, object != nullptr);
+        test::expectTextsFit(
+            *window_,
+            popup ? qvariant_cast<QQuickItem*>(popup->property("contentItem")) : window_->contentItem(),
+            name);
     }
-    /// What the item scrolls with; bars lie above it.
-    static QQuickItem* scroller(QQuickItem* item) {
-        while (item && !item->inherits("QQuickFlickable")) item = item->parentItem();
-        return item;
+    /// And lets it go.
+    void expectImportFits(const QString& name) {
+        app_->importController()->importUrls(
+            {QUrl::fromLocalFile(QELVAR_TEST_DATA "/import/refused-records/input.xml")});
+        EXPECT_TRUE(test::waitUntil([this] { return !app_->importController()->isRunning(); }));
+        expectFits(name + "-import", "importSheet");
+        app_->importController()->dismiss();
+        expectGoes("importSheet");
+        emit app_->importRequested();
+        expectFits(name + "-file", "importFileDialog");
+        EXPECT_TRUE(shownText(platform::localized("CANCEL"))) << "in the language of now";
+        press(Qt::Key_Escape);
+        expectGoes("importFileDialog");
     }
-    /// No text of the root is cut or lies on another one or beside the window.
-    void expectTextsFit(QQuickItem* root, const QString& name) {
-        SCOPED_TRACE(name.toStdString());
+    void expectExportFits(const QString& name) {
+        QVExportController& controller = *app_->exportController();
+        const auto reaches = [&](State state) {
+            return test::waitUntil([&] { return controller.state() == state; });
+        };
+        controller.verifyExport();
+        expectFits(name + "-export", "exportSheet");
+        controller.pressButton(0);
+        ASSERT_TRUE(reaches(State::Sharing));
+        EXPECT_EQ(controller.buttonTitles().size(), 4);
+        expectFits(name + "-share", "exportSheet");
+        controller.pressButton(0);
+        ASSERT_TRUE(test::waitUntil([this] { return window_->findChild<QObject*>("exportSaveDialog"); }));
+        expectFits(name + "-save", "exportSaveDialog");
+        EXPECT_TRUE(shownText(platform::localized("CANCEL"))) << "in the language of now";
+        press(Qt::Key_Escape);
+        expectGoes("exportSaveDialog");
+        controller.saveIn(QUrl::fromLocalFile("/nowhere"), "a.zip");
+        ASSERT_TRUE(reaches(State::Sharing));
+        expectFits(name + "-not-saved", "exportSheet");
+        controller.leave();
+        expectGoes("exportSheet");
+    }
+    QQuickItem* shownText(const QString& text) {
         QList<std::pair<QQuickItem*, QRectF>> texts;
-        const QRectF window(QPointF(), QSizeF(window_->size()));
-        collectTexts(root, window, texts);
-        EXPECT_FALSE(texts.empty());
-        for (qsizetype i = 0; i < texts.size(); ++i) {
-            const auto& [item, rect] = texts[i];
-            const auto words = item->property("text").toString().toStdString();
-            EXPECT_FALSE(item->property("truncated").toBool()) << words;
-            EXPECT_LE(item->property("paintedWidth").toDouble(), rect.width() + 1) << words;
-            EXPECT_TRUE(rect.left() >= 0 && rect.right() <= window.right() + 1) << words;
-            for (qsizetype j = 0; j < i; ++j)
-                EXPECT_FALSE(scroller(item) == scroller(texts[j].first) &&
-                             rect.adjusted(1, 1, -1, -1).intersects(texts[j].second.adjusted(1, 1, -1, -1)))
-                    << words << " lies on " << texts[j].first->property("text").toString().toStdString();
-        }
-        keepPicture(name);
+        test::collectTexts(window_->contentItem(), QRectF(QPointF(), QSizeF(window_->size())), texts);
+        for (const auto& [item, rect] : texts)
+            if (item->property("text").toString() == text) return item;
+        return nullptr;
+    }
+    void expectGoes(const char* object) {
+        auto* popup = window_->findChild<QObject*>(object);
+        EXPECT_TRUE(test::waitUntil([popup] { return !popup->property("visible").toBool(); }));
     }
     void expectCardsFit() {
         for (const auto* card : QVCardsInScene(window_->rootObject())) {
@@ -105,13 +140,8 @@ class LargeTextTest : public test::WindowTest {
             EXPECT_GE(layout.chart.height(), 110) << "the plot is not squeezed away";
         }
     }
-    /// For a person to look at, when a folder for pictures is named.
-    void keepPicture(const QString& name) {
-        const QString folder = qEnvironmentVariable("QELVAR_TEST_PICTURES");
-        if (folder.isEmpty()) return;
-        QDir().mkpath(folder);
-        EXPECT_TRUE(window_->grabWindow().save(folder + '/' + name + ".png"));
-    }
+
+    const fs::path home_ = folder_.path() / "home";
 };
 
 TEST_F(LargeTextTest, NothingIsCutOrCoveredInAnyLanguageAtAnyWidth) {
@@ -130,24 +160,22 @@ TEST_F(LargeTextTest, NothingIsCutOrCoveredInAnyLanguageAtAnyWidth) {
             expectCardsFit();
             for (int tab = 3; tab >= 0; --tab) {
                 app_->tabBarController()->setSelectedIndex(tab);
-                waitForFrames();
-                expectTextsFit(window_->contentItem(), name + QString("-tab-%1").arg(tab));
+                expectFits(name + QString("-tab-%1").arg(tab));
             }
-            app_->importController()->importUrls(
-                {QUrl::fromLocalFile(QELVAR_TEST_DATA "/import/refused-records/input.xml")});
-            EXPECT_TRUE(test::waitUntil([this] { return !app_->importController()->isRunning(); }));
-            waitForFrames();
-            auto* sheet = window_->findChild<QObject*>("importSheet");
-            ASSERT_TRUE(sheet);
-            expectTextsFit(qvariant_cast<QQuickItem*>(sheet->property("contentItem")), name + "-import");
-            app_->importController()->dismiss();
-            EXPECT_TRUE(test::waitUntil([sheet] { return !sheet->property("visible").toBool(); }));
+            if (size.width() > 375) continue;  // sheets are no wider than a phone
+            expectImportFits(name);
+            expectExportFits(name);
         }
     }
     app_->controllerManager()->dashboardDataUnitGroupsController().setDataUnitGroupsForDashboard({});
     for (const char* locale : {"en_US", "de_DE", "ar_EG"}) {
-        change(locale, {320, 568}, 2);
-        expectTextsFit(window_->contentItem(), QString("large-%1-empty").arg(locale));
+        change(locale, {320, 568}, 1);
+        waitForFrames();
+        change(locale, {320, 568}, 2);  // without a resize: the desktop tells it late
+        expectFits(QString("large-%1-empty").arg(locale));
+        const auto* help = shownText(app_->dashboard()->emptyStateHelp());
+        ASSERT_TRUE(help);
+        EXPECT_EQ(help->width(), 300);
     }
     app_->controllerManager()->dashboardDataUnitGroupsController().setDataUnitGroupsForDashboard(
         {group(VSGroupID::Steps)});

@@ -98,6 +98,70 @@ TEST_F(WindowTest, WhatAnotherProcessSavesReachesTheCard) {
     }));
 }
 
+/// Every card shows something at each moment, those that are only scrolled to afterwards included.
+TEST_F(WindowTest, ANewUnitReachesEveryCardAtOnce) {
+    const auto save = [this](VSTypeCode code, const char* unit, double value) {
+        return std::make_shared<const VSQuantitySample>(VSObjectType::dataTypeWithCode(code),
+                                                        VSQuantity(VSUnit::fromString(unit), value),
+                                                        date("2020-03-31T10:00"), date("2020-03-31T10:00"));
+    };
+    ASSERT_TRUE(store_
+                    ->saveObjectsAndWait({save(VSCode::Height, "cm", 178), save(VSCode::BodyMass, "kg", 70),
+                                          save(VSCode::BloodPressureSystolic, "mmHg", 120),
+                                          save(VSCode::BloodPressureDiastolic, "mmHg", 80),
+                                          save(VSCode::StepCount, "count", 12)})
+                    .ok());
+    const auto& groups = VSDataUnitGroupController::shared();
+    const auto ofType = [&groups](VSTypeCode code) {
+        return groups.dataUnitGroupForType(VSObjectType::dataTypeWithCode(code));
+    };
+    const auto* mass = ofType(VSCode::BodyMass);
+    const auto* height = ofType(VSCode::Height);
+    open({height, group(VSGroupID::BloodPressure), group(VSGroupID::Steps), group(VSGroupID::HeartRate),
+          group(VSGroupID::WalkingRunningDistance), mass});
+    const auto shown = [this] {
+        QStringList texts;
+        for (const auto* card : QVCardsInScene(window_->rootObject())) {
+            EXPECT_FALSE(card->valueText().isEmpty()) << card->titleText().toStdString();
+            texts << card->titleText() + ": " + card->valueText() + ", " + card->secondaryText();
+        }
+        texts.sort();
+        return texts.join('\n').toStdString();
+    };
+    const auto scroll = [this](Qt::Key key) {
+        press(key);
+        return settle();
+    };
+    // Where the list is, and where it is scrolled to, before and after.
+    ASSERT_TRUE(scroll(Qt::Key_End));
+    const std::string massInPounds = shown();
+    EXPECT_NE(massInPounds.find("154.3"), std::string::npos) << massInPounds;
+    ASSERT_TRUE(scroll(Qt::Key_Home));
+    const std::string inFeet = shown();
+    EXPECT_NE(inFeet.find("5 ft 10"), std::string::npos) << inFeet;
+    EXPECT_NE(inFeet.find("120/80"), std::string::npos) << inFeet;
+
+    VSUnitController& units = *app_->controllerManager()->unitController();
+    const auto choose = [&](const char* unitOfHeight, const char* unitOfMass) {
+        units.updatePreferredUnit(VSUnit::fromString(unitOfHeight), height->anyDataUnit());
+        units.updatePreferredUnit(VSUnit::fromString(unitOfMass), mass->anyDataUnit());
+    };
+    choose("cm", "kg");
+    const std::string atOnce = shown();
+    EXPECT_NE(atOnce.find("178"), std::string::npos) << atOnce;
+    EXPECT_EQ(atOnce.find("ft"), std::string::npos) << atOnce;
+    EXPECT_NE(atOnce.find("120/80"), std::string::npos) << atOnce;
+    ASSERT_TRUE(settle());
+    EXPECT_EQ(shown(), atOnce) << "the store says the same";
+    ASSERT_TRUE(scroll(Qt::Key_End));
+    EXPECT_NE(shown().find("70"), std::string::npos) << shown();
+    EXPECT_EQ(shown().find("154"), std::string::npos) << shown();
+    choose("ft", "lb");
+    EXPECT_EQ(shown(), massInPounds);
+    ASSERT_TRUE(scroll(Qt::Key_Home));
+    EXPECT_EQ(shown(), inFeet);
+}
+
 TEST_F(WindowTest, AnEmptyDashboardOffersToImport) {
     open({});
     EXPECT_TRUE(app_->dashboard()->showsEmptyState());

@@ -70,6 +70,8 @@ TEST(HourAxis, DaysOfOtherLengthsKeepTheirMiddle) {
     // 23 hours: the middle is 12:30 summer time. 25 hours: 11:30 winter time, moved on to 12:30.
     EXPECT_EQ(labelsOf(axis, date("2020-03-29"), date("2020-03-30")).places[1], "2020-03-29T12:30");
     EXPECT_EQ(labelsOf(axis, date("2020-10-25"), date("2020-10-26")).places[1], "2020-10-25T12:30");
+    EXPECT_EQ(labelsOf(axis, date("2020-03-28T12:00"), date("2020-03-29T12:00")).places[1],
+              "2020-03-29T00:30");
     const FixedEnvironment nepal("2020-03-31T20:00", "Asia/Kathmandu");
     EXPECT_EQ(labelsOf(axis, date("2020-03-29"), date("2020-03-30")).places[1], "2020-03-29T12:00");
 }

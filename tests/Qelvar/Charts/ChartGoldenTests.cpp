@@ -45,23 +45,31 @@ std::vector<QVChartPointPtr> wave(int count, double step, double low, double hig
 }
 
 /// The three layers of a series over a card's colours, one over the other.
-QImage picture(QVChartSeries& series, const std::vector<QVChartPointPtr>& points) {
+QImage picture(QVChartSeries& series, const std::vector<QVChartPointPtr>& points, double scale) {
     Frame frame;
     frame.size = {320, 116};
     frame.insets = {3, 24, 3, 36};
     frame.seconds = 30;
+    frame.scale = scale;
     prepare(series, points, frame);
-    QImage image(640, 232, QImage::Format_ARGB32_Premultiplied);
-    image.setDevicePixelRatio(2);
+    QImage image((frame.size * scale).toSize(), QImage::Format_ARGB32_Premultiplied);
+    image.setDevicePixelRatio(scale);
     QPainter painter(&image);
     painter.fillRect(QRectF(0, 0, 320, 116), cardGradient(116));
     painter.setCompositionMode(QPainter::CompositionMode_SoftLight);
-    painter.drawImage(0, 0, draw(series, Layer::SecondaryFill, 2));
+    painter.drawImage(0, 0, draw(series, Layer::SecondaryFill, scale));
     painter.setCompositionMode(QPainter::CompositionMode_Overlay);
-    painter.drawImage(0, 0, draw(series, Layer::Fill, 2));
+    painter.drawImage(0, 0, draw(series, Layer::Fill, scale));
     painter.setCompositionMode(QPainter::CompositionMode_SourceOver);
-    painter.drawImage(0, 0, draw(series, Layer::Chart, 2));
+    painter.drawImage(0, 0, draw(series, Layer::Chart, scale));
     return image;
+}
+
+/// On a screen of large pixels and on a phone's.
+void expectPictures(QVChartSeries& series, const std::vector<QVChartPointPtr>& points,
+                    const std::string& name, double share = 0.002) {
+    EXPECT_TRUE(matchesGolden(picture(series, points, 1), name + "-1x", 12, share));
+    EXPECT_TRUE(matchesGolden(picture(series, points, 2), name, 12, share));
 }
 
 /// As the cards set a line up.
@@ -143,20 +151,20 @@ class CardChart {
 TEST(ChartGoldens, Lines) {
     QVLineSeries series;
     styleLine(series);
-    EXPECT_TRUE(matchesGolden(picture(series, withGaps(wave(31, 1, 10, 90))), "line-saw-tooth"));
+    expectPictures(series, withGaps(wave(31, 1, 10, 90)), "line-saw-tooth");
     series.setWaveForm(QVLineSeries::WaveForm::Sine);
-    EXPECT_TRUE(matchesGolden(picture(series, wave(31, 1, 10, 90)), "line-sine"));
+    expectPictures(series, wave(31, 1, 10, 90), "line-sine");
     series.setWaveForm(QVLineSeries::WaveForm::Square);
     series.setPointStyle(QVPointStyle::UpwardChevron);
     series.setPointRadius(5);
-    EXPECT_TRUE(matchesGolden(picture(series, withGaps(wave(31, 1, 10, 90))), "line-square"));
+    expectPictures(series, withGaps(wave(31, 1, 10, 90)), "line-square");
 }
 
 TEST(ChartGoldens, Bars) {
     QVBarSeries series;
     series.setBarWidth(5);
     series.setBottomPadding(8);
-    EXPECT_TRUE(matchesGolden(picture(series, wave(31, 1, 0, 100)), "bars"));
+    expectPictures(series, wave(31, 1, 0, 100), "bars");
 }
 
 TEST(ChartGoldens, MinMax) {
@@ -171,11 +179,11 @@ TEST(ChartGoldens, MinMax) {
     series.setPointLineWidth(1.5);
     series.setMinPointStyle(QVPointStyle::Ring);
     series.setMaxPointStyle(QVPointStyle::Ring);
-    EXPECT_TRUE(matchesGolden(picture(series, points), "min-max-rings"));
+    expectPictures(series, points, "min-max-rings");
     series.setMinPointStyle(QVPointStyle::UpwardChevron);
     series.setMaxPointStyle(QVPointStyle::DownwardChevron);
     series.setPointRadius(4);
-    EXPECT_TRUE(matchesGolden(picture(series, points), "min-max-chevrons"));
+    expectPictures(series, points, "min-max-chevrons");
 }
 
 TEST(ChartGoldens, Rows) {
@@ -186,10 +194,10 @@ TEST(ChartGoldens, Rows) {
     lines.setLabelFont(platform::systemFont(10));
     lines.setFillColor(kHalfWhite);
     lines.setLineWidth(5);
-    EXPECT_TRUE(matchesGolden(
-        picture(lines, {point(1, 0), point(9, 0), point(2, 1), point(5, 1), point(6, 1), point(8.5, 1),
-                        point(15, 0), point(25, 0), point(15.5, 1), point(24, 1)}),
-        "stacked-lines", 12, kTextShare));
+    expectPictures(lines,
+                   {point(1, 0), point(9, 0), point(2, 1), point(5, 1), point(6, 1), point(8.5, 1),
+                    point(15, 0), point(25, 0), point(15.5, 1), point(24, 1)},
+                   "stacked-lines", kTextShare);
     QVStackedDotSeries dots;
     dots.setEnumeratedValueOrder({1, 2, 3});
     dots.setValueLabels({{1, "Dry"}, {2, "Sticky"}, {3, "Creamy"}});
@@ -203,14 +211,15 @@ TEST(ChartGoldens, Rows) {
     for (int i = 0; i <= 30; i += 2)
         points.push_back(QVChartPointDictionary::chartPoint(
             at(i), {{"1", i % 4 == 0}, {"2", i % 6 == 0}, {"3", i % 10 == 0}}));
-    EXPECT_TRUE(matchesGolden(picture(dots, points), "stacked-dots", 12, kTextShare));
+    expectPictures(dots, points, "stacked-dots", kTextShare);
 
     QVCenteredHorizontalLineSeries centered;
     centered.setAccentColor(kWhite);
     centered.setLineWidth(5);
-    EXPECT_TRUE(matchesGolden(picture(centered, {point(1, 0), point(6, 0), point(10, 1), point(14, 0),
-                                                 point(22, 0), point(16, 1), point(28, 1)}),
-                              "centered-line"));
+    expectPictures(
+        centered,
+        {point(1, 0), point(6, 0), point(10, 1), point(14, 0), point(22, 0), point(16, 1), point(28, 1)},
+        "centered-line");
 }
 
 TEST(ChartGoldens, DayOfMinMax) {

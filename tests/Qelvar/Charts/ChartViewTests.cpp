@@ -1,8 +1,10 @@
 #include <QFontMetricsF>
+#include <cmath>
 
 #include "ChartTestSupport.h"
 #include "Platform/StyledText.h"
 #include "Platform/SystemEvents.h"
+#include "Platform/TextScale.h"
 #include "Qelvar/Charts/QVBarSeries.h"
 #include "Qelvar/Charts/QVChart.h"
 #include "Qelvar/Charts/QVDottedAverageBackgroundView.h"
@@ -322,6 +324,25 @@ TEST_F(ChartView, LabelsThatDoNotFitShrinkTogether) {
     EXPECT_EQ(ratioFor(one * 0.85), 0.8);
     EXPECT_EQ(ratioFor(one * 0.11), 0.1);
     EXPECT_EQ(ratioFor(one * 0.05), 0) << "one step beyond the last try";
+}
+
+TEST_F(ChartView, TheFirstAndTheLastLabelStayAndAreWhole) {
+    const double one = QFontMetricsF(axis->highlightedLabelFont()).horizontalAdvance("mmmm");
+    chart.setDividerInset(12);
+    axis->given = {{"mmmm", at(0)}, {"b", at(50)}, {"mmmm", at(100)}};
+    renderer->setChartInsets({0, 20, 0, 20});
+    const double width = 40 + 4 * std::ceil(one);
+    show({width, 103});
+    EXPECT_EQ(labelCenters(), (std::vector<double>{12 + one / 2, width / 2, width - 12 - one / 2}));
+
+    platform::TextScale::shared().set(2);
+    axis->given = {{"1st m", at(0)}, {"mmmm", at(33)}, {"mmmm", at(67)}, {"now", at(100)}};
+    axis->invalidateCache();
+    show({40 + 2.5 * one, 103});
+    platform::TextScale::shared().set(1);
+    ASSERT_EQ(chart.xAxisLabels().size(), 2u);
+    EXPECT_EQ(chart.xAxisLabels()[0].text, "1st m");
+    EXPECT_EQ(chart.xAxisLabels()[1].text, "now");
 }
 
 TEST_F(ChartView, LabelViewsComeAndGoAtAlternateEnds) {

@@ -46,6 +46,9 @@ class CardGoldens : public testing::Test {
         for (const int hour : {8, 9, 10, 13, 14, 17})
             category(VSCode::ZentroStandHour, hour % 3 == 0 ? 1 : 0, hour, hour + 1);
         category(VSCode::SleepAnalysis, 1, 0, 6);
+        for (const int day : {-5, -4, -3, -1})
+            category(VSCode::MenstrualFlow, 1, 24 * day + 8, 24 * day + 9,
+                     {{VSMetadataKeyMenstrualCycleStart, day == -5}});
         EXPECT_TRUE(store_->saveObjectsAndWait(samples_).ok());
     }
     ~CardGoldens() override { QVUserDefaults::sharedDefaults().setHealthStore(nullptr); }
@@ -54,11 +57,13 @@ class CardGoldens : public testing::Test {
         samples_.push_back(std::make_shared<const VSQuantitySample>(
             VSObjectType::dataTypeWithCode(code), VSQuantity(VSUnit::fromString(unit), value), at, at));
     }
-    void category(VSTypeCode code, int value, int from, int to) {
+    void category(VSTypeCode code, int value, int from, int to, VSMetadata metadata = {}) {
         const VSDate day = test::date("2020-03-31");
-        samples_.push_back(std::make_shared<const VSCategorySample>(VSObjectType::dataTypeWithCode(code),
-                                                                    value, day + std::chrono::hours(from),
-                                                                    day + std::chrono::hours(to)));
+        VSProvenance provenance;
+        provenance.metadata = std::make_shared<const VSMetadata>(std::move(metadata));
+        samples_.push_back(std::make_shared<const VSCategorySample>(
+            VSObjectType::dataTypeWithCode(code), value, day + std::chrono::hours(from),
+            day + std::chrono::hours(to), provenance));
     }
 
     struct Card {
@@ -78,6 +83,7 @@ class CardGoldens : public testing::Test {
                 {group(VSGroupID::BloodPressure), QVTimeScope::Week},
                 {group(VSGroupID::StandHours), QVTimeScope::Day},
                 {group(VSGroupID::SleepAnalysis), QVTimeScope::Day},
+                {group(VSGroupID::MenstrualFlow), QVTimeScope::Week},
                 {group(VSGroupID::Height), QVTimeScope::Year},
                 {group(1), QVTimeScope::Month},  // body mass index, above what is shown
                 {longest, QVTimeScope::Week}};

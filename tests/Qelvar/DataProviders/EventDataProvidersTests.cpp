@@ -48,6 +48,9 @@ TEST_F(EventTest, SleepInDaysFromNoonToNoon) {
         return provider->currentValue() == 1 && provider->historicalData().size() == 4 &&
                provider->totalForDate(date("2020-03-14")) == 8;
     }));
+    show(*provider, QVTimeScope::Year);
+    ASSERT_TRUE(waitUntilLoaded(*provider));
+    EXPECT_DOUBLE_EQ(*provider->averageValue(), 8) << "the nap is no night of the year yet";
 }
 
 TEST_F(EventTest, StoodAndIdleHoursStayApart) {
@@ -65,60 +68,126 @@ TEST_F(EventTest, StoodAndIdleHoursStayApart) {
               points.end());
 }
 
+TEST_F(EventTest, StoodHoursAndWorkoutsInEveryScope) {
+    environment->setNow(date("2020-04-02T09:00"));  // in the week after the clocks went forward
+    const VSCalendar calendar = VSCalendar::current();
+    constexpr VSDuration quarter = std::chrono::minutes(15);
+    std::map<VSDate, double> stood, moved;  // hours by day
+    std::vector<VSSamplePtr> samples;
+    const auto count = [&](std::map<VSDate, double>& hours, VSDate start, VSDate end) {
+        for (VSDate at = start; at < end; at = at + quarter) hours[calendar.startOfDay(at)] += 0.25;
+    };
+    const auto hour = [&](VSDate start, bool isIdle) {
+        const VSDate end = start + 4 * quarter;
+        samples.push_back(
+            std::make_shared<VSCategorySample>(type(VSCode::ZentroStandHour), isIdle, start, end));
+        if (!isIdle) count(stood, start, end);
+    };
+    const auto workout = [&](VSDate start, VSDate end) {
+        samples.push_back(std::make_shared<VSWorkout>(37, start, end, VSDuration(0), std::nullopt,
+                                                      std::nullopt, std::vector<VSWorkoutEvent>()));
+        count(moved, start, end);
+    };
+    int n = 0;
+    for (VSDate day = date("2019-12-20"); day < date("2020-04-02"); day = calendar.addDays(day, 1), ++n) {
+        for (int i = 7; i < 22; ++i) hour(day + 4 * i * quarter, n % 9 == 0 || (5 * n + 3 * i) % 4 == 0);
+        if (n % 3 == 0) workout(day + 94 * quarter, day + (95 + n % 5) * quarter);  // often over midnight
+    }
+    hour(date("2020-04-02"), true);  // nothing but idle today: the value is that of a day before
+    workout(date("2020-04-02T07:00"), date("2020-04-02T07:30"));
+    save(samples);
+
+    const std::shared_ptr<QVTimePeriodDataProvider> providers[] = {
+        provider<QVStackedCategoryValueDataProvider>(VSGroupID::StandHours),
+        provider<QVTimePeriodDataProvider>(VSGroupID::Workouts)};
+    for (const auto& provider : providers) {
+        const auto& hours = provider == providers[0] ? stood : moved;
+        std::map<QVTimeScope, double> averages;
+        for (const QVTimeScope scope :
+             {QVTimeScope::Day, QVTimeScope::Week, QVTimeScope::Month, QVTimeScope::Year}) {
+            SCOPED_TRACE(std::string(provider->className()) + " " + std::to_string(static_cast<int>(scope)));
+            show(*provider, scope);
+            ASSERT_TRUE(waitUntil([&] { return !provider->isWaiting() && provider->averageValue(); }));
+            EXPECT_NEAR(provider->currentValue().value_or(0), hours.rbegin()->second, 1e-9);
+            std::map<VSDate, double> bars;
+            double sum = 0;
+            int days = 0;
+            for (const auto& [day, amount] : hours) {
+                if (day < *provider->startDate() || day > *provider->endDate()) continue;
+                const VSDate first = scope == QVTimeScope::Year ? calendar.startOfMonth(day) : day;
+                const VSDate next =
+                    scope == QVTimeScope::Year ? calendar.addMonths(first, 1) : calendar.addDays(first, 1);
+                bars[VSMidDate(first, next)] += amount;
+                sum += amount;
+                ++days;
+            }
+            averages[scope] = *provider->averageValue();
+            if (scope == QVTimeScope::Day) continue;
+            EXPECT_EQ(xy(*provider), XY(bars.begin(), bars.end()));
+            EXPECT_NEAR(averages[scope], sum / days, 1e-9);
+        }
+        EXPECT_EQ(averages[QVTimeScope::Day], averages[QVTimeScope::Week]);
+    }
+}
+
 TEST_F(EventTest, AYearOfCyclesWithKnownStarts) {
     environment->setTimeZone("America/New_York");
     struct Cycle {
         std::string firstDay;
         int days;
+        int without = -1;  // a day of these that nothing was entered on
     };
     // Over both changes of the clocks and a leap day; entries at any hour of the day, and whole days.
     const std::vector<Cycle> cycles{
-        {"2019-03-20", 5}, {"2019-04-02", 5}, {"2019-04-30", 4}, {"2019-05-29", 6}, {"2019-06-24", 5},
-        {"2019-07-23", 3}, {"2019-08-20", 5}, {"2019-09-18", 7}, {"2019-10-15", 5}, {"2019-11-01", 4},
-        {"2019-12-11", 5}, {"2020-01-09", 5}, {"2020-02-06", 1}, {"2020-03-06", 5}};
+        {"2019-03-20", 5}, {"2019-04-02", 5}, {"2019-04-30", 4},    {"2019-05-29", 6, 1}, {"2019-06-24", 5},
+        {"2019-07-23", 3}, {"2019-08-20", 5}, {"2019-09-18", 7, 4}, {"2019-10-15", 5},    {"2019-11-01", 4},
+        {"2019-12-11", 5}, {"2020-01-09", 5}, {"2020-02-06", 1},    {"2020-03-06", 5, 3}};
+    struct Entry {
+        VSDate start, end;
+        bool startsCycle, endsStretch;  // the last of days that follow each other
+    };
     const VSCalendar calendar = VSCalendar::current();
-    std::vector<VSSamplePtr> entries;
-    XY sections, starts;
+    std::vector<Entry> entries;
+    std::vector<VSSamplePtr> samples;
     for (size_t i = 0; i < cycles.size(); ++i) {
-        const VSDate first = date(cycles[i].firstDay);
-        const bool wholeDays = i % 3 == 1;
         for (int n = 0; n < cycles[i].days; ++n) {
-            const VSDate day = calendar.addDays(first, n);
-            const VSDate start = wholeDays ? day : day + std::chrono::hours(8 + (5 * n) % 12);
-            const VSDate end = wholeDays ? calendar.addDays(day, 1) : start;
+            if (n == cycles[i].without) continue;
+            const VSDate day = calendar.addDays(date(cycles[i].firstDay), n);
+            const bool wholeDays = i % 3 == 1;
+            // Points lie between 7 (the next day) and 41 hours (two days on: 34) apart.
+            const VSDate start = wholeDays ? day : day + std::chrono::hours((20 + 17 * n) % 24);
+            entries.push_back({start, wholeDays ? calendar.addDays(day, 1) : start, n == 0,
+                               n + 1 == cycles[i].days || n + 1 == cycles[i].without});
             VSProvenance provenance;
             provenance.metadata =
                 std::make_shared<const VSMetadata>(VSMetadata{{VSMetadataKeyMenstrualCycleStart, n == 0}});
-            entries.push_back(std::make_shared<VSCategorySample>(type(VSCode::MenstrualFlow), 2 + n % 3,
-                                                                 start, end, provenance));
-            if (i == 0) continue;  // before the year
-            if (n == 0) {
-                starts.emplace_back(start, 1);
-                sections.emplace_back(start, 0);
-            }
-            if (n + 1 == cycles[i].days) sections.emplace_back(end, 0);
+            samples.push_back(std::make_shared<VSCategorySample>(type(VSCode::MenstrualFlow), 2 + n % 3,
+                                                                 start, entries.back().end, provenance));
         }
     }
     auto provider = this->provider<QVMenstruationDataProvider>(VSGroupID::MenstrualFlow);
     EXPECT_EQ(provider->secondaryValueText().plainText(), "Start of Cycle: No Data");
-    save(entries);
+    save(samples);
     for (const QVTimeScope scope :
          {QVTimeScope::Year, QVTimeScope::Month, QVTimeScope::Week, QVTimeScope::Day}) {
+        environment->setNow(date(scope == QVTimeScope::Day ? "2020-03-08T21:00" : "2020-03-14T20:00"));
         show(*provider, scope);
-        ASSERT_TRUE(waitUntil([&] {
-            return provider->hasLoadedHistoricalData() && provider->hasLoadedSecondaryValues() &&
-                   provider->hasLoadedCurrentValue();
-        }));
+        const int value = scope == QVTimeScope::Day ? 2 + 2 % 3 : 2 + 4 % 3;
+        ASSERT_TRUE(waitUntil([&] { return !provider->isWaiting() && provider->currentValue() == value; }));
         EXPECT_EQ(provider->secondaryValueText().plainText(), "Start of Cycle: 3/6/20");
         EXPECT_FALSE(provider->secondaryValueText().runs().front().image.isNull());
-        EXPECT_EQ(provider->currentValue(), 2 + 4 % 3);
-        if (scope == QVTimeScope::Week || scope == QVTimeScope::Day) continue;  // they begin inside a section
-        XY expected;
-        for (const XY& part : {sections, starts})
-            for (const auto& point : part)
-                if (point.first >= *provider->startDate()) expected.push_back(point);
-        EXPECT_EQ(xy(*provider), expected) << "scope " << static_cast<int>(scope);
+        XY sections, starts;
+        for (const Entry& entry : entries) {
+            if (entry.end < *provider->startDate() || entry.start >= *provider->endDate()) continue;
+            if (entry.end == *provider->startDate() && entry.start < entry.end) continue;
+            if (sections.size() % 2 == 0) sections.emplace_back(entry.start, 0);
+            if (entry.endsStretch) sections.emplace_back(entry.end, 0);
+            if (entry.startsCycle) starts.emplace_back(entry.start, 1);
+        }
+        sections.insert(sections.end(), starts.begin(), starts.end());
+        EXPECT_EQ(xy(*provider), sections) << "scope " << static_cast<int>(scope);
     }
+    EXPECT_EQ(provider->lastUpdatedDate(), date("2020-03-08T21:00")) << "the whole day, until now";
 }
 
 TEST_F(EventTest, WhatEachPresenceTypeShows) {

@@ -71,7 +71,7 @@ void expectBars(const Bars& found, const Bars& expected) {
 
 struct Night {
     const char* what;
-    const char* tracked;
+    std::string tracked;
     const char* now;
     std::string until;                                   // the end of the last sleep
     std::vector<std::pair<std::string, double>> nights;  // of the week; the last is the current value
@@ -81,6 +81,15 @@ struct Night {
 constexpr const char* watchAndRing =
     "Watch bed 2020-03-13T22:30 2020-03-14T07:30\nWatch asleep 2020-03-13T23:00 2020-03-14T03:00\n"
     "Watch asleep 2020-03-14T04:00 2020-03-14T07:00\nRing asleep 2020-03-13T23:00 2020-03-14T08:00";
+/// More of them than are asked for at first.
+std::string notedWithoutLength() {
+    std::string lines;
+    for (int i = 0; i < 20; ++i) {
+        const std::string at = "2020-03-14T15:" + std::to_string(10 + i);
+        lines += "\nWatch asleep " + at + " " + at;
+    }
+    return lines;
+}
 constexpr const char* evening = "2020-03-14T20:00";
 
 const std::vector<Night> nights{
@@ -122,11 +131,25 @@ const std::vector<Night> nights{
      evening,
      "2020-03-14T06:00",
      {{"2020-03-13", 13}, {"2020-03-14", 7}}},
-    {"a night of which only the beginning was noted",
-     "Watch asleep 2020-03-12T23:00 2020-03-13T06:00\nWatch asleep 2020-03-13T23:00 2020-03-13T23:00",
+    {"nights of which only the beginning was noted",
+     "Watch asleep 2020-03-12T23:00 2020-03-13T06:00" + notedWithoutLength(),
      evening,
      "2020-03-13T06:00",
      {{"2020-03-13", 7}}},
+    {"a ring saw last what a watch that counts before it knows better",
+     "Watch asleep 2020-03-13T23:00 2020-03-14T07:00\nWatch bed 2020-03-14T10:00 2020-03-14T14:00\n"
+     "Watch asleep 2020-03-14T10:00 2020-03-14T11:30\nRing asleep 2020-03-14T12:30 2020-03-14T13:30",
+     evening,
+     "2020-03-14T11:30",
+     {{"2020-03-14", 9.5}},
+     {"Watch", "Ring"}},
+    {"in the middle of nights that are all noted already",
+     "Watch asleep 2020-03-12T23:00 2020-03-13T07:00\nWatch asleep 2020-03-13T23:00 2020-03-14T01:00\n"
+     "Watch asleep 2020-03-14T02:00 2020-03-14T04:00\nWatch asleep 2020-03-14T05:00 2020-03-14T07:00\n"
+     "Watch asleep 2020-03-14T14:00 2020-03-14T15:00\nWatch asleep 2020-03-14T23:00 2020-03-15T07:00",
+     "2020-03-14T03:00",
+     "2020-03-14T03:00",
+     {{"2020-03-13", 8}, {"2020-03-14", 3}}},
     {"the clocks go forward",
      "Watch asleep 2020-03-28T23:00 2020-03-29T07:00",
      "2020-03-29T20:00",
