@@ -381,7 +381,8 @@ QVRecordsBuilder::Check QVRecordsBuilder::readQuantity(const QVElement& element,
     const auto value = unit.isCanonical ? number : unit.unit->convert(*number, canonical);
     if (!value || !std::isfinite(*value))
         return Problem{"not a number", attributeText(QVAttributeName::Value, text)};
-    draft.quantity.emplace(canonical, *value);
+    // In the document's own unit: whether the store has it already is seen in the digits that stand there.
+    draft.quantity.emplace(unit.isCanonical ? canonical : *unit.unit, *number);
     return {};
 }
 

@@ -62,6 +62,8 @@ TEST_F(ExportCommand, WritesAnArchiveThatCanBeImported) {
         << "in the units of the region";
     const auto imported = program_.run({"import", "--store", folder_.path() / "other", target_});
     EXPECT_EQ(test::rowsOf(imported.output).back().at("added"), "11") << imported.errors;
+    const auto again = program_.run({"import", target_});
+    EXPECT_EQ(test::rowsOf(again.output).back().at("added"), "0") << "numbers were rounded on the way";
 }
 
 TEST_F(ExportCommand, SaysWhatIsWrong) {
