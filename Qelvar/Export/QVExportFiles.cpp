@@ -42,7 +42,8 @@ bool isSameFile(int descriptor, const fs::path& path) {
 VSResult<QVImportFileDescriptor> QVExportFiles::lock(const fs::path& folder) {
     QVImportFileDescriptor descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (descriptor.get() < 0) return VSErrorFromSystem(errno, folder.string());
-    const bool isLocked = flock(descriptor.get(), LOCK_EX | LOCK_NB) == 0;
+    // Where the file system knows no such locks, as over some networks, nobody is kept out.
+    const bool isLocked = flock(descriptor.get(), LOCK_EX | LOCK_NB) == 0 || errno != EWOULDBLOCK;
     // An export that ended this moment may have removed the folder after it was opened here.
     if (isLocked && isSameFile(descriptor.get(), folder)) return descriptor;
     return VSError{VSErrorCode::NotAccessible, "another export is under way in " + folder.string(), true};

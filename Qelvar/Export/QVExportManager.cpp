@@ -50,7 +50,11 @@ void QVExportManager::createExportFile(Completion completion) {
 }
 
 void QVExportManager::cancelCurrentExport() {
-    if (exportInProgress_) fail(cancelled());
+    std::lock_guard lock(
+        mutex_);  // under which an export ends, so that this one is not mistaken for the next
+    if (!exportInProgress_) return;
+    if (!error_) error_ = cancelled();
+    exportFailed_ = true;
 }
 
 void QVExportManager::cleanupExportFiles() {

@@ -46,12 +46,22 @@ VSStatus copyContent(const fs::path& archive, int to, const fs::path& target,
     return fsync(to) == 0 ? VSStatus() : VSErrorFromSystem(errno, target.string());
 }
 
+/// Gives a file without a name this one.
+VSStatus nameFile(int file, const std::string& name, const fs::path& target) {
+    unlink(name.c_str());  // what a killed process of the same number had
+    const std::string self = "/proc/self/fd/" + std::to_string(file);
+    const bool isNamed = linkat(AT_FDCWD, self.c_str(), AT_FDCWD, name.c_str(), AT_SYMLINK_FOLLOW) == 0;
+    return isNamed ? VSStatus() : VSErrorFromSystem(errno, target.string());
+}
+
 }  // namespace
 
 VSResult<fs::path> QVExportTargetFile(const fs::path& given) {
     std::error_code error;
     const fs::path target = fs::weakly_canonical(fs::absolute(given, error), error);
     if (error) return VSErrorFromSystem(error.value(), given.string());
+    if (fs::is_symlink(target, error))
+        return VSError{VSErrorCode::NotFound, given.string() + " is a link to what is not there"};
     const auto type = fs::status(target, error).type();
     if (type != fs::file_type::not_found && type != fs::file_type::regular)
         return VSError{VSErrorCode::Invalid, given.string() + " is no file"};
@@ -70,10 +80,22 @@ VSStatus QVMoveExportArchive(const fs::path& archive, const fs::path& target) {
 
 VSStatus QVCopyExportArchive(const fs::path& archive, const fs::path& target,
                              const std::atomic<bool>& cancel) {
-    std::string copy = (target.parent_path() / ("." + target.filename().string() + ".XXXXXX")).string();
-    const QVImportFileDescriptor file(mkostemp(copy.data(), O_CLOEXEC));  // of mode 0600
-    if (file.get() < 0) return VSErrorFromSystem(errno, target.string());
-    VSStatus status = copyContent(archive, file.get(), target, cancel);
+    const fs::path folder = target.parent_path();
+    std::string copy = (folder / ("." + target.filename().string() + ".XXXXXX")).string();
+    // A file without a name until it is whole, which a killed process leaves nothing of, where the file
+    // system has such.
+    const QVImportFileDescriptor unnamed(open(folder.c_str(), O_TMPFILE | O_WRONLY | O_CLOEXEC, 0600));
+    VSStatus status;
+    if (unnamed.get() >= 0) {
+        status = copyContent(archive, unnamed.get(), target, cancel);
+        if (!status) return status;
+        copy.replace(copy.size() - 6, 6, std::to_string(getpid()));
+        status = nameFile(unnamed.get(), copy, target);
+    } else {
+        const QVImportFileDescriptor file(mkostemp(copy.data(), O_CLOEXEC));  // of mode 0600
+        if (file.get() < 0) return VSErrorFromSystem(errno, target.string());
+        status = copyContent(archive, file.get(), target, cancel);
+    }
     if (status) status = QVMoveExportArchive(copy, target);
     if (!status) unlink(copy.c_str());
     return status;

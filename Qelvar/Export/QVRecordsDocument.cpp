@@ -35,7 +35,7 @@ const std::string& QVDeviceTexts::textOf(const VSSample& sample) {
 
 QVRecordsDocument::QVRecordsDocument(const std::filesystem::path& file, int secondsFromGMT,
                                      const QVExportUnits& units)
-    : writer_(file), dates_(secondsFromGMT), units_(units) {}
+    : secondsFromGMT_(secondsFromGMT), writer_(file), dates_(secondsFromGMT), units_(units) {}
 
 void QVRecordsDocument::open(const std::string& locale) {
     writer_.startDocument("1.0", "UTF-8");
@@ -150,6 +150,7 @@ void QVRecordsDocument::startElement(const char* name, const VSSample& sample) {
     writeExactText("sourceName", sample.sourceRevision().source.name);
     writeExactText("sourceVersion", sample.sourceRevision().version);
     writeExactText("device", devices_.textOf(sample));
+    writeExactOffset(sample);
     writer_.startElement(name);
 }
 
@@ -201,4 +202,24 @@ void QVRecordsDocument::writeExactZero(const char* attribute, const std::optiona
 
 void QVRecordsDocument::writeExactText(const char* attribute, const std::string& text) {
     if (!QVExportIsXMLText(text)) writeExactValue(attribute, VSValue(text));
+}
+
+/// All dates have the offset of the export. What was noted at home needs no word; a journey does, for a night
+/// abroad stands at the hours lived there.
+void QVRecordsDocument::writeExactOffset(const VSSample& sample) {
+    const auto noted = sample.timeZoneOffset();
+    const VSDate start = sample.startDate();
+    if (!noted || *noted == secondsFromGMT_) return;
+    if (!isOffsetOfHome(*noted, start) || !isOffsetOfHome(secondsFromGMT_, start))
+        writeExactValue("startDate", VSValue(*noted));
+}
+
+/// Whether the zone has the offset at some time of the year around the date.
+bool QVRecordsDocument::isOffsetOfHome(int offset, VSDate date) {
+    constexpr VSDuration month = std::chrono::hours(30 * 24);
+    const int64_t number = date.microseconds() / month.count();
+    const auto [known, isNew] = offsetsOfHome_.try_emplace({offset, number}, false);
+    for (int64_t n = number - 6; isNew && n <= number + 6 && !known->second; ++n)
+        known->second = calendar_.secondsFromGMT(VSDate::fromMicroseconds(n * month.count())) == offset;
+    return known->second;
 }

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <map>
 #include <memory>
 #include <optional>
 #include <string>
@@ -7,6 +8,7 @@
 #include "Qelvar/Export/QVExportText.h"
 #include "Qelvar/Export/QVExportUnits.h"
 #include "Qelvar/Export/QVXMLWriter.h"
+#include "Vessa/Base/VSCalendar.h"
 #include "Vessa/VSHealthStore.h"
 #include "Vessa/VSObject.h"
 
@@ -63,7 +65,12 @@ class QVRecordsDocument {
     void writeExactValue(const char* attribute, const VSValue& value);
     void writeExactZero(const char* attribute, const std::optional<VSQuantity>& total);
     void writeExactText(const char* attribute, const std::string& text);
+    void writeExactOffset(const VSSample& sample);
+    bool isOffsetOfHome(int offset, VSDate date);
 
+    const VSCalendar calendar_ = VSCalendar::current();
+    const int secondsFromGMT_;
+    std::map<std::pair<int, int64_t>, bool> offsetsOfHome_;  // by offset and month
     QVXMLWriter writer_;
     QVExportDateFormatter dates_;
     const QVExportUnits& units_;

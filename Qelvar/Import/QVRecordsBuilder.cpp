@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <cstdlib>
 
 namespace {
 
@@ -17,6 +18,8 @@ std::string attributeText(QVAttributeName attribute, std::string_view value) {
 std::string attributeName(QVAttributeName attribute) {
     return kQVAttributeNames[static_cast<size_t>(attribute)];
 }
+
+constexpr int kGreatestOffset = 18 * 3600;  // seconds
 
 /// The number of a thing that has no identifier.
 std::optional<int> exactNumber(const QVElement& element, QVAttributeName attribute) {
@@ -314,7 +317,10 @@ QVRecordsBuilder::Check QVRecordsBuilder::readDates(const QVElement& element, Dr
     }
     draft.start = start.date;
     draft.end = end.date;
-    draft.provenance.timeZoneOffset = start.offset;
+    // The offset in the dates is that of the day of the export.
+    const auto noted = exactNumber(element, QVAttributeName::StartDate);
+    const bool isOffset = noted && std::abs(*noted) <= kGreatestOffset;
+    draft.provenance.timeZoneOffset = isOffset ? *noted : start.offset;
     if (element.has(QVAttributeName::CreationDate)) {
         QVImportDate creation = start;
         if (creationText == endText)

@@ -185,6 +185,15 @@ int64_t second(VSDate date) {
     return (date.microseconds() - (date.microseconds() % 1'000'000 + 1'000'000) % 1'000'000) / 1'000'000;
 }
 
+/// Where the sample was recorded, when that was not at home: "" else.
+std::string journey(const VSSample& sample) {
+    for (int day = -240; day <= 240; day += 5) {
+        const VSDate near = sample.startDate() + std::chrono::hours(24 * day);
+        if (VSCalendar::current().secondsFromGMT(near) == sample.timeZoneOffset()) return "";
+    }
+    return " | " + std::to_string(*sample.timeZoneOffset());
+}
+
 /// All that a document says of a sample, and no more.
 std::string textOf(const VSSample& sample, const QVExportUnits& units) {
     std::ostringstream text;
@@ -193,7 +202,7 @@ std::string textOf(const VSSample& sample, const QVExportUnits& units) {
     text << sample.sampleType()->name() << ' ' << second(sample.startDate()) << ' '
          << second(sample.endDate()) << ' ' << second(*sample.creationDate()) << " | " << revision.source.name
          << " | " << revision.version << " | ";
-    text << (sample.device() ? sample.device()->description() : "");
+    text << (sample.device() ? sample.device()->description() : "") << journey(sample);
     text << " | " << VSValue(sample.metadata()).serialized() << " | ";
     const auto total = [&](const std::optional<VSQuantity>& quantity) {
         if (quantity) text << quantity->value();
