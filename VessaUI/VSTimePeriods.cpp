@@ -4,6 +4,7 @@
 #include <map>
 
 #include "Vessa/Base/VSCivil.h"
+#include "Vessa/Base/VSHomeOffsets.h"
 
 namespace {
 
@@ -12,13 +13,13 @@ constexpr VSDuration aDay = std::chrono::hours(24);
 /// Where on the calendar's clock the hours stand that were on the clock where a sample was recorded.
 class RecordedHours {
  public:
-    explicit RecordedHours(const VSCalendar& calendar) : calendar_(calendar) {}
+    explicit RecordedHours(const VSCalendar& calendar) : calendar_(calendar), home_(calendar) {}
 
     /// How much later than at its moment.
     VSDuration shift(const VSSample& sample) {
         const auto recorded = sample.timeZoneOffset();
         const VSDate start = sample.startDate();
-        if (!recorded || *recorded == calendar_.secondsFromGMT(start) || isOfThisZone(*recorded, start))
+        if (!recorded || *recorded == calendar_.secondsFromGMT(start) || home_.contains(*recorded, start))
             return VSDuration::zero();
         return momentOfClock(start.microseconds() + *recorded * civil::kSecond).value_or(start) - start;
     }
@@ -39,18 +40,9 @@ class RecordedHours {
         if (!moment) return std::nullopt;
         return *moment + VSDuration(rest % civil::kSecond);
     }
-    /// Whether the zone has the offset at some time of the year around the date.
-    bool isOfThisZone(int recorded, VSDate date) {
-        constexpr VSDuration month = 30 * aDay;
-        const int64_t monthNumber = date.microseconds() / month.count();
-        const auto [known, isNew] = known_.try_emplace({recorded, monthNumber}, false);
-        for (int64_t n = monthNumber - 6; isNew && n <= monthNumber + 6 && !known->second; ++n)
-            known->second = calendar_.secondsFromGMT(VSDate::fromMicroseconds(n * month.count())) == recorded;
-        return known->second;
-    }
 
     const VSCalendar& calendar_;
-    std::map<std::pair<int, int64_t>, bool> known_;  // by offset and month
+    VSHomeOffsets home_;
 };
 
 /// A part of a sample that counts.

@@ -3,7 +3,6 @@
 #include <archive.h>
 #include <archive_entry.h>
 #include <fcntl.h>
-#include <locale.h>
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -14,6 +13,7 @@
 #include <vector>
 
 #include "Qelvar/Import/QVImportFileDescriptor.h"
+#include "Qelvar/Import/QVUtf8Locale.h"
 #include "Vessa/VSDatabase.h"
 
 namespace {
@@ -27,22 +27,6 @@ struct WriterFree {
 };
 struct EntryFree {
     void operator()(archive_entry* entry) const { archive_entry_free(entry); }
-};
-
-/// Names of entries are UTF-8 whatever the locale of the process: this thread's is another one meanwhile.
-class Utf8Locale {
- public:
-    Utf8Locale() : locale_(newlocale(LC_CTYPE_MASK, "C.UTF-8", nullptr)), previous_(uselocale(locale_)) {}
-    ~Utf8Locale() {
-        uselocale(previous_);
-        if (locale_) freelocale(locale_);
-    }
-    Utf8Locale(const Utf8Locale&) = delete;
-    Utf8Locale& operator=(const Utf8Locale&) = delete;
-
- private:
-    const locale_t locale_;
-    const locale_t previous_;
 };
 
 class Packing {
@@ -124,7 +108,7 @@ class Packing {
 
 VSStatus QVArchiveExportDirectory(const fs::path& folder, const fs::path& archive,
                                   const QVExportPackingProgress& progress) {
-    const Utf8Locale locale;
+    const QVUtf8Locale locale;
     std::error_code error;
     std::vector<fs::path> files;
     for (fs::directory_iterator entries(folder, error), end; !error && entries != end;

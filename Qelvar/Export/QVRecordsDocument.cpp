@@ -210,16 +210,6 @@ void QVRecordsDocument::writeExactOffset(const VSSample& sample) {
     const auto noted = sample.timeZoneOffset();
     const VSDate start = sample.startDate();
     if (!noted || *noted == secondsFromGMT_) return;
-    if (!isOffsetOfHome(*noted, start) || !isOffsetOfHome(secondsFromGMT_, start))
+    if (!home_.contains(*noted, start) || !home_.contains(secondsFromGMT_, start))
         writeExactValue("startDate", VSValue(*noted));
-}
-
-/// Whether the zone has the offset at some time of the year around the date.
-bool QVRecordsDocument::isOffsetOfHome(int offset, VSDate date) {
-    constexpr VSDuration month = std::chrono::hours(30 * 24);
-    const int64_t number = date.microseconds() / month.count();
-    const auto [known, isNew] = offsetsOfHome_.try_emplace({offset, number}, false);
-    for (int64_t n = number - 6; isNew && n <= number + 6 && !known->second; ++n)
-        known->second = calendar_.secondsFromGMT(VSDate::fromMicroseconds(n * month.count())) == offset;
-    return known->second;
 }

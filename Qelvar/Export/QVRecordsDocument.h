@@ -1,6 +1,5 @@
 #pragma once
 
-#include <map>
 #include <memory>
 #include <optional>
 #include <string>
@@ -8,7 +7,7 @@
 #include "Qelvar/Export/QVExportText.h"
 #include "Qelvar/Export/QVExportUnits.h"
 #include "Qelvar/Export/QVXMLWriter.h"
-#include "Vessa/Base/VSCalendar.h"
+#include "Vessa/Base/VSHomeOffsets.h"
 #include "Vessa/VSHealthStore.h"
 #include "Vessa/VSObject.h"
 
@@ -66,11 +65,9 @@ class QVRecordsDocument {
     void writeExactZero(const char* attribute, const std::optional<VSQuantity>& total);
     void writeExactText(const char* attribute, const std::string& text);
     void writeExactOffset(const VSSample& sample);
-    bool isOffsetOfHome(int offset, VSDate date);
 
-    const VSCalendar calendar_ = VSCalendar::current();
     const int secondsFromGMT_;
-    std::map<std::pair<int, int64_t>, bool> offsetsOfHome_;  // by offset and month
+    VSHomeOffsets home_{VSCalendar::current()};
     QVXMLWriter writer_;
     QVExportDateFormatter dates_;
     const QVExportUnits& units_;

@@ -2,12 +2,12 @@
 
 #include <archive.h>
 #include <archive_entry.h>
-#include <locale.h>
 
 #include <algorithm>
 #include <cstring>
 
 #include "Qelvar/Import/QVImportText.h"
+#include "Qelvar/Import/QVUtf8Locale.h"
 
 namespace {
 
@@ -23,23 +23,6 @@ struct ArchiveCloser {
     void operator()(archive* a) const { archive_read_free(a); }
 };
 using ArchivePointer = std::unique_ptr<archive, ArchiveCloser>;
-
-/// Names of entries are wanted as UTF-8 whatever the locale of the process: this thread's is another one
-/// meanwhile.
-class Utf8Locale {
- public:
-    Utf8Locale() : locale_(newlocale(LC_CTYPE_MASK, "C.UTF-8", nullptr)), previous_(uselocale(locale_)) {}
-    ~Utf8Locale() {
-        uselocale(previous_);
-        if (locale_) freelocale(locale_);
-    }
-    Utf8Locale(const Utf8Locale&) = delete;
-    Utf8Locale& operator=(const Utf8Locale&) = delete;
-
- private:
-    const locale_t locale_;
-    const locale_t previous_;
-};
 
 /// Whether a path would leave the folder that it is unpacked in. Nothing is unpacked here; but an archive
 /// that tries it is not what it says.
@@ -88,7 +71,7 @@ class ArchiveFile final : public QVImportFile {
     }
 
     VSResult<bool> nextDocument() override {
-        const Utf8Locale locale;
+        const QVUtf8Locale locale;
         while (true) {
             archive_entry* entry = nullptr;
             const int result = archive_read_next_header(archive_.get(), &entry);
