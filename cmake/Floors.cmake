@@ -37,7 +37,8 @@ function(qelvar_floor target)
 endfunction()
 
 # qelvar_test(NAME FOLDER <folder below tests/> DEPENDS <targets...>)
-# All *.cpp of tests/FOLDER become one GoogleTest program; its cases are listed when the tests run.
+# All *.cpp of tests/FOLDER become one GoogleTest program; its cases are listed when the tests run. Properties are RapidCheck's,
+# with a fixed seed; RC_PARAMS='max_success=10000 seed=7' runs a program with others.
 function(qelvar_test target)
   cmake_parse_arguments(ARG "QT_MAIN" "FOLDER" "DEPENDS" ${ARGN})
   file(GLOB sources CONFIGURE_DEPENDS ${CMAKE_SOURCE_DIR}/tests/${ARG_FOLDER}/*.cpp)
@@ -45,7 +46,7 @@ function(qelvar_test target)
     return()
   endif()
   add_executable(${target} ${sources})
-  target_link_libraries(${target} PRIVATE ${ARG_DEPENDS} TestSupport GTest::gtest)
+  target_link_libraries(${target} PRIVATE ${ARG_DEPENDS} TestSupport GTest::gtest rapidcheck_gtest)
   target_compile_definitions(${target} PRIVATE QELVAR_TEST_DATA="${CMAKE_SOURCE_DIR}/tests/data" QELVAR_SOURCE_DIR="${CMAKE_SOURCE_DIR}")
   if(ARG_QT_MAIN)
     target_link_libraries(${target} PRIVATE TestQtMain)
@@ -54,5 +55,5 @@ function(qelvar_test target)
   endif()
   add_test(NAME ${target} COMMAND ${target})
   set_tests_properties(${target} PROPERTIES ENVIRONMENT
-    "QT_QPA_PLATFORM=offscreen;TZ=Europe/Copenhagen;LC_ALL=C.UTF-8;ASAN_OPTIONS=detect_leaks=1;LSAN_OPTIONS=suppressions=${CMAKE_SOURCE_DIR}/tests/lsan.supp:print_suppressions=0;UBSAN_OPTIONS=print_stacktrace=1")
+    "RC_PARAMS=seed=20201123;QT_QPA_PLATFORM=offscreen;TZ=Europe/Copenhagen;LC_ALL=C.UTF-8;ASAN_OPTIONS=detect_leaks=1;LSAN_OPTIONS=suppressions=${CMAKE_SOURCE_DIR}/tests/lsan.supp:print_suppressions=0;UBSAN_OPTIONS=print_stacktrace=1")
 endfunction()
