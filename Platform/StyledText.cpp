@@ -166,9 +166,9 @@ std::vector<Placed> placed(const std::vector<StyledRun>& runs, const QFont& defa
     std::vector<Placed> result;
     for (const auto& piece : pieces(runs)) {
         if (piece.single) {
-            result.push_back({std::nullopt, piece.single,
-                              piece.single->image.isNull() ? piece.single->spacing
-                                                           : imageSize(piece.single->image).width()});
+            const double width =
+                piece.single->image.isNull() ? piece.single->spacing : imageSize(piece.single->image).width();
+            result.push_back({std::nullopt, piece.single, width * scale});
         } else {
             TextLine line(piece.text, defaultFont, rightToLeft);
             const double width = line.width() * scale;
@@ -214,8 +214,9 @@ VerticalExtent extent(const std::vector<StyledRun>& runs, const QFont& defaultFo
     bool any = false;
     for (const auto& run : runs) {
         if (!run.image.isNull()) {
-            result.ascent = std::max(result.ascent, imageSize(run.image).height() + run.baselineOffset);
-            result.descent = std::max(result.descent, -run.baselineOffset);
+            const double height = imageSize(run.image).height();
+            result.ascent = std::max(result.ascent, (height + run.baselineOffset) * scale);
+            result.descent = std::max(result.descent, -run.baselineOffset * scale);
             any = true;
         } else if (run.spacing <= 0) {
             const QFontMetricsF metrics(run.font.value_or(defaultFont));
@@ -253,7 +254,7 @@ StyledText StyledText::spacer(double width) {
     StyledText result;
     if (width > 0) {
         StyledRun run;
-        run.spacing = width;
+        run.spacing = width * textScale();
         result.runs_.push_back(std::move(run));
     }
     return result;
@@ -298,6 +299,21 @@ double StyledText::ascent(const QFont& defaultFont, double scale) const {
     return extent(runs_, defaultFont, scale).ascent;
 }
 
+StyledText::Ink StyledText::ink(const QFont& defaultFont) const {
+    Ink result;
+    for (const auto& run : runs_) {
+        QRectF drawn;
+        if (!run.image.isNull())
+            drawn =
+                QRectF(QPointF(0, -imageSize(run.image).height() - run.baselineOffset), imageSize(run.image));
+        else if (run.spacing <= 0)
+            drawn = QFontMetricsF(run.font.value_or(defaultFont)).tightBoundingRect(run.text);
+        result.above = std::max(result.above, -drawn.top());
+        result.below = std::max(result.below, drawn.bottom());
+    }
+    return result;
+}
+
 void StyledText::draw(QPainter& painter, QPointF baselineLeft, const QFont& defaultFont,
                       const QColor& defaultColor, double maxWidth, double scale) const {
     const bool rightToLeft = isRightToLeft();
@@ -318,10 +334,9 @@ void StyledText::draw(QPainter& painter, QPointF baselineLeft, const QFont& defa
             piece.line->draw(painter, piece.line->ascent());
             painter.restore();
         } else if (!piece.single->image.isNull()) {
-            const QSizeF size = imageSize(piece.single->image);
-            painter.drawImage(
-                QRectF(QPointF(x, baselineLeft.y() - piece.single->baselineOffset - size.height()), size),
-                piece.single->image);
+            const QSizeF size = imageSize(piece.single->image) * scale;
+            const double bottom = baselineLeft.y() - piece.single->baselineOffset * scale;
+            painter.drawImage(QRectF(QPointF(x, bottom - size.height()), size), piece.single->image);
         }
         x += piece.width;
     }

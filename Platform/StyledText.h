@@ -33,7 +33,9 @@ class StyledText {
     StyledText() = default;
     explicit StyledText(const QString& text, std::optional<QFont> font = {},
                         std::optional<QColor> color = {});
-    static StyledText spacer(double width);  // width 0: empty
+    /// A space of that width beside texts of the normal size; it grows with textScale(). Width 0: empty.
+    static StyledText spacer(double width);
+    /// The image is as large as the person wants texts already.
     static StyledText withImage(const QImage& image, double baselineOffset);
 
     const std::vector<StyledRun>& runs() const { return runs_; }
@@ -46,10 +48,16 @@ class StyledText {
     friend StyledText operator+(StyledText a, const StyledText& b) { return a += b; }
     friend bool operator==(const StyledText&, const StyledText&) = default;
 
-    /// Width and height in points when drawn with these defaults on one line; `scale` multiplies all font
-    /// sizes.
+    /// Width and height in points when drawn with these defaults on one line; `scale` multiplies all sizes,
+    /// those of spaces and images too.
     QSizeF size(const QFont& defaultFont, double scale = 1.0) const;
     double ascent(const QFont& defaultFont, double scale = 1.0) const;
+    /// How far what is drawn reaches above and beneath the baseline. A letter of another script than the
+    /// font's may reach farther than the font says.
+    struct Ink {
+        double above = 0, below = 0;
+    };
+    Ink ink(const QFont& defaultFont) const;
     /// Draws one line with its left end (right end of a right-to-left text is then left + width) at x and its
     /// baseline at y; cut with an ellipsis when wider than maxWidth.
     void draw(QPainter& painter, QPointF baselineLeft, const QFont& defaultFont, const QColor& defaultColor,

@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "Platform/Localization.h"
+#include "Platform/TextScale.h"
 #include "Qelvar/Charts/QVChartSeriesPointMarker.h"
 #include "Qelvar/DataProviders/QVHealthStoreExtensions.h"
 #include "Qelvar/Formatters/QVDateFormatters.h"
@@ -60,7 +61,7 @@ platform::StyledText QVSamplesExistDataProvider::secondaryValueText() const {
     if (!shouldPrefixSecondaryValueWithDot()) return text;
     const QImage dot =
         QVChartSeriesPointMarker::chartPointForText(Qt::white, dotRadius, dotLineWidth, QVPointStyle::Ring);
-    return platform::prefixedWithImage(text, dot, dotBaselineAdjustment, dotSpacing);
+    return platform::prefixedWithImage(text, dot, dotBaselineAdjustment * platform::textScale(), dotSpacing);
 }
 
 // The current value

@@ -6,6 +6,7 @@
 
 #include "Platform/Icons.h"
 #include "Platform/Localization.h"
+#include "Platform/TextScale.h"
 #include "Qelvar/Formatters/QVDataUnitGroupLabels.h"
 
 using platform::StyledText;
@@ -20,7 +21,8 @@ constexpr double unitIconSize = 7.5;
 constexpr double unitIconScale = 4;
 
 QImage unitIcon(const VSDataUnitGroup* group) {
-    return platform::icon(group->unitIcon(), {unitIconSize, unitIconSize}, unitIconScale);
+    const double size = unitIconSize * platform::textScale();
+    return platform::icon(group->unitIcon(), {size, size}, unitIconScale);
 }
 
 StyledText wholeNumber(double number, const QFont& font) {
