@@ -25,8 +25,12 @@ bool hasSessionBus() {
 void listenToDesktopSetting(QObject* receiver, const char* slotName, const QString& group,
                             const QString& key) {
     if (!hasSessionBus()) return;
-    auto bus = QDBusConnection::sessionBus();
-    if (!bus.isConnected()) return;
+    const auto bus = QDBusConnection::sessionBus();
+    if (bus.isConnected()) listenToDesktopSetting(bus, receiver, slotName, group, key);
+}
+
+void listenToDesktopSetting(QDBusConnection bus, QObject* receiver, const char* slotName,
+                            const QString& group, const QString& key) {
     const QByteArray slot = QByteArray("1") + slotName + "(QString,QString,QDBusVariant)";
     bus.connect(kService, kPath, kInterface, QStringLiteral("SettingChanged"), receiver, slot.constData());
     auto read = QDBusMessage::createMethodCall(kService, kPath, kInterface, QStringLiteral("Read"));

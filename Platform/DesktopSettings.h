@@ -1,5 +1,6 @@
 #pragma once
 
+#include <QDBusConnection>
 #include <QObject>
 #include <QVariant>
 
@@ -10,6 +11,9 @@ namespace platform {
 /// session bus, or nobody answers for the desktop, it is never called. Main thread.
 void listenToDesktopSetting(QObject* receiver, const char* slotName, const QString& group,
                             const QString& key);
+/// The same on a bus that is there.
+void listenToDesktopSetting(QDBusConnection bus, QObject* receiver, const char* slotName,
+                            const QString& group, const QString& key);
 
 /// The value itself: portals pack it more than once.
 QVariant unpackedSetting(QVariant value);

@@ -93,7 +93,7 @@ FocusScope {
         onBusyChanged: if (!busy && root.stack) Qt.callLater(root.stack.transitionFinished)
 
         function show(screen, animated) {
-            push(screen.view, { screen: screen }, animated ? T.StackView.PushTransition : T.StackView.Immediate)
+            push(screen.view, { screen: screen }, animated && SystemStyle.animated ? T.StackView.PushTransition : T.StackView.Immediate)
         }
     }
 
@@ -104,7 +104,7 @@ FocusScope {
             screens.currentItem.forceActiveFocus()
         }
         function onPopped(count, animated) {
-            screens.pop(screens.get(screens.depth - 1 - count), animated && root.visible ? T.StackView.PopTransition : T.StackView.Immediate)
+            screens.pop(screens.get(screens.depth - 1 - count), animated && root.visible && SystemStyle.animated ? T.StackView.PopTransition : T.StackView.Immediate)
             screens.currentItem.forceActiveFocus()
         }
     }

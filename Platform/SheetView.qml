@@ -5,7 +5,7 @@ SystemSheet {
     id: sheet
     property var presentation: null
     readonly property var presented: presentation ? presentation.screen : null
-    readonly property bool animated: presentation ? presentation.animated : false
+    readonly property bool animated: presentation && SystemStyle.animated ? presentation.animated : false
     title: presented ? presented.title : ""
     implicitHeight: loader.item ? loader.item.implicitHeight : 0
     enter: Transition {

@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <vector>
 
+#include "Platform/Appearance.h"
 #include "Platform/TextScale.h"
 #include "Qelvar/App/QVApplication.h"
 #include "Vessa/Base/VSEnvironment.h"
@@ -16,12 +17,13 @@ constexpr const QVCommand* kCommands[] = {
     &QVSourcesCommand, &QVBatchesCommand, &QVUndoCommand,       &QVCheckCommand,   &QVSalvageCommand};
 
 constexpr QVCommandOption kCommonOptions[] = {{"store", true}, {"now", true}, {"help", false}};
-constexpr QVCommandOption kProgramOptions[] = {
-    {"store", true},       {"now", true},  {"help", false}, {"version", false}, {"demo", false},
-    {"screenshots", true}, {"size", true}, {"scale", true}, {"open", true},     {"text-scale", true}};
+constexpr QVCommandOption kProgramOptions[] = {{"store", true},      {"now", true},     {"help", false},
+                                               {"version", false},   {"demo", false},   {"screenshots", true},
+                                               {"size", true},       {"scale", true},   {"open", true},
+                                               {"text-scale", true}, {"contrast", true}};
 
 constexpr const char* kHelp =
-    R"(Usage: qelvar [--demo] [--screenshots DIR] [--size WxH] [--scale S] [--text-scale T] [--open LINK] [--store DIR] [--now DATE]
+    R"(Usage: qelvar [--demo] [--screenshots DIR] [--size WxH] [--scale S] [--text-scale T] [--contrast C] [--open LINK] [--store DIR] [--now DATE]
        qelvar COMMAND [OPTION]... [WORD]...
 
 Without a command the application is started.
@@ -31,6 +33,7 @@ Without a command the application is started.
   --size WxH          the window's size in points (375x667)
   --scale S           pixels per point of the screenshots
   --text-scale T      how large texts are, from 1 to 2 (QELVAR_TEXT_SCALE, or as the desktop says)
+  --contrast C        "high" or "normal" (as the desktop says)
   --open LINK         open a link of the application, such as qelvar://HealthDataTab?DataCategory=2&DataUnit=59
 
 For the application and every command:
@@ -96,7 +99,7 @@ QVExitStatus runCommand(const QVCommand& command, const QVCommandArguments& prog
     const auto arguments = QVCommandArguments::parse(std::span(program.words()).subspan(1), options);
     if (!arguments) return QVFailUsage(command.name, arguments.error().message);
     if (arguments->has("help") || program.has("help")) return printHelp(command), QVExitStatus::Success;
-    for (const char* option : {"screenshots", "size", "scale", "text-scale", "open"}) {
+    for (const char* option : {"screenshots", "size", "scale", "text-scale", "contrast", "open"}) {
         if (program.has(option))
             return QVFailUsage({}, std::string("--") + option + " is for the application, not for a command");
     }
@@ -138,6 +141,11 @@ QVExitStatus runApplication(char* program, const QVCommandArguments& arguments) 
         const auto factor = platform::TextScale::fromText(QByteArray::fromStdString(*text));
         if (!factor) return QVFailUsage({}, "--text-scale: " + *text + " is not a number from 1 to 2");
         options.textScale = *factor;
+    }
+    if (const auto text = arguments.value("contrast")) {
+        options.highContrast = platform::Appearance::highContrastFromText(QByteArray::fromStdString(*text));
+        if (!options.highContrast)
+            return QVFailUsage({}, "--contrast: " + *text + " is neither high nor normal");
     }
     if (const auto link = arguments.value("open")) options.openLink = QString::fromStdString(*link);
     if (const VSStatus status = installClock(arguments.value("now")); !status)

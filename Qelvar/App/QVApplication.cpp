@@ -13,6 +13,7 @@
 #include <optional>
 #include <thread>
 
+#include "Platform/Appearance.h"
 #include "Platform/Icons.h"
 #include "Platform/Localization.h"
 #include "Platform/SystemEvents.h"
@@ -203,6 +204,8 @@ int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options)
     platform::loadTranslations();
     // Pictures show what the command line says, not what the desktop does meanwhile.
     if (!options.screenshots) platform::SystemEvents::shared().start();
+    if (options.highContrast) platform::Appearance::shared().setHighContrast(*options.highContrast);
+    if (!options.screenshots) platform::Appearance::shared().start();
     if (options.textScale > 0) platform::TextScale::shared().set(options.textScale);
     platform::TextScale::shared().start();
 

@@ -17,6 +17,8 @@ struct QVApplicationOptions {
     double scale = 0;
     /// How large texts are, from 1 to 3; 0: as the person's desktop says.
     double textScale = 0;
+    /// Whether the contrast is high; none: as the person's desktop says.
+    std::optional<bool> highContrast;
     /// A link of the application, "qelvar://DashboardTab"; empty: none.
     QString openLink;
     /// The store's folder; empty: QVStoreFolder(demo). It also holds the local user defaults.

@@ -14,7 +14,7 @@ FocusScope {
     LayoutMirroring.enabled: app.rightToLeft
     LayoutMirroring.childrenInherit: true
 
-    Component.onCompleted: SystemStyle.tint = app.keyColor
+    Component.onCompleted: SystemStyle.keyColor = app.keyColor
     Binding {
         target: SystemStyle
         property: "pixel"

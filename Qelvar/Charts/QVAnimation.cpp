@@ -2,6 +2,8 @@
 
 #include <algorithm>
 
+#include "Platform/Appearance.h"
+
 namespace {
 
 double eased(double progress, QVAnimationCurve curve) {
@@ -25,7 +27,7 @@ void QVAnimatedNumber::set(double value) {
 
 void QVAnimatedNumber::animateTo(double target, QVAnimationTime start, QVAnimationTime duration,
                                  QVAnimationCurve curve) {
-    if (duration <= QVAnimationTime::zero()) {
+    if (duration <= QVAnimationTime::zero() || platform::reducedMotion()) {
         set(target);
         return;
     }

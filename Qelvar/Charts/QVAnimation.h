@@ -15,7 +15,8 @@ class QVAnimatedNumber {
     double target() const { return to_; }
     bool isAnimating() const { return animating_; }
     void set(double value);
-    /// Starts from where the number is now. A duration of 0 is set().
+    /// Starts from where the number is now. A duration of 0 is set(), and
+    /// so is any for a person who wants less motion.
     void animateTo(double target, QVAnimationTime start, QVAnimationTime duration, QVAnimationCurve curve);
     /// Moves the number to where it is at that time. Returns whether it is still on its way.
     bool advance(QVAnimationTime now);

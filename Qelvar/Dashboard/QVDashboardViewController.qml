@@ -72,8 +72,8 @@ FocusScope {
 
         // Cards make room for the one that is dragged.
         Transition { id: makeRoom; NumberAnimation { property: "y"; duration: 250; easing.type: Easing.InOutQuad } }
-        moveDisplaced: screen.dragging ? makeRoom : null
-        move: screen.dragging ? makeRoom : null
+        moveDisplaced: screen.dragging && SystemStyle.animated ? makeRoom : null
+        move: screen.dragging && SystemStyle.animated ? makeRoom : null
 
         // Only the keyboard moves the list to the current card: a card inserted above it, or a finger on one that is half
         // in sight, must not.
