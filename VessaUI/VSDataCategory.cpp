@@ -3,6 +3,7 @@
 #include <QLinearGradient>
 #include <QPainter>
 
+#include "Platform/Appearance.h"
 #include "Platform/Localization.h"
 
 namespace {
@@ -13,22 +14,27 @@ struct CategoryRow {
     int id;
     const char* nameKey;
     const char* icon;
-    QRgb top, bottom;
+    QRgb top, bottom, highContrast;
 };
 
-// Cards are written on in white: on every gradient white has a contrast of at least 4.5:1 at its lighter
-// end. The darker end stays near it: bars are overlaid on it, and an overlay lightens a dark colour little.
+// What a card shows is made of the card's colour c (channels from 0 to 1): soft texts are c + 0.5, bars half
+// c and half the overlay of white on c, which is min(2c, 1). Of the colours on which soft texts have a
+// contrast of 4.5 (WCAG 2.1: relative luminances, see CardContrastTests) these are such that bars stand out
+// the most that the hue allows, 1.8 to 2.0: at most half of full light in the main channels, since an overlay
+// adds little beyond that. With high contrast cards have one colour, with a luminance of 0.055: white has 10
+// on it, and a fill can be 3 from both.
 constexpr CategoryRow categoryRows[] = {
     {VSCategoryID::BodyMeasurements, "DATA_CATEGORY_BODY_MEASUREMENTS", "category_body_measurements",
-     0xFF96650A, 0xFF855708},
-    {VSCategoryID::Fitness, "DATA_CATEGORY_FITNESS", "category_fitness", 0xFFC4460D, 0xFFAE3C0C},
-    {VSCategoryID::Vitals, "DATA_CATEGORY_VITALS", "category_vitals", 0xFFCB2149, 0xFFB31A41},
-    {VSCategoryID::Nutrition, "DATA_CATEGORY_NUTRITION", "category_nutrition", 0xFF3B7F1D, 0xFF316F17},
-    {VSCategoryID::Results, "DATA_CATEGORY_RESULTS", "category_results", 0xFF8A45C4, 0xFF763AAE},
-    {VSCategoryID::Sleep, "DATA_CATEGORY_SLEEP", "category_sleep", 0xFF4A5BC8, 0xFF3D4BAF},
+     0xFF805D04, 0xFF755E08, 0xFF543F04},
+    {VSCategoryID::Fitness, "DATA_CATEGORY_FITNESS", "category_fitness", 0xFF844A16, 0xFF83411B, 0xFF663612},
+    {VSCategoryID::Vitals, "DATA_CATEGORY_VITALS", "category_vitals", 0xFF833A48, 0xFF823854, 0xFF6B2F40},
+    {VSCategoryID::Nutrition, "DATA_CATEGORY_NUTRITION", "category_nutrition", 0xFF3E6D10, 0xFF2A6B12,
+     0xFF244B0C},
+    {VSCategoryID::Results, "DATA_CATEGORY_RESULTS", "category_results", 0xFF6A4DA0, 0xFF744A9C, 0xFF4F3670},
+    {VSCategoryID::Sleep, "DATA_CATEGORY_SLEEP", "category_sleep", 0xFF405B9E, 0xFF4A57A0, 0xFF314072},
     {VSCategoryID::ReproductiveHealth, "DATA_CATEGORY_REPRODUCTIVE_HEALTH", "category_reproductive_health",
-     0xFFB32D96, 0xFF9B2482},
-    {VSCategoryID::Me, "DATA_CATEGORY_ME", "category_me", 0xFF4B7080, 0xFF3F606F},
+     0xFF82367A, 0xFF82346C, 0xFF692B5D},
+    {VSCategoryID::Me, "DATA_CATEGORY_ME", "category_me", 0xFF326A78, 0xFF3C6680, 0xFF254754},
 };
 
 }  // namespace
@@ -44,8 +50,8 @@ QImage VSDataCategory::roundedGradient(QSizeF size, double scale) const {
     QPainter painter(&image);
     painter.setRenderHint(QPainter::Antialiasing);
     QLinearGradient gradient(0, 0, 0, size.height());
-    gradient.setColorAt(0, top_);
-    gradient.setColorAt(1, bottom_);
+    gradient.setColorAt(0, platform::highContrast() ? highContrast_ : top_);
+    gradient.setColorAt(1, platform::highContrast() ? highContrast_ : bottom_);
     painter.setPen(Qt::NoPen);
     painter.setBrush(gradient);
     painter.drawRoundedRect(QRectF(QPointF(0, 0), size), cornerRadius, cornerRadius);
@@ -65,6 +71,7 @@ VSDataCategoryController::VSDataCategoryController() {
         category.icon_ = row.icon;
         category.top_ = QColor::fromRgb(row.top);
         category.bottom_ = QColor::fromRgb(row.bottom);
+        category.highContrast_ = QColor::fromRgb(row.highContrast);
         categories_.push_back(category);
     }
 }

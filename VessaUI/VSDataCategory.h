@@ -22,7 +22,8 @@ class VSDataCategory {
     QColor gradientTopColor() const { return top_; }
     QColor gradientBottomColor() const { return bottom_; }
     QString listIcon() const { return QString::fromLatin1(icon_); }
-    /// A rectangle with rounded corners (radius 8 points) filled with the gradient, top to bottom.
+    /// A rectangle with rounded corners (radius 8 points) filled with the gradient, top to bottom;
+    /// for a person who wants high contrast with one darker colour.
     QImage roundedGradient(QSizeF size, double scale) const;
 
  private:
@@ -30,7 +31,7 @@ class VSDataCategory {
     int id_ = 0;
     const char* nameKey_ = "";
     const char* icon_ = "";
-    QColor top_, bottom_;
+    QColor top_, bottom_, highContrast_;
 };
 
 class VSDataCategoryController {

@@ -20,10 +20,23 @@ void QVBarSeries::prepareForRendering(QSizeF size, std::optional<VSDate> minXVal
 }
 
 void QVBarSeries::renderFill(QPainter& painter) const {
-    const double base = imageSize().height() - bottomPadding_;
+    const double base = imageSize().height() - bottomPadding_, width = widthHeldApart(barWidth_);
     QVPaintLayer(painter, imageSize(), fillColor_.alphaF(), [&](QPainter& layer) {
         for (const QPointF& point : dataPoints_)
-            QVFillSegment(layer, {point.x(), base}, {point.x(), std::min(point.y(), base)}, barWidth_,
+            QVFillSegment(layer, {point.x(), base}, {point.x(), std::min(point.y(), base)}, width,
                           lineCapStyle_, QVOpaque(fillColor_));
     });
+}
+
+void QVBarSeries::renderChart(QPainter& painter) const {
+    if (!edgeColor().isValid()) return;
+    const double base = imageSize().height() - bottomPadding_, width = widthHeldApart(barWidth_);
+    std::vector<QRectF> outlines;
+    for (const QPointF& point : dataPoints_)
+        outlines.push_back(QVSegmentOutline(painter, {point.x(), base},
+                                            {point.x(), std::min(point.y(), base)}, width, lineCapStyle_));
+    if (lineCapStyle_ == QVLineCapStyle::Round)
+        QVDrawEdges(painter, imageSize(), outlines, edgeColor());
+    else
+        QVDrawSideEdges(painter, outlines, edgeColor());
 }

@@ -23,6 +23,7 @@ class QVBarSeries : public QVChartSeries {
                              const QVEdgeInsets& insets,
                              std::shared_ptr<const QVChartDataSet> dataSet) override;
     void renderFill(QPainter& painter) const override;
+    void renderChart(QPainter& painter) const override;
     bool drawsSecondaryFill() const override { return false; }
 
  protected:

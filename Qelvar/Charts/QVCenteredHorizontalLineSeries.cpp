@@ -20,17 +20,24 @@ void QVCenteredHorizontalLineSeries::renderFill(QPainter& painter) const {
     const std::vector<QPointF> points = pointsOfValue(0);
     QVPaintLayer(painter, imageSize(), fillColor_.alphaF(), [&](QPainter& layer) {
         for (size_t i = 0; i + 1 < points.size(); i += 2)
-            QVFillSegment(layer, points[i], points[i + 1], lineWidth_, QVLineCapStyle::Round,
+            QVFillSegment(layer, points[i], points[i + 1], widthHeldApart(lineWidth_), QVLineCapStyle::Round,
                           QVOpaque(fillColor_));
     });
 }
 
 void QVCenteredHorizontalLineSeries::renderChart(QPainter& painter) const {
+    const double width = widthHeldApart(lineWidth_);
+    const std::vector<QPointF> ends = pointsOfValue(0), accents = pointsOfValue(1);
+    if (edgeColor().isValid()) {
+        std::vector<QRectF> outlines;
+        for (size_t i = 0; i + 1 < ends.size(); i += 2)
+            outlines.push_back(QVSegmentOutline(painter, ends[i], ends[i + 1], width, QVLineCapStyle::Round));
+        QVDrawEdges(painter, imageSize(), outlines, edgeColor());
+    }
     if (!accentColor_.isValid()) return;
-    const std::vector<QPointF> points = pointsOfValue(1);
     QVPaintLayer(painter, imageSize(), accentColor_.alphaF(), [&](QPainter& layer) {
-        for (const QPointF& point : points)
-            QVFillSegment(layer, point, point, lineWidth_, QVLineCapStyle::Round, QVOpaque(accentColor_));
-        QVEraseCircles(layer, points, lineWidth_ / 4);
+        for (const QPointF& point : accents)
+            QVFillSegment(layer, point, point, width, QVLineCapStyle::Round, QVOpaque(accentColor_));
+        QVEraseCircles(layer, accents, width / 4);
     });
 }

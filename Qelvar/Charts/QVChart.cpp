@@ -34,7 +34,20 @@ QVChart::~QVChart() {
 
 void QVChart::setChartRenderer(std::shared_ptr<QVChartRenderer> renderer) {
     renderer_ = std::move(renderer);
+    if (renderer_)
+        renderer_->setLabelRoom([self = std::weak_ptr(self_)](const QVChartRenderer& asking) {
+            const auto alive = self.lock();
+            return alive ? (*alive)->roomForRange(asking) : 0;
+        });
     refreshView();
+}
+
+double QVChart::roomForRange(const QVChartRenderer& renderer) const {
+    if (!backgroundView_) return 0;
+    const double width = backgroundView_->labelWidth({renderer.minYValue(), renderer.maxYValue(),
+                                                      renderer.maxYValueInData(), renderer.decimalPrecision(),
+                                                      renderer.dataUnit(), renderer.unitController()});
+    return width > 0 ? dividerInset_ + width : 0;
 }
 
 void QVChart::setXAxisDescriptor(std::shared_ptr<QVAxisDescriptor> descriptor) {
@@ -108,6 +121,7 @@ void QVChart::layout() {
     layoutBackgroundView();
     if (renderedRectangle_ != chartRectangle()) renderChart(false);
     layoutAxisLabels();
+    if (renderer_) laidOutInsets_ = renderer_->chartInsets();
 }
 
 void QVChart::layoutBackgroundView() {
@@ -180,7 +194,9 @@ void QVChart::showImage(ImageLayer& layer, const QImage& image, bool animated) {
 }
 
 void QVChart::updateBackgroundView(bool animated) {
-    if (!backgroundView_ || !renderer_) return;
+    if (!renderer_) return;
+    if (renderer_->chartInsets() != laidOutInsets_) needsLayout_ = true;  // the dates have moved
+    if (!backgroundView_) return;
     const bool hasImages = !renderer_->chartImage().isNull() || !renderer_->chartFillImage().isNull() ||
                            !renderer_->chartSecondaryFillImage().isNull();
     backgroundView_->setChartInsets(renderer_->chartInsets());
@@ -265,7 +281,7 @@ void QVChart::paintLayer(QPainter& painter, const ImageLayer& layer) const {
 
 void QVChart::paintDividers(QPainter& painter) const {
     painter.save();
-    painter.setCompositionMode(QPainter::CompositionMode_Overlay);
+    painter.setCompositionMode(dividerFilter_);
     painter.fillRect(topDividerFrame(), Qt::white);
     painter.fillRect(bottomDividerFrame(), Qt::white);
     painter.restore();

@@ -63,6 +63,7 @@ class QVChart {
     void setChartSecondaryFillCompositingFilter(QPainter::CompositionMode mode) {
         secondaryFillLayer_.filter = mode;
     }
+    void setDividerCompositingFilter(QPainter::CompositionMode mode) { dividerFilter_ = mode; }
 
     // Size, painting and time: for the owner.
 
@@ -123,6 +124,7 @@ class QVChart {
     void showImage(ImageLayer& layer, const QImage& image, bool animated);
     static bool advanceLayer(ImageLayer& layer, QVAnimationTime now);
     void updateBackgroundView(bool animated);
+    double roomForRange(const QVChartRenderer& renderer) const;
     void layoutBackgroundView();
 
     void layoutAxisLabels();
@@ -149,6 +151,7 @@ class QVChart {
     AnimationStyle animationStyle_ = AnimationStyle::None;
     QVAnimationTime animationDuration_{500'000};
     bool shouldAnimateAxisChanges_ = true;
+    QPainter::CompositionMode dividerFilter_ = QPainter::CompositionMode_Overlay;
     ImageLayer secondaryFillLayer_, fillLayer_, chartLayer_;
     std::vector<AxisLabelView> axisLabels_;
     std::vector<AxisLabelView> leavingAxisLabels_;
@@ -156,6 +159,7 @@ class QVChart {
     QSizeF size_;
     double screenScale_ = 1;
     QRectF renderedRectangle_;
+    QVEdgeInsets laidOutInsets_;  // in which the axis labels stand
     bool needsLayout_ = true;
     bool painting_ = false;
     bool animating_ = false;

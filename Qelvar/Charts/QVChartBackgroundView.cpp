@@ -13,6 +13,10 @@ void QVChartBackgroundView::setValues(std::optional<double> minValue, std::optio
     unitController_ = unitController;
 }
 
+double QVChartBackgroundView::labelWidth(const Range&) const {
+    return 0;
+}
+
 void QVChartBackgroundView::layout(QSizeF size, double scale) {
     size_ = size;
     scale_ = scale;

@@ -37,6 +37,19 @@ class QVChartBackgroundView {
     bool showNoDataLabel() const { return showNoDataLabel_; }
     virtual void setShowNoDataLabel(bool show) { showNoDataLabel_ = show; }
 
+    /// How wide the labels of a range would be, in points from the right edge of the view; 0: there are none.
+    /// The range is not taken over.
+    struct Range {
+        std::optional<double> minimum, maximum, maximumInData;
+        int decimalPrecision = 0;
+        const VSDataUnit* dataUnit = nullptr;
+        VSUnitController* unitController = nullptr;
+    };
+    virtual double labelWidth(const Range& range) const;
+    Range range() const {
+        return {minValue_, maxValue_, maxDataValue_, decimalPrecision_, dataUnit_, unitController_};
+    }
+
     /// Lays out in a rectangle of that size, at `scale` pixels a point.
     virtual void layout(QSizeF size, double scale);
     /// What has changed since the last call moves there in that time (0: at once).

@@ -19,10 +19,19 @@ QImage QVTransparentImage(QSizeF size, double scale);
 void QVPaintLayer(QPainter& painter, QSizeF imageSize, double opacity,
                   const std::function<void(QPainter&)>& draw);
 
-/// Fills the outline of a horizontal or vertical stroke from a to b. One of no length with a round cap is a
-/// dot.
+/// The outline of a horizontal or vertical stroke from a to b, which lies on whole pixels of the painter:
+/// what is one pixel wide along it is as bright at every place.
+QRectF QVSegmentOutline(const QPainter& painter, QPointF a, QPointF b, double width, QVLineCapStyle cap);
+
+/// Fills that outline. One of no length with a round cap is a dot.
 void QVFillSegment(QPainter& painter, QPointF a, QPointF b, double width, QVLineCapStyle cap,
                    const QColor& color);
+
+/// Draws a hairline along the inside of rounded outlines, or of what they are together where they overlap.
+void QVDrawEdges(QPainter& painter, QSizeF imageSize, const std::vector<QRectF>& outlines,
+                 const QColor& color);
+/// Draws it along the left and right side of each outline.
+void QVDrawSideEdges(QPainter& painter, const std::vector<QRectF>& outlines, const QColor& color);
 
 /// Clears circles, so that nothing drawn before shows inside them.
 void QVEraseCircles(QPainter& painter, const std::vector<QPointF>& centers, double radius);

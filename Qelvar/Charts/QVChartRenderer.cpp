@@ -7,6 +7,13 @@
 
 #include "Qelvar/Charts/QVChartDrawing.h"
 
+namespace {
+
+/// Between what is drawn last and a label, in points: a marker at the very edge has room in it.
+constexpr double kAirBeforeLabels = 6;
+
+}  // namespace
+
 struct QVChartRenderer::Images {
     QImage chart, fill, secondaryFill;
 };
@@ -109,7 +116,25 @@ void QVChartRenderer::reload() {
     dataGroup_->reloadData();
     minYValue_ = maxYValue_ = maxYValueInData_ = std::nullopt;
     decimalPrecision_ = 0;
-    if (const auto source = dataSource_.lock()) adjustVerticalRange(*source);
+    if (const auto source = dataSource_.lock()) {
+        adjustVerticalRange(*source);
+        measureLabels(*source);
+    }
+}
+
+void QVChartRenderer::measureLabels(QVChartRendererDataSource& source) {
+    labelRoom_ = askLabelRoom_ ? askLabelRoom_(*this) : 0;
+    const size_t count = source.numberOfSeriesInChartRenderer(*this);
+    for (size_t i = 0; i < count; ++i)
+        if (const auto series = source.seriesAtIndex(*this, i))
+            labelRoom_ = std::max(labelRoom_, series->labelRoom());
+    if (labelRoom_ > 0) labelRoom_ += kAirBeforeLabels;
+}
+
+QVEdgeInsets QVChartRenderer::chartInsets() const {
+    QVEdgeInsets insets = chartInsets_;
+    insets.right = std::max(insets.right, labelRoom_);
+    return insets;
 }
 
 void QVChartRenderer::adjustVerticalRange(QVChartRendererDataSource& source) {
@@ -129,7 +154,7 @@ void QVChartRenderer::adjustVerticalRange(QVChartRendererDataSource& source) {
 void QVChartRenderer::capture(Operation& operation) const {
     operation.dataGroup = dataGroup_->copy();
     operation.hasAverage = operation.dataGroup->averageYValue().has_value();
-    operation.insets = chartInsets_ + operation.renderInsets;
+    operation.insets = chartInsets() + operation.renderInsets;
     operation.minXValue = minXValue_;
     operation.maxXValue = maxXValue_;
     operation.minYValue = minYValue_;

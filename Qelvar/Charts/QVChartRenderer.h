@@ -48,8 +48,13 @@ class QVChartRenderer final : public QVChartDataGroupDataSource,
     void setMinXValue(std::optional<VSDate> date) { minXValue_ = date; }
     std::optional<VSDate> maxXValue() const { return maxXValue_; }
     void setMaxXValue(std::optional<VSDate> date) { maxXValue_ = date; }
-    const QVEdgeInsets& chartInsets() const { return chartInsets_; }
+    /// The margins of the plot: those that were set, with as much more at the right as the labels there need.
+    QVEdgeInsets chartInsets() const;
     void setChartInsets(const QVEdgeInsets& insets) { chartInsets_ = insets; }
+    /// Says how much of the image, from its right edge, labels of the vertical range need; asked on the
+    /// client queue when the range is known and before anything is drawn in it. None: they need nothing.
+    using LabelRoom = std::function<double(const QVChartRenderer&)>;
+    void setLabelRoom(LabelRoom labelRoom) { askLabelRoom_ = std::move(labelRoom); }
     /// The adjusted vertical range; none without data.
     std::optional<double> minYValue() const { return minYValue_; }
     std::optional<double> maxYValue() const { return maxYValue_; }
@@ -82,6 +87,7 @@ class QVChartRenderer final : public QVChartDataGroupDataSource,
                              std::weak_ptr<QVChartRendererDataSource> dataSource);
     void reload();
     void adjustVerticalRange(QVChartRendererDataSource& source);
+    void measureLabels(QVChartRendererDataSource& source);
     void capture(Operation& operation) const;
     void start(std::shared_ptr<Operation> operation);
     void finish(const Operation& operation, const std::optional<Images>& images);
@@ -91,6 +97,8 @@ class QVChartRenderer final : public QVChartDataGroupDataSource,
     const std::shared_ptr<QVChartDataGroup> dataGroup_;
     std::optional<VSDate> minXValue_, maxXValue_;
     QVEdgeInsets chartInsets_;
+    LabelRoom askLabelRoom_;
+    double labelRoom_ = 0;
     std::optional<double> minYValue_, maxYValue_, maxYValueInData_;
     int decimalPrecision_ = 0;
     QVChartDataState dataState_ = QVChartDataState::NotRendered;

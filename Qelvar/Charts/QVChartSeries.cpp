@@ -5,6 +5,13 @@
 
 #include "Qelvar/Models/Data/QVChartDataSet.h"
 
+namespace {
+
+/// So much of the way from one point to the next is drawn on at most.
+constexpr double kDrawnShare = 0.8;
+
+}  // namespace
+
 std::unique_ptr<QVChartSeries> QVChartSeries::copy() const {
     auto result = clone();
     result->discardPreparation();
@@ -67,6 +74,17 @@ double QVChartSeries::yForValue(std::optional<double> value) const {
 QPointF QVChartSeries::pointFromChartPoint(const QVChartPoint& point) const {
     const std::vector<double> values = point.allYValues();
     return {xForChartPoint(point), yForValue(values.empty() ? std::nullopt : std::optional(values.back()))};
+}
+
+double QVChartSeries::widthHeldApart(double width) const {
+    if (!pointInterval_ || !minXValue_ || !maxXValue_ || *minXValue_ >= *maxXValue_) return width;
+    return widthHeldApart(width, renderSize().width() * VSSecondsFromDuration(*pointInterval_) /
+                                     VSSecondsFromDuration(*maxXValue_ - *minXValue_));
+}
+
+double QVChartSeries::widthHeldApart(double width, double pitch) {
+    // Points stand on whole points of the image: some are nearer to each other than the mean.
+    return std::min(width, kDrawnShare * (pitch > 1 ? std::floor(pitch) : pitch));
 }
 
 bool QVChartSeries::yValueIsClamped(std::optional<double> value) const {

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <QColor>
 #include <QPainter>
 #include <QPointF>
 #include <QSizeF>
@@ -42,6 +43,17 @@ class QVChartSeries {
     virtual bool drawsSecondaryFill() const { return true; }
     virtual void selectedPointIndexesUpdated(const std::vector<size_t>& indexes);
 
+    /// The time between one point and the next; none: not known. What is drawn for a point is at most 0.8 of
+    /// that wide, so that neighbours stay apart however narrow the plot is.
+    std::optional<VSDuration> pointInterval() const { return pointInterval_; }
+    void setPointInterval(std::optional<VSDuration> interval) { pointInterval_ = interval; }
+    /// Of a hairline along the inside of what is filled; invalid: none. A series that fills nothing with
+    /// sides of its own (a line) draws none.
+    const QColor& edgeColor() const { return edgeColor_; }
+    void setEdgeColor(const QColor& color) { edgeColor_ = color; }
+    /// What the series' own labels at the right need of the image, in points.
+    virtual double labelRoom() const { return 0; }
+
     QSizeF imageSize() const { return imageSize_; }
     const QVEdgeInsets& insets() const { return insets_; }
     /// The size of the plot area: the image less the insets.
@@ -70,12 +82,19 @@ class QVChartSeries {
     QVChartSeries() = default;
     QVChartSeries(const QVChartSeries&) = default;
     virtual std::unique_ptr<QVChartSeries> clone() const = 0;
+    /// How wide, in points, something drawn for one point may be when it would like to be `width`. Once
+    /// prepared.
+    double widthHeldApart(double width) const;
+    /// The same where points are `pitch` points apart.
+    static double widthHeldApart(double width, double pitch);
     /// Forgets what prepareForRendering() computed and took.
     virtual void discardPreparation();
 
     std::vector<QPointF> dataPoints_;
 
  private:
+    std::optional<VSDuration> pointInterval_;
+    QColor edgeColor_;
     QSizeF imageSize_;
     QVEdgeInsets insets_;
     std::optional<VSDate> minXValue_, maxXValue_;

@@ -6,6 +6,7 @@
 
 #include "Platform/Localization.h"
 #include "Platform/StyledText.h"
+#include "Platform/TextScale.h"
 #include "Qelvar/Charts/QVChartDrawing.h"
 #include "Qelvar/Formatters/QVNumberFormatters.h"
 
@@ -13,6 +14,10 @@ namespace {
 
 constexpr double kDotLength = 2;
 constexpr double kDotPeriod = 3;
+/// Between the line and the dividers above and below.
+constexpr double kDividerGap = 2;
+/// Of the width, for the labels.
+constexpr double kLargestLabelShare = 0.25;
 
 /// What is on its way to the same target goes on undisturbed.
 void move(QVAnimatedNumber& number, double target, QVAnimationTime now, QVAnimationTime duration) {
@@ -53,8 +58,7 @@ QVDottedAverageBackgroundView::QVDottedAverageBackgroundView() : noDataLabelFont
 }
 
 void QVDottedAverageBackgroundView::setLabelFont(const QFont& font) {
-    labelFont_ = font;
-    labelHeight_ = textHeight(font);
+    labelFont_ = shownLabelFont_ = font;
 }
 
 void QVDottedAverageBackgroundView::setValues(std::optional<double> minValue, std::optional<double> maxValue,
@@ -87,21 +91,49 @@ void QVDottedAverageBackgroundView::updateVisibility() {
                       (!minValue() || *average >= *minValue()) && (!maxValue() || *average <= *maxValue());
 }
 
-QString QVDottedAverageBackgroundView::boundText(double value, bool clampToDisplayRange) const {
-    const auto digits = QVNumberFormatterWithFractionDigits(decimalPrecision());
+QString QVDottedAverageBackgroundView::boundText(double value, bool clampToDisplayRange,
+                                                 const Range& range) const {
+    const auto digits = QVNumberFormatterWithFractionDigits(range.decimalPrecision);
     if (boundFormatter_) return boundFormatter_(value, *digits);
-    if (!dataUnit() || !unitController()) return digits->stringFromNumber(value);
-    const auto own =
-        qv_numberFormatterForUnit(dataUnit()->dataType(), unitController()->unitForDataUnit(dataUnit()));
+    if (!range.dataUnit || !range.unitController) return digits->stringFromNumber(value);
+    const auto own = qv_numberFormatterForUnit(range.dataUnit->dataType(),
+                                               range.unitController->unitForDataUnit(range.dataUnit));
     const VSNumberFormatter* formatter = own ? own.get() : digits.get();
-    return QVStringFromNumberInDisplayRange(value, dataUnit(), *unitController(), clampToDisplayRange,
+    return QVStringFromNumberInDisplayRange(value, range.dataUnit, *range.unitController, clampToDisplayRange,
                                             formatter);
 }
 
+QVDottedAverageBackgroundView::Texts QVDottedAverageBackgroundView::texts(const Range& range) const {
+    const std::optional<double> maximum =
+        std::max(range.maximum, range.maximumInData);  // none is less than any
+    return {range.minimum ? boundText(*range.minimum, false, range) : QString(),
+            maximum ? boundText(*maximum, true, range) : QString()};
+}
+
 void QVDottedAverageBackgroundView::updateTexts() {
-    minimumText_ = minValue() ? boundText(*minValue(), false) : QString();
-    const std::optional<double> maximum = std::max(maxValue(), maxDataValue());  // none is less than any
-    maximumText_ = maximum ? boundText(*maximum, true) : QString();
+    auto [minimum, maximum] = texts(range());
+    minimumText_ = std::move(minimum);
+    maximumText_ = std::move(maximum);
+}
+
+/// Larger texts shrink, though not below the normal size, before they take most of the plot's width.
+QFont QVDottedAverageBackgroundView::fittingLabelFont(const Texts& texts) const {
+    QFont font = labelFont_;
+    const auto widest = [&] {
+        const QFontMetricsF metrics(font);
+        return std::max(metrics.horizontalAdvance(texts.minimum), metrics.horizontalAdvance(texts.maximum));
+    };
+    const int smallest = static_cast<int>(std::ceil(labelFont_.pixelSize() / platform::textScale()));
+    while (font.pixelSize() > smallest && widest() > kLargestLabelShare * size().width())
+        font.setPixelSize(font.pixelSize() - 1);
+    return font;
+}
+
+double QVDottedAverageBackgroundView::labelWidth(const Range& range) const {
+    if (hideMinMaxLabels() || (!range.minimum && !range.maximum)) return 0;
+    const Texts shown = texts(range);
+    const QFontMetricsF metrics(fittingLabelFont(shown));
+    return std::max(metrics.horizontalAdvance(shown.minimum), metrics.horizontalAdvance(shown.maximum));
 }
 
 void QVDottedAverageBackgroundView::layout(QSizeF size, double scale) {
@@ -115,8 +147,9 @@ void QVDottedAverageBackgroundView::layoutLabels() {
     const double pixel = 1 / scale();
     const auto downToPixel = [this](double value) { return std::floor(value * scale()) / scale(); };
     const auto upToPixel = [this](double value) { return std::ceil(value * scale()) / scale(); };
-    const QFontMetricsF metrics(labelFont_);
-    const double height = upToPixel(std::max(metrics.height(), labelHeight_));
+    shownLabelFont_ = fittingLabelFont({minimumText_, maximumText_});
+    const QFontMetricsF metrics(shownLabelFont_);
+    const double height = upToPixel(std::max(metrics.height(), textHeight(shownLabelFont_)));
     const auto frame = [&](const QString& text, double y) {
         const double width = upToPixel(metrics.horizontalAdvance(text));
         return QRectF(downToPixel(size().width() - width + pixel), downToPixel(y), width, height);
@@ -143,7 +176,10 @@ void QVDottedAverageBackgroundView::layoutAverageLine() {
         position = (*maxValue() - *averageValue()) / (*maxValue() - *minValue());
     if (!std::isfinite(position)) position = 0.5;
     const double height = size().height() - chartInsets().top - chartInsets().bottom;
-    const double y = std::round((chartInsets().top + position * height) * scale()) / scale();
+    const double wanted = std::round((chartInsets().top + position * height) * scale()) / scale();
+    // An average at a bound is told beside the divider that stands there, not on it.
+    const double lowest = std::max(kDividerGap, size().height() - kDividerGap - pixel);
+    const double y = std::clamp(wanted, kDividerGap, lowest);
 
     averageFrame_ = QRectF(0, y, size().width(), pixel);
     if (!labelsVisible_) return;
@@ -182,7 +218,7 @@ void QVDottedAverageBackgroundView::paint(QPainter& painter) const {
                 averageLineColor_);
         painter.restore();
     }
-    const LabelPaint labels{labelFont_, labelColor_, labelFilter_, labelOpacity_.value()};
+    const LabelPaint labels{shownLabelFont_, labelColor_, labelFilter_, labelOpacity_.value()};
     paintText(painter, maximumFrame_, maximumText_, labels);
     paintText(painter, minimumFrame_, minimumText_, labels);
     paintText(painter, noDataFrame_, noDataText_,

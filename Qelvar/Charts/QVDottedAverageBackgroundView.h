@@ -42,6 +42,7 @@ class QVDottedAverageBackgroundView : public QVChartBackgroundView {
                    VSUnitController* unitController) override;
     void setHideAverageLine(bool hide) override;
     void setHideMinMaxLabels(bool hide) override;
+    double labelWidth(const Range& range) const override;
     void layout(QSizeF size, double scale) override;
     void commitChanges(QVAnimationTime now, QVAnimationTime duration) override;
     bool advance(QVAnimationTime now) override;
@@ -63,11 +64,15 @@ class QVDottedAverageBackgroundView : public QVChartBackgroundView {
     void updateTexts();
     void layoutLabels();
     void layoutAverageLine();
-    QString boundText(double value, bool clampToDisplayRange) const;
+    struct Texts {
+        QString minimum, maximum;
+    };
+    Texts texts(const Range& range) const;
+    QString boundText(double value, bool clampToDisplayRange, const Range& range) const;
+    QFont fittingLabelFont(const Texts& texts) const;
 
     double labelPadding_ = 2.0;
-    QFont labelFont_;
-    double labelHeight_ = 0;
+    QFont labelFont_, shownLabelFont_;
     QColor labelColor_ = Qt::white;
     QColor averageLineColor_ = Qt::white;
     QFont noDataLabelFont_, shownNoDataFont_;

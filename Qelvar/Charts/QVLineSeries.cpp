@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <limits>
 
 #include "Qelvar/Charts/QVChartDrawing.h"
 #include "Qelvar/Models/Data/QVChartDataSet.h"
@@ -10,6 +11,8 @@ namespace {
 
 constexpr double kDashOn = 3;
 constexpr double kDashOff = 5;
+/// A smaller marker is not seen.
+constexpr double kSmallestRadius = 1;
 
 bool hasYValue(const QVChartPoint& point) {
     return !point.allYValues().empty();
@@ -54,6 +57,17 @@ void QVLineSeries::prepareForRendering(QSizeF size, std::optional<VSDate> minXVa
         if (std::isfinite(point.y())) dataPoints_.push_back(point);
     }
     regions_ = findRegions();
+    radius_ = heldApartRadius();
+}
+
+/// Readings stand where they were taken: only their nearest neighbours say how much room a marker has.
+double QVLineSeries::heldApartRadius() const {
+    double pitch = std::numeric_limits<double>::infinity();
+    for (size_t i = 1; i < dataPoints_.size(); ++i) {
+        const double way = std::abs(dataPoints_[i].x() - dataPoints_[i - 1].x());
+        if (way > 0) pitch = std::min(pitch, way);
+    }
+    return std::max(std::min(pointRadius_, kSmallestRadius), widthHeldApart(2 * pointRadius_, pitch) / 2);
 }
 
 void QVLineSeries::discardPreparation() {
@@ -122,12 +136,13 @@ void QVLineSeries::renderChart(QPainter& painter) const {
         QVPaintLayer(painter, imageSize(), lineColor_.alphaF(), [this](QPainter& layer) {
             strokeLine(layer, regions_.connected, false);
             strokeLine(layer, regions_.gaps, true);
-            QVEraseCircles(layer, dataPoints_, pointRadius_);
+            QVEraseCircles(layer, dataPoints_, radius_);
         });
     }
     if (pointStyle_ == QVPointStyle::None || dataPoints_.empty()) return;
     const QImage marker = QVChartSeriesPointMarker::chartPointWithColor(
-        pointColor_, pointRadius_, pointLineWidth_, pointStyle_, painter.device()->devicePixelRatio());
+        pointColor_, radius_, std::min(pointLineWidth_, radius_ / 2), pointStyle_,
+        painter.device()->devicePixelRatio());
     for (const QPointF& point : dataPoints_) QVDrawCentered(painter, marker, point);
 }
 
@@ -168,7 +183,7 @@ void QVLineSeries::renderGradient(QPainter& painter, const QVGradientObject& gra
             fillBeneath(layer, region, brush);
             layer.restore();
         }
-        QVEraseCircles(layer, dataPoints_, pointRadius_);
+        QVEraseCircles(layer, dataPoints_, radius_);
     });
 }
 

@@ -63,6 +63,7 @@ class QVLineSeries : public QVChartSeries {
     QPainterPath wavePath() const;
     void fillBeneath(QPainter& layer, const QRectF& region, const QBrush& brush) const;
     Regions findRegions() const;
+    double heldApartRadius() const;
     bool drawsGradient(const QVGradientObject& gradient, const std::vector<QRectF>& regions) const;
     void renderGradient(QPainter& painter, const QVGradientObject& gradient,
                         const std::vector<QRectF>& regions) const;
@@ -79,5 +80,6 @@ class QVLineSeries : public QVChartSeries {
     double pointLineWidth_ = 1.0;
     double sineWaveSmoothingFactor_ = 0.5;
 
-    Regions regions_;  // prepared
+    Regions regions_;    // prepared
+    double radius_ = 0;  // prepared: as much of the one wanted as there is room for
 };

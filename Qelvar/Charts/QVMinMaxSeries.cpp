@@ -1,5 +1,6 @@
 #include "Qelvar/Charts/QVMinMaxSeries.h"
 
+#include <algorithm>
 #include <cmath>
 
 #include "Qelvar/Charts/QVChartDrawing.h"
@@ -22,6 +23,7 @@ void QVMinMaxSeries::prepareForRendering(QSizeF size, std::optional<VSDate> minX
                                          std::shared_ptr<const QVChartDataSet> dataSet) {
     QVChartSeries::prepareForRendering(size, minXValue, maxXValue, minYValue, maxYValue, insets,
                                        std::move(dataSet));
+    radius_ = widthHeldApart(2 * pointRadius_) / 2;
     chartPoints_.clear();
     for (const auto& chartPoint : this->dataSet()->allDataPoints()) {
         const std::optional<double> min = chartPoint->yValueForKey("min");
@@ -40,7 +42,7 @@ void QVMinMaxSeries::discardPreparation() {
 }
 
 bool QVMinMaxSeries::isCenterPoint(const ChartPoint& point) const {
-    return std::abs(point.absoluteMaxPoint.y() - point.absoluteMinPoint.y()) < 2 * pointRadius_;
+    return std::abs(point.absoluteMaxPoint.y() - point.absoluteMinPoint.y()) < 2 * radius_;
 }
 
 namespace {
@@ -65,7 +67,7 @@ void QVMinMaxSeries::eraseMarkerShapes(QPainter& layer) const {
     std::vector<QPolygonF> chevrons;
     const auto add = [&](QPointF position, QVPointStyle style, bool minimumSide) {
         if (isChevron(style))
-            chevrons.push_back(chevronShape(position, style, pointRadius_, minimumSide));
+            chevrons.push_back(chevronShape(position, style, radius_, minimumSide));
         else
             circles.push_back(position);
     };
@@ -77,34 +79,55 @@ void QVMinMaxSeries::eraseMarkerShapes(QPainter& layer) const {
         if (!point.minIsClamped) add(point.absoluteMinPoint, minPointStyle_, true);
         if (!point.maxIsClamped) add(point.absoluteMaxPoint, maxPointStyle_, false);
     }
-    QVEraseCircles(layer, circles, pointRadius_);
+    QVEraseCircles(layer, circles, radius_);
     layer.setCompositionMode(QPainter::CompositionMode_DestinationOut);
     layer.setPen(Qt::NoPen);
     layer.setBrush(Qt::black);
     for (const QPolygonF& chevron : chevrons) layer.drawPolygon(chevron, Qt::WindingFill);
 }
 
-void QVMinMaxSeries::renderFill(QPainter& painter) const {
+QVLineCapStyle QVMinMaxSeries::barCaps() const {
+    // Round ends are where a style has no marker: nothing is kept free then.
     const bool roundCaps = minPointStyle_ == QVPointStyle::None || maxPointStyle_ == QVPointStyle::None;
-    const double minGap = isChevron(minPointStyle_) ? kChevronGap : 0;
-    const double maxGap = isChevron(maxPointStyle_) ? kChevronGap : 0;
+    return roundCaps ? QVLineCapStyle::Round : QVLineCapStyle::Butt;
+}
+
+template <typename Draw>
+void QVMinMaxSeries::forEachBar(Draw draw) const {
+    const QPointF minGap(0, isChevron(minPointStyle_) ? kChevronGap : 0);
+    const QPointF maxGap(0, isChevron(maxPointStyle_) ? kChevronGap : 0);
+    for (const ChartPoint& point : chartPoints_)
+        if (!isCenterPoint(point)) draw(point.absoluteMinPoint + minGap, point.absoluteMaxPoint - maxGap);
+}
+
+void QVMinMaxSeries::renderFill(QPainter& painter) const {
     QVPaintLayer(painter, imageSize(), fillColor_.alphaF(), [&](QPainter& layer) {
-        for (const ChartPoint& point : chartPoints_) {
-            if (isCenterPoint(point)) continue;
-            QVFillSegment(layer, point.absoluteMinPoint + QPointF(0, minGap),
-                          point.absoluteMaxPoint - QPointF(0, maxGap), 2 * pointRadius_,
-                          roundCaps ? QVLineCapStyle::Round : QVLineCapStyle::Butt, QVOpaque(fillColor_));
-        }
-        // Round ends are where a style has no marker: nothing is kept free then.
-        if (!roundCaps) eraseMarkerShapes(layer);
+        forEachBar([&](QPointF min, QPointF max) {
+            QVFillSegment(layer, min, max, 2 * radius_, barCaps(), QVOpaque(fillColor_));
+        });
+        if (barCaps() == QVLineCapStyle::Butt) eraseMarkerShapes(layer);
     });
 }
 
+/// Between the markers, which are the edge of the ends.
+void QVMinMaxSeries::renderEdges(QPainter& painter) const {
+    std::vector<QRectF> outlines;
+    forEachBar([&](QPointF min, QPointF max) {
+        outlines.push_back(QVSegmentOutline(painter, min, max, 2 * radius_, barCaps()));
+    });
+    if (barCaps() == QVLineCapStyle::Round)
+        QVDrawEdges(painter, imageSize(), outlines, edgeColor());
+    else
+        QVDrawSideEdges(painter, outlines, edgeColor());
+}
+
 void QVMinMaxSeries::renderChart(QPainter& painter) const {
+    if (edgeColor().isValid()) renderEdges(painter);
     if (minPointStyle_ == QVPointStyle::None && maxPointStyle_ == QVPointStyle::None) return;
     const auto marker = [&](QVPointStyle style) {
-        return QVChartSeriesPointMarker::chartPointWithColor(pointColor_, pointRadius_, pointLineWidth_,
-                                                             style, painter.device()->devicePixelRatio());
+        return QVChartSeriesPointMarker::chartPointWithColor(pointColor_, radius_,
+                                                             std::min(pointLineWidth_, radius_ / 2), style,
+                                                             painter.device()->devicePixelRatio());
     };
     const QImage maxMarker = marker(maxPointStyle_);
     const QImage clampedMarker = marker(QVPointStyle::UpwardChevron);

@@ -43,6 +43,10 @@ class QVMinMaxSeries : public QVChartSeries {
     };
     bool isCenterPoint(const ChartPoint& point) const;
     void eraseMarkerShapes(QPainter& layer) const;
+    QVLineCapStyle barCaps() const;
+    template <typename Draw>
+    void forEachBar(Draw draw) const;
+    void renderEdges(QPainter& painter) const;
 
     QVPointStyle maxPointStyle_ = QVPointStyle::Disc;
     QVPointStyle minPointStyle_ = QVPointStyle::Disc;
@@ -52,4 +56,5 @@ class QVMinMaxSeries : public QVChartSeries {
     double pointLineWidth_ = 1.0;
 
     std::vector<ChartPoint> chartPoints_;  // prepared
+    double radius_ = 0;                    // prepared: as much of the one wanted as there is room for
 };

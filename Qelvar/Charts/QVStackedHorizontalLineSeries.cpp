@@ -21,14 +21,31 @@ void QVStackedHorizontalLineSeries::prepareForRendering(QSizeF size, std::option
     }
 }
 
+template <typename Draw>
+void QVStackedHorizontalLineSeries::forEachSegment(Draw draw) const {
+    for (size_t row = 0; row < enumeratedValueOrder().size(); ++row) {
+        const std::vector<double>& points = pointsOfRow(row);
+        const double y = yForRow(row);
+        for (size_t i = 0; i + 1 < points.size(); i += 2)
+            draw(QPointF(points[i], y), QPointF(points[i + 1], y));
+    }
+}
+
 void QVStackedHorizontalLineSeries::renderFill(QPainter& painter) const {
     QVPaintLayer(painter, imageSize(), fillColor_.alphaF(), [&](QPainter& layer) {
-        for (size_t row = 0; row < enumeratedValueOrder().size(); ++row) {
-            const std::vector<double>& points = pointsOfRow(row);
-            const double y = yForRow(row);
-            for (size_t i = 0; i + 1 < points.size(); i += 2)
-                QVFillSegment(layer, {points[i], y}, {points[i + 1], y}, lineWidth_, QVLineCapStyle::Round,
-                              QVOpaque(fillColor_));
-        }
+        forEachSegment([&](QPointF start, QPointF end) {
+            QVFillSegment(layer, start, end, lineWidth_, QVLineCapStyle::Round, QVOpaque(fillColor_));
+        });
     });
+}
+
+void QVStackedHorizontalLineSeries::renderChart(QPainter& painter) const {
+    if (edgeColor().isValid()) {
+        std::vector<QRectF> outlines;
+        forEachSegment([&](QPointF start, QPointF end) {
+            outlines.push_back(QVSegmentOutline(painter, start, end, lineWidth_, QVLineCapStyle::Round));
+        });
+        QVDrawEdges(painter, imageSize(), outlines, edgeColor());
+    }
+    QVStackedValueSeries::renderChart(painter);
 }

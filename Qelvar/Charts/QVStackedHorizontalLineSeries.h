@@ -15,6 +15,7 @@ class QVStackedHorizontalLineSeries : public QVStackedValueSeries {
                              const QVEdgeInsets& insets,
                              std::shared_ptr<const QVChartDataSet> dataSet) override;
     void renderFill(QPainter& painter) const override;
+    void renderChart(QPainter& painter) const override;
     bool drawsSecondaryFill() const override { return false; }
 
  protected:
@@ -23,6 +24,9 @@ class QVStackedHorizontalLineSeries : public QVStackedValueSeries {
     }
 
  private:
+    template <typename Draw>
+    void forEachSegment(Draw draw) const;
+
     QColor fillColor_;
     double lineWidth_ = 0;
 };

@@ -28,6 +28,14 @@ void QVStackedValueSeries::discardPreparation() {
     chartPointsByValue_.clear();
 }
 
+double QVStackedValueSeries::labelRoom() const {
+    const QFontMetricsF metrics(labelFont_);
+    double widest = 0;
+    for (const auto& [value, label] : valueLabels_)
+        widest = std::max(widest, metrics.horizontalAdvance(label));
+    return widest > 0 ? widest + kLabelMargin : 0;
+}
+
 void QVStackedValueSeries::renderChart(QPainter& painter) const {
     QFont font = labelFont_;
     const double rowHeight = yForRow(1) - yForRow(0);

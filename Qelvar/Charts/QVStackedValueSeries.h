@@ -28,6 +28,7 @@ class QVStackedValueSeries : public QVChartSeries {
     double yForRow(size_t row) const;
 
     void renderChart(QPainter& painter) const override;
+    double labelRoom() const override;
 
  protected:
     void discardPreparation() override;

@@ -16,21 +16,24 @@ constexpr double kFirstBaseline = 22;
 constexpr double kSecondBaseline = 36;
 constexpr double kAverageIconGap = 1.5, kAverageIconWidth = 7.5;
 constexpr double kChartTop = 44;
-constexpr double kHeight = 187, kAxisGutter = 33;
+constexpr double kHeight = 187, kAxisGutter = 33, kAxisGrowth = 14;
 constexpr int kSmallestFontPercent = 60, kFontStepPercent = 5;
-/// Larger texts shrink no further before the value gets a line of its own.
+/// Larger texts that share a line shrink no further before the second gets a line of its own.
 constexpr double kSharedLineFactor = 0.85;
-/// What larger texts add to a card, for each further 100 %: to the header, to the axis, and half of what
-/// lines of their own take.
-constexpr double kHeaderGrowth = kChartTop, kAxisGrowth = 14, kOwnLineGrowth = 40;
+/// From one line to the next where texts have lines of their own.
+constexpr double kTitleLine = 24, kAverageLine = 14;
+/// Between what is drawn on one line and on the next. Where letters reach far beneath and above their lines
+/// these stand farther apart, but only for more than a trifle: a tail seldom meets an accent.
+constexpr double kLineGap = 1, kTrifle = 2;
+/// What a header is high at most when each text has a line of its own, with the tallest scripts.
+constexpr double kTallestHeader = 91;
 
-/// The largest factor of the fonts with which the text fits; the smallest one when none does.
-double fittingFontFactor(const std::function<double(double)>& textWidth, double room,
-                         int smallestPercent = kSmallestFontPercent) {
-    for (int percent = 100; percent > smallestPercent; percent -= kFontStepPercent) {
-        const double factor = percent / 100.0;
-        if (textWidth(factor) <= room) return factor;
-    }
+using Text = QVDashboardCellContent::Text;
+
+/// The largest factor of the fonts with which texts of that natural width fit; the smallest when none does.
+double fittingFactor(double width, double room, int smallestPercent) {
+    for (int percent = 100; percent > smallestPercent; percent -= kFontStepPercent)
+        if (width * percent <= room * 100) return percent / 100.0;
     return smallestPercent / 100.0;
 }
 
@@ -39,6 +42,12 @@ QRectF flooredToPixels(const QRectF& frame, double scale) {
     const auto floored = [scale](double value) { return std::floor(value * scale + 1e-6) / scale; };
     return {floored(frame.x()), floored(frame.y()), floored(frame.width()), floored(frame.height())};
 }
+
+/// Two texts of a line, or of two lines when `apart`.
+struct Pair {
+    double leadingFactor = 1, trailingFactor = 1;
+    bool apart = false;
+};
 
 /// Everything in points of the background, from its left, as if in a left-to-right language.
 struct Header {
@@ -50,85 +59,129 @@ struct Header {
         if (content.hasCategoryIcon)
             icon = QRectF(kMargin, kIconTop * scale_, kIconWidth * scale_, kIconHeight * scale_);
         left_ = content.hasCategoryIcon ? icon.right() + kIconGap : kMargin;
+        line_ = std::max(0.0, right_ - left_);
         layOutFirstLine();
         layOutSecondLine();
-        bottom = kChartTop * scale_ + ownLines_;
+        bottom = kChartTop * scale_ + moved_;
     }
 
     QRectF icon, title, value, average, averageIcon, updated;
-    double titleFactor = 1, valueFactor = 1;
+    double titleFactor = 1, valueFactor = 1, averageFactor = 1, updatedFactor = 1;
     double titleBaseline = 0, valueBaseline = 0, averageBaseline = 0, updatedBaseline = 0;
     double bottom = 0;
 
  private:
+    /// How two texts fit, the leading one with `extra` points beside it.
+    Pair fit(const Text& leading, double extra, const Text& trailing, double room) const {
+        const double factor =
+            fittingFactor(leading.width + extra + trailing.width, room, kSmallestFontPercent);
+        if (scale_ <= 1 || factor >= kSharedLineFactor || leading.width <= 0 || trailing.width <= 0)
+            return {factor, factor, false};
+        // No further than to the size that texts have for others.
+        const int smallest = std::min(kSmallestFontPercent, static_cast<int>(std::ceil(100 / scale_)));
+        return {fittingFactor(leading.width + extra, line_, smallest),
+                fittingFactor(trailing.width, line_, smallest), true};
+    }
+
+    /// What the text takes of a line: whole pixels, so that nothing is cut.
+    double widthOf(const Text& text, double factor) const {
+        const double pixels = content_.screenScale;
+        return std::ceil(text.width * factor * pixels - 1e-6) / pixels;
+    }
+
+    /// From a line with that beneath its baseline to the next with that above its own.
+    double lineDistance(double least, double below, double above) const {
+        const double needed = below + above + kLineGap * scale_;
+        return needed > least + kTrifle * scale_ ? needed : least;
+    }
+
+    static void setHeight(QRectF& frame, const Text& text, double factor, double baseline) {
+        frame.setTop(baseline - text.above * factor);
+        frame.setHeight((text.above + text.below) * factor);
+    }
+
     void layOutFirstLine() {
+        const Text &titleText = content_.title, &valueText = content_.value;
         const double iconGap = content_.hasCategoryIcon ? kIconGap : 0;
         const double room = width_ - 2 * kMargin - icon.right() - kTextGap - iconGap;
-        const auto bothWidths = [this](double factor) {
-            return content_.titleWidth(factor) + content_.valueWidth(factor);
-        };
-        titleFactor = valueFactor = fittingFontFactor(bothWidths, room);
+        const Pair pair = fit(titleText, 0, valueText, room);
+        titleFactor = pair.leadingFactor;
+        valueFactor = pair.trailingFactor;
         titleBaseline = valueBaseline = kFirstBaseline * scale_;
-        const double lineHeight = content_.firstLineAscent + content_.firstLineDescent;
-        if (scale_ > 1 && titleFactor < kSharedLineFactor) {
-            const double wholeLine = std::max(0.0, right_ - left_);
-            // No further than to the size that texts have for others.
-            const int smallest = std::min(kSmallestFontPercent, static_cast<int>(std::ceil(100 / scale_)));
-            titleFactor = fittingFontFactor(content_.titleWidth, wholeLine, smallest);
-            valueFactor = fittingFontFactor(content_.valueWidth, wholeLine, smallest);
-            ownLines_ += lineHeight;
-            valueBaseline += lineHeight;
-            value = QRectF(left_, 0, std::min(wholeLine, content_.valueWidth(valueFactor)), 0);
-            title = QRectF(left_, 0, wholeLine, 0);
+        const double naturalValue = widthOf(valueText, valueFactor);
+        if (pair.apart) {
+            moved_ = lineDistance(kTitleLine * scale_ * std::max(titleFactor, valueFactor),
+                                  titleText.below * titleFactor, valueText.above * valueFactor);
+            valueBaseline += moved_;
+            title = QRectF(left_, 0, line_, 0);
+            value = QRectF(left_, 0, std::min(line_, naturalValue), 0);
         } else {
-            const double naturalTitle = content_.titleWidth(titleFactor);
-            const double naturalValue = content_.valueWidth(valueFactor);
-            const double tooClose = std::max(0.0, left_ + naturalTitle + kTextGap - (right_ - naturalValue));
+            const double tooClose =
+                std::max(0.0, left_ + widthOf(titleText, titleFactor) + kTextGap - (right_ - naturalValue));
             const double valueWidth = std::max(0.0, naturalValue - tooClose);
             value = QRectF(right_ - valueWidth, 0, valueWidth, 0);
             title = QRectF(left_, 0, std::max(0.0, value.left() - kTextGap - left_), 0);
         }
-        title.setTop(titleBaseline - content_.firstLineAscent * titleFactor);
-        title.setHeight(lineHeight * titleFactor);
-        value.setTop(valueBaseline - content_.firstLineAscent * valueFactor);
-        value.setHeight(lineHeight * valueFactor);
+        setHeight(title, titleText, titleFactor, titleBaseline);
+        setHeight(value, valueText, valueFactor, valueBaseline);
     }
 
     void layOutSecondLine() {
-        const double wholeLine = std::max(0.0, right_ - left_);
-        const double iconWidth = kAverageIconWidth * scale_;
-        averageBaseline = updatedBaseline = kSecondBaseline * scale_ + 1 / content_.screenScale + ownLines_;
-        const double lineHeight = content_.secondLineAscent + content_.secondLineDescent;
-        const double updatedWidth = std::min(content_.lastUpdatedWidth, wholeLine);
-        double updatedLeft = right_ - updatedWidth;
-        double averageWidth = content_.averageWidth;
-        const double overlap = std::max(0.0, left_ + averageWidth + kTextGap - updatedLeft);
-        if (scale_ > 1 && overlap > 0 && averageWidth > 0 && updatedWidth > 0) {
-            ownLines_ += lineHeight;
-            updatedBaseline += lineHeight;
-            updatedLeft = left_;
-            const double iconRoom = content_.hasAverageIcon ? kAverageIconGap + iconWidth : 0;
-            averageWidth = std::min(averageWidth, std::max(0.0, wholeLine - iconRoom));
-        } else if (updatedWidth > 0) {
-            averageWidth = std::max(0.0, averageWidth - overlap);
+        const Text &averageText = content_.average, &updatedText = content_.lastUpdated;
+        const double iconWidth = content_.hasAverageIcon ? (kAverageIconGap + kAverageIconWidth) * scale_ : 0;
+        const double gap = averageText.width > 0 && updatedText.width > 0 ? kTextGap : 0;
+        const Pair pair = fit(averageText, iconWidth, updatedText, line_ - gap);
+        averageFactor = pair.leadingFactor;
+        updatedFactor = pair.trailingFactor;
+        moveBeneathFirstLine(averageText.above * averageFactor,
+                             pair.apart ? 0 : updatedText.above * updatedFactor);
+        averageBaseline = updatedBaseline = kSecondBaseline * scale_ + 1 / content_.screenScale + moved_;
+        const double updatedWidth = std::min(widthOf(updatedText, updatedFactor), line_);
+        double averageWidth = widthOf(averageText, averageFactor);
+        const double iconRoom = iconWidth * averageFactor;
+        if (pair.apart) {
+            const double distance =
+                lineDistance(kAverageLine * scale_ * std::max(averageFactor, updatedFactor),
+                             averageText.below * averageFactor, updatedText.above * updatedFactor);
+            moved_ += distance;
+            updatedBaseline += distance;
+            averageWidth = std::min(averageWidth, std::max(0.0, line_ - iconRoom));
+        } else {
+            averageWidth = std::clamp(line_ - gap - iconRoom - updatedWidth, 0.0, averageWidth);
         }
-        const double top = averageBaseline - content_.secondLineAscent;
-        average = QRectF(left_, top, averageWidth, lineHeight);
-        updated = QRectF(updatedLeft, updatedBaseline - content_.secondLineAscent, updatedWidth, lineHeight);
+        average = QRectF(left_, 0, averageWidth, 0);
+        updated = QRectF(pair.apart ? left_ : right_ - updatedWidth, 0, updatedWidth, 0);
+        setHeight(average, averageText, averageFactor, averageBaseline);
+        setHeight(updated, updatedText, updatedFactor, updatedBaseline);
         if (content_.hasAverageIcon)
-            averageIcon = QRectF(average.right() + kAverageIconGap, top, iconWidth, lineHeight);
+            averageIcon = QRectF(average.right() + kAverageIconGap * scale_ * averageFactor,
+                                 averageBaseline - content_.secondLineAscent * averageFactor,
+                                 kAverageIconWidth * scale_ * averageFactor,
+                                 (content_.secondLineAscent + content_.secondLineDescent) * averageFactor);
+    }
+
+    /// The second line stands lower where the first would run into it.
+    void moveBeneathFirstLine(double averageAbove, double updatedAbove) {
+        const double between = (kSecondBaseline - kFirstBaseline) * scale_;
+        // Texts at the same side are above each other, and a long one is above everything.
+        const double below = valueBaseline > titleBaseline ? content_.value.below * valueFactor
+                                                           : std::max(content_.title.below * titleFactor,
+                                                                      content_.value.below * valueFactor);
+        moved_ += lineDistance(between, below, std::max(averageAbove, updatedAbove)) - between;
     }
 
     const QVDashboardCellContent& content_;
     const double width_, right_, scale_;
-    double left_ = 0;
-    double ownLines_ = 0;  // the height of the lines that texts have of their own
+    double left_ = 0, line_ = 0;
+    double moved_ = 0;  // how far what follows is moved down by lines that texts have of their own
 };
 
 }  // namespace
 
 double QVDashboardCellLayout::preferredCellHeight(double textScale) {
-    return kHeight + std::round((textScale - 1) * (kHeaderGrowth + kAxisGrowth + kOwnLineGrowth));
+    if (textScale <= 1) return kHeight;
+    return std::round(kInset + kTallestHeader * textScale + kSmallestPlotHeight +
+                      axisGutterHeight(textScale));
 }
 
 double QVDashboardCellLayout::axisGutterHeight(double textScale) {
@@ -139,8 +192,10 @@ QVDashboardCellLayout QVDashboardCellLayout::make(const QVDashboardCellContent& 
     const Header header(content);
     const double width = std::max(0.0, content.width - 2 * kInset);
     QVDashboardCellLayout layout;
-    layout.fontFactor = header.titleFactor;
+    layout.titleFactor = header.titleFactor;
     layout.valueFactor = header.valueFactor;
+    layout.averageFactor = header.averageFactor;
+    layout.lastUpdatedFactor = header.updatedFactor;
     layout.background = QRectF(kInset, kInset, width, preferredCellHeight(content.textScale) - kInset);
     const auto placed = [&](QRectF frame) {
         if (content.rightToLeft) frame.moveLeft(width - frame.right());
@@ -154,9 +209,9 @@ QVDashboardCellLayout QVDashboardCellLayout::make(const QVDashboardCellContent& 
     layout.lastUpdated = placed(header.updated);
     layout.chart = placed(QRectF(0, header.bottom, width, layout.background.height() - header.bottom));
     const double top = layout.background.top();
-    layout.firstBaseline = top + header.titleBaseline;
+    layout.titleBaseline = top + header.titleBaseline;
     layout.valueBaseline = top + header.valueBaseline;
-    layout.secondBaseline = top + header.averageBaseline;
+    layout.averageBaseline = top + header.averageBaseline;
     layout.lastUpdatedBaseline = top + header.updatedBaseline;
     return layout;
 }

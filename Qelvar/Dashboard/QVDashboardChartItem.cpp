@@ -67,17 +67,18 @@ void QVDashboardChartItem::updateDateRange(QVDateCache& dateCache, QVTimeScope t
 }
 
 QVEdgeInsets QVDashboardChartItem::chartInsetsForTimeScope(QVTimeScope timeScope) {
-    // The labels of the axis and of the bounds stand there.
-    const double scale = platform::textScale();
+    // The labels of the bounds stand at the right; at the left a first date that is too long for half of what
+    // it needs moves over.
+    const double scale = platform::textScale(), half = (1 + scale) / 2;
     switch (timeScope) {
         case QVTimeScope::Day:
-            return {.top = 0, .left = 26 * scale, .bottom = 0, .right = 38 * scale};
+            return {.top = 0, .left = 26 * half, .bottom = 0, .right = 38 * scale};
         case QVTimeScope::Week:
-            return {.top = 0, .left = 13 * scale, .bottom = 0, .right = 39 * scale};
+            return {.top = 0, .left = 13 * half, .bottom = 0, .right = 39 * scale};
         case QVTimeScope::Month:
-            return {.top = 0, .left = 24 * scale, .bottom = 0, .right = 36 * scale};
+            return {.top = 0, .left = 24 * half, .bottom = 0, .right = 36 * scale};
         case QVTimeScope::Year:
-            return {.top = 0, .left = 14 * scale, .bottom = 0, .right = 41 * scale};
+            return {.top = 0, .left = 14 * half, .bottom = 0, .right = 41 * scale};
         case QVTimeScope::Hour:
             break;
     }

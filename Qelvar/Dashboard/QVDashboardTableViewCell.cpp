@@ -6,6 +6,7 @@
 #include <chrono>
 #include <cmath>
 
+#include "Platform/Appearance.h"
 #include "Platform/Icons.h"
 #include "Platform/Localization.h"
 #include "Platform/TextScale.h"
@@ -26,8 +27,22 @@ constexpr QVAnimationTime kCrossFade = std::chrono::milliseconds(500);
 
 const QColor kWhite = Qt::white;
 const QColor kHalfWhite = QColor::fromRgbF(1, 1, 1, 0.5);
-/// The light of the one is added to that of the other.
-constexpr auto kPlusLighter = QPainter::CompositionMode_Plus;
+
+/// How what is not quite white is laid on the card's colour.
+struct Blending {
+    QColor softText;
+    QPainter::CompositionMode softTexts, fill, secondaryFill, lines;
+};
+
+/// Light is added and colours are blended; with high contrast everything is plain, and texts are white.
+Blending blending() {
+    using Painter = QPainter;
+    if (platform::highContrast())
+        return {kWhite, Painter::CompositionMode_SourceOver, Painter::CompositionMode_SourceOver,
+                Painter::CompositionMode_SourceOver, Painter::CompositionMode_SourceOver};
+    return {kHalfWhite, Painter::CompositionMode_Plus, Painter::CompositionMode_Overlay,
+            Painter::CompositionMode_SoftLight, Painter::CompositionMode_Overlay};
+}
 
 /// The axis of a time scope; null: it has none.
 std::shared_ptr<QVCachedAxisDescriptor> axisDescriptor(QVTimeScope timeScope) {
@@ -47,19 +62,15 @@ std::shared_ptr<QVCachedAxisDescriptor> axisDescriptor(QVTimeScope timeScope) {
     }
     axis->setHighlightedLabelColor(kWhite);
     axis->setHighlightedLabelFont(platform::boldSystemFont(kChartLabelFontSize));
-    axis->setUnhighlightedLabelColor(kHalfWhite);
+    axis->setUnhighlightedLabelColor(blending().softText);
     axis->setUnhighlightedLabelFont(platform::systemFont(kChartLabelFontSize));
-    axis->setUnhighlightedLabelFilter(kPlusLighter);
+    axis->setUnhighlightedLabelFilter(blending().softTexts);
     return axis;
 }
 
-/// The width of a label that shows the text: whole pixels, so that nothing is cut.
-double labelWidth(double textWidth, double screenScale) {
-    return std::ceil(textWidth * screenScale - 1e-6) / screenScale;
-}
-
-double plainWidth(const QString& text, QFont font, double factor = 1) {
-    return platform::StyledText(text).size(font, factor).width();
+QVDashboardCellContent::Text measured(const platform::StyledText& text, const QFont& font) {
+    const platform::StyledText::Ink ink = text.ink(font);
+    return {text.size(font).width(), ink.above, ink.below};
 }
 
 /// Draws one line in a frame, at its leading or trailing edge of the reading direction.
@@ -99,16 +110,9 @@ QVDashboardTableViewCell::QVDashboardTableViewCell(QQuickItem* parent)
       observer_(std::make_shared<Observer>(*this)) {
     setFlag(ItemHasContents);
 
-    chart_.setChartFillCompositingFilter(QPainter::CompositionMode_Overlay);
-    chart_.setChartSecondaryFillCompositingFilter(QPainter::CompositionMode_SoftLight);
     chart_.setAnimationStyle(QVChart::AnimationStyle::CrossFade);
     chart_.setAnimationDuration(kCrossFade);
     chart_.setDividerInset(kDividerInset);
-    chartBackground_->setLabelColor(kHalfWhite);
-    chartBackground_->setNoDataLabelColor(kHalfWhite);
-    chartBackground_->setLabelCompositingFilter(kPlusLighter);
-    chartBackground_->setNoDataLabelCompositingFilter(kPlusLighter);
-    chartBackground_->setAverageLineCompositingFilter(QPainter::CompositionMode_Overlay);
     chartBackground_->setBoundFormatter([this](double value, const VSNumberFormatter& numberFormatter) {
         if (!chartItem_) return QString();
         return qv_dashboardChartBoundStringFromValue(chartItem_->dataUnitGroup(), value, numberFormatter,
@@ -117,8 +121,11 @@ QVDashboardTableViewCell::QVDashboardTableViewCell(QQuickItem* parent)
     chart_.setChartBackgroundView(chartBackground_);
     chart_.onNeedsRepaint = [this] { contentLooksDifferent(); };
     takeTextScale();
+    takeContrast();
     connect(&platform::TextScale::shared(), &platform::TextScale::factorChanged, this,
             &QVDashboardTableViewCell::takeTextScale);
+    connect(&platform::Appearance::shared(), &platform::Appearance::contrastChanged, this,
+            &QVDashboardTableViewCell::takeContrast);
 }
 
 double QVDashboardTableViewCell::preferredCellHeight() {
@@ -131,6 +138,19 @@ void QVDashboardTableViewCell::takeTextScale() {
     chartBackground_->setLabelFont(platform::systemFont(kChartLabelFontSize));
     chartBackground_->setNoDataLabelFont(platform::systemFont(kNoDataFontSize));
     chart_.setXAxisGutterHeight(QVDashboardCellLayout::axisGutterHeight(platform::textScale()));
+    stillPartLooksDifferent();
+}
+
+void QVDashboardTableViewCell::takeContrast() {
+    const Blending now = blending();
+    chart_.setChartFillCompositingFilter(now.fill);
+    chart_.setChartSecondaryFillCompositingFilter(now.secondaryFill);
+    chart_.setDividerCompositingFilter(now.lines);
+    chartBackground_->setAverageLineCompositingFilter(now.lines);
+    chartBackground_->setLabelColor(now.softText);
+    chartBackground_->setLabelCompositingFilter(now.softTexts);
+    chartBackground_->setNoDataLabelColor(now.softText);
+    chartBackground_->setNoDataLabelCompositingFilter(now.softTexts);
     stillPartLooksDifferent();
 }
 
@@ -187,8 +207,9 @@ void QVDashboardTableViewCell::setChartItem(std::shared_ptr<QVDashboardChartItem
         chart_.reloadData(false);
     }
     // Another card, on its way out, may have cleared the item's mark.
-    const bool isOutdated =
-        textsLocale_ != VSEnvironment::current()->localeIdentifier() || textsScale_ != platform::textScale();
+    const bool isOutdated = textsLocale_ != VSEnvironment::current()->localeIdentifier() ||
+                            textsScale_ != platform::textScale() ||
+                            textsContrast_ != platform::highContrast();
     if (chartItem_ && (chartItem_->localeDidChange() || (timeScope_ && isOutdated))) {
         chartItem_->setLocaleDidChange(false);
         if (timeScope_) rebuildTimeBasedContent();
@@ -220,6 +241,7 @@ void QVDashboardTableViewCell::refreshTexts() {
     const VSDataUnitGroup& group = *chartItem_->dataUnitGroup();
     textsLocale_ = VSEnvironment::current()->localeIdentifier();
     textsScale_ = platform::textScale();
+    textsContrast_ = platform::highContrast();
     title_ = group.displayName();
     categoryIconName_ = group.isNikeFuel() ? group.groupIcon() : QString();
     average_ = chartItem_->secondaryValue();
@@ -263,24 +285,18 @@ double QVDashboardTableViewCell::screenScale() const {
 QVDashboardCellContent QVDashboardTableViewCell::layoutContent() const {
     const QFont titleFont = platform::systemFont(kTitleFontSize),
                 secondFont = platform::systemFont(kSecondLineFontSize);
-    const QFontMetricsF titleMetrics(titleFont), secondMetrics(secondFont);
+    const QFontMetricsF secondMetrics(secondFont);
     QVDashboardCellContent content;
     content.width = width();
-    const double scale = content.screenScale = screenScale();
+    content.screenScale = screenScale();
     content.textScale = platform::textScale();
     content.rightToLeft = platform::isRightToLeft();
     content.hasCategoryIcon = !categoryIconName_.isEmpty();
     content.hasAverageIcon = !averageIconName_.isEmpty();
-    content.titleWidth = [this, titleFont, scale](double factor) {
-        return labelWidth(plainWidth(title_, titleFont, factor), scale);
-    };
-    content.valueWidth = [this, titleFont, scale](double factor) {
-        return labelWidth(value_.size(titleFont, factor).width(), scale);
-    };
-    content.averageWidth = labelWidth(average_.size(secondFont).width(), scale);
-    content.lastUpdatedWidth = labelWidth(plainWidth(lastUpdated_, secondFont), scale);
-    content.firstLineAscent = titleMetrics.ascent();
-    content.firstLineDescent = titleMetrics.descent();
+    content.title = measured(platform::StyledText(title_), titleFont);
+    content.value = measured(value_, titleFont);
+    content.average = measured(average_, secondFont);
+    content.lastUpdated = measured(platform::StyledText(lastUpdated_), secondFont);
     content.secondLineAscent = secondMetrics.ascent();
     content.secondLineDescent = secondMetrics.descent();
     return content;
@@ -298,22 +314,24 @@ void QVDashboardTableViewCell::paintTexts(QPainter& painter, const QVDashboardCe
     if (!layout.categoryIcon.isEmpty())
         painter.drawImage(layout.categoryIcon,
                           platform::icon(categoryIconName_, layout.categoryIcon.size(), scale));
-    drawLine(painter, platform::StyledText(title_), layout.title, layout.firstBaseline, titleFont, kWhite,
-             rightToLeft, layout.fontFactor);
+    drawLine(painter, platform::StyledText(title_), layout.title, layout.titleBaseline, titleFont, kWhite,
+             rightToLeft, layout.titleFactor);
     drawLine(painter, value_, layout.value, layout.valueBaseline, titleFont, kWhite, !rightToLeft,
              layout.valueFactor);
 
-    painter.setCompositionMode(kPlusLighter);
-    drawLine(painter, average_, layout.average, layout.secondBaseline, secondFont, kHalfWhite, rightToLeft);
+    const Blending now = blending();
+    painter.setCompositionMode(now.softTexts);
+    drawLine(painter, average_, layout.average, layout.averageBaseline, secondFont, now.softText, rightToLeft,
+             layout.averageFactor);
     if (!layout.averageIcon.isEmpty()) {
         const QImage icon =
             platform::icon(averageIconName_, layout.averageIcon.size(), scale, kWhite, rightToLeft);
-        painter.setOpacity(0.5);
+        painter.setOpacity(now.softText.alphaF());
         painter.drawImage(layout.averageIcon, icon);
         painter.setOpacity(1);
     }
     drawLine(painter, platform::StyledText(lastUpdated_), layout.lastUpdated, layout.lastUpdatedBaseline,
-             secondFont, kHalfWhite, !rightToLeft);
+             secondFont, now.softText, !rightToLeft, layout.lastUpdatedFactor);
     painter.setCompositionMode(QPainter::CompositionMode_SourceOver);
 }
 

@@ -96,6 +96,7 @@ class QVDashboardTableViewCell : public QQuickItem {
 
     void prepare();
     void takeTextScale();
+    void takeContrast();
     void rebuildTimeBasedContent();
     void refreshTexts();
     void describeChart();
@@ -123,6 +124,7 @@ class QVDashboardTableViewCell : public QQuickItem {
     QString title_, lastUpdated_, chartDescription_;
     std::string textsLocale_;  // of which they are
     double textsScale_ = 0;
+    bool textsContrast_ = false;
 
     std::shared_ptr<QVDottedAverageBackgroundView> chartBackground_;
     std::weak_ptr<QVDateCache> dateCache_;

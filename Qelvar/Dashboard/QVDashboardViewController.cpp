@@ -4,6 +4,7 @@
 #include <set>
 
 #include "Platform/Announcement.h"
+#include "Platform/Appearance.h"
 #include "Platform/Localization.h"
 #include "Platform/NavigationStack.h"
 #include "Platform/RestorableState.h"
@@ -82,6 +83,8 @@ QVDashboardViewController::QVDashboardViewController(std::shared_ptr<QVControlle
         emit rowHeightChanged();
         localeDidChange();
     });
+    connect(&platform::Appearance::shared(), &platform::Appearance::contrastChanged, this,
+            &QVDashboardViewController::localeDidChange);
     setUserActivity(QVUserActivityManager::activity(title(), {}, QVUserActivityTab::Dashboard));
     connect(timeScopeControl_.get(), &QVTimeScopeControl::valueChanged, this,
             &QVDashboardViewController::timeScopeDidChange);

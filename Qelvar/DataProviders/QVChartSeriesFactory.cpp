@@ -1,5 +1,8 @@
 #include "Qelvar/DataProviders/QVChartSeriesFactory.h"
 
+#include <chrono>
+
+#include "Platform/Appearance.h"
 #include "Platform/StyledText.h"
 #include "Qelvar/Charts/QVBarSeries.h"
 #include "Qelvar/Charts/QVCenteredHorizontalLineSeries.h"
@@ -22,8 +25,17 @@ QColor white(float alpha = 1.0f) {
 QColor black(float alpha = 1.0f) {
     return QColor::fromRgbF(0, 0, 0, alpha);
 }
-QColor halfWhite() {
-    return white(0.5f);
+/// Over the card's colour its light is less than half of what lies between that and white: with high
+/// contrast, where it is laid on plainly, it stands out from the card by 3 to 1 and white lines on it do too.
+constexpr float highContrastFill = 0.42f;
+/// Blended into the card a fill cannot reach 3 to 1; its edge does, on the colours of every category.
+constexpr float edgeOpacity = 0.75f;
+
+QColor fillColor() {
+    return white(platform::highContrast() ? highContrastFill : 0.5f);
+}
+QColor edgeColor() {
+    return white(platform::highContrast() ? 1.0f : edgeOpacity);
 }
 
 struct PointLook {
@@ -38,10 +50,13 @@ std::shared_ptr<QVLineSeries> lineSeries(const PointLook& look, bool withLine) {
     series->setPointRadius(look.radius);
     series->setPointLineWidth(look.lineWidth);
     series->setPointStyle(look.style);
-    series->setSecondaryFillGradient(QVGradientObject::gradientWithTopColor(black(), black(0)));
+    const bool fades = !platform::highContrast();
+    // With high contrast there is no shade under a gap, which is told by its dashes, and no fill that fades.
+    if (fades) series->setSecondaryFillGradient(QVGradientObject::gradientWithTopColor(black(), black(0)));
     if (withLine) {
         series->setLineColor(white());
-        series->setFillGradient(QVGradientObject::gradientWithTopColor(white(0.8f), white(0)));
+        series->setFillGradient(fades ? QVGradientObject::gradientWithTopColor(white(0.8f), white(0))
+                                      : QVGradientObject::gradientWithTopColor(fillColor(), fillColor()));
     }
     return series;
 }
@@ -52,7 +67,8 @@ std::shared_ptr<QVMinMaxSeries> minMaxSeries(const PointLook& look) {
     series->setMaxPointStyle(look.style);
     series->setPointRadius(look.radius);
     series->setPointLineWidth(look.lineWidth);
-    series->setFillColor(halfWhite());
+    series->setFillColor(fillColor());
+    series->setEdgeColor(edgeColor());
     return series;
 }
 
@@ -60,14 +76,16 @@ std::shared_ptr<QVBarSeries> barSeries() {
     auto series = std::make_shared<QVBarSeries>();
     series->setBarWidth(barWidth);
     series->setLineCapStyle(QVLineCapStyle::Round);
-    series->setFillColor(halfWhite());
+    series->setFillColor(fillColor());
+    series->setEdgeColor(edgeColor());
     series->setBottomPadding(barBottomPadding);
     return series;
 }
 
 std::shared_ptr<QVCenteredHorizontalLineSeries> centeredSeries() {
     auto series = std::make_shared<QVCenteredHorizontalLineSeries>();
-    series->setFillColor(halfWhite());
+    series->setFillColor(fillColor());
+    series->setEdgeColor(edgeColor());
     series->setAccentColor(white());
     series->setLineWidth(periodLineWidth);
     return series;
@@ -75,7 +93,8 @@ std::shared_ptr<QVCenteredHorizontalLineSeries> centeredSeries() {
 
 std::shared_ptr<QVStackedHorizontalLineSeries> stackedSeries(const VSDataUnitGroup* group) {
     auto series = std::make_shared<QVStackedHorizontalLineSeries>();
-    series->setFillColor(halfWhite());
+    series->setFillColor(fillColor());
+    series->setEdgeColor(edgeColor());
     series->setLineWidth(periodLineWidth);
     series->setLabelFont(platform::systemFont(stackedLabelSize));
     series->setLabelColor(white());
@@ -84,8 +103,8 @@ std::shared_ptr<QVStackedHorizontalLineSeries> stackedSeries(const VSDataUnitGro
     return series;
 }
 
-std::shared_ptr<const QVChartSeries> seriesOfStyle(VSChartStyle style, const PointLook& look,
-                                                   const VSDataUnitGroup* group) {
+std::shared_ptr<QVChartSeries> seriesOfStyle(VSChartStyle style, const PointLook& look,
+                                             const VSDataUnitGroup* group) {
     switch (style) {
         case VSChartStyle::None:
             return nullptr;
@@ -106,6 +125,14 @@ std::shared_ptr<const QVChartSeries> seriesOfStyle(VSChartStyle style, const Poi
     return nullptr;
 }
 
+/// How long a bucket is at least; none: the scope has none.
+std::optional<VSDuration> shortestBucket(const VSDateComponents& interval) {
+    using namespace std::chrono;
+    if (interval.isZero()) return std::nullopt;
+    return hours(24 * 365) * interval.years + hours(24 * 28) * interval.months + hours(24) * interval.days +
+           hours(interval.hours) + minutes(interval.minutes) + seconds(interval.seconds);
+}
+
 }  // namespace
 
 std::vector<std::shared_ptr<const QVChartSeries>> QVChartSeriesForDataUnitGroup(const VSDataUnitGroup* group,
@@ -117,7 +144,9 @@ std::vector<std::shared_ptr<const QVChartSeries>> QVChartSeriesForDataUnitGroup(
         const PointLook look{QVPointStyleForDataUnitAtIndex(group, i),
                              rules.chartPointRadiusForTimeScope(scope),
                              rules.chartPointLineWidthForTimeScope(scope)};
-        series.push_back(seriesOfStyle(rules.chartStyleForTimeScope(scope), look, group));
+        const auto one = seriesOfStyle(rules.chartStyleForTimeScope(scope), look, group);
+        if (one) one->setPointInterval(shortestBucket(rules.intervalComponentsForTimeScope(scope)));
+        series.push_back(one);
     }
     return series;
 }

@@ -1,3 +1,4 @@
+#include <rapidcheck/gtest.h>
 #include <QFontMetricsF>
 
 #include "ChartTestSupport.h"
@@ -244,6 +245,50 @@ TEST(LineSeries, TheFillHasNoSeamsAtAnyScale) {
         const QImage fill = draw(series, points, Layer::Fill, frame);
         for (int x = 1; x < fill.width() - 1; ++x)
             EXPECT_NEAR(qAlpha(fill.pixel(x, fill.height() / 2)), 128, 3) << x << " at " << scale;
+    }
+}
+
+/// The first and the last column of each run of columns with something on them in a row of pixels.
+std::vector<std::pair<int, int>> runs(const QImage& image, int y) {
+    std::vector<std::pair<int, int>> found;
+    for (int x = 0; x < image.width(); ++x) {
+        if (qAlpha(image.pixel(x, y)) < 160) continue;
+        if (found.empty() || found.back().second != x - 1) found.emplace_back(x, x);
+        found.back().second = x;
+    }
+    return found;
+}
+
+RC_GTEST_PROP(ChartSeries, WhatIsDrawnForOnePointKeepsApartFromThatOfTheNext, ()) {
+    const int count = *rc::gen::inRange(2, 60);
+    const double pitch = *rc::gen::inRange(40, 500) / 10.0;
+    Frame frame;
+    frame.size = {pitch * count, 80};
+    frame.seconds = count;
+    frame.scale = *rc::gen::element(1.0, 2.0, 3.0);
+    std::vector<QVChartPointPtr> numbers, ranges;
+    for (int i = 0; i < count; ++i) {
+        numbers.push_back(point(i + 0.5, 70));
+        ranges.push_back(minMaxPoint(i + 0.5, 10, 90));
+    }
+    QVBarSeries bars;
+    QVMinMaxSeries minMax;
+    bars.setFillColor(Qt::white);
+    minMax.setFillColor(Qt::white);
+    QVLineSeries markers;
+    for (QVChartSeries* series : std::initializer_list<QVChartSeries*>{&bars, &minMax})
+        series->setPointInterval(std::chrono::seconds(1));
+    markers.setPointStyle(QVPointStyle::Disc);
+    prepare(markers, numbers, frame);
+    for (const auto& [image, y] :
+         {std::pair(draw(bars, numbers, Layer::Fill, frame), 50.0),
+          {draw(minMax, ranges, Layer::Fill, frame), 40.0},
+          {draw(markers, numbers, Layer::Chart, frame), markers.dataPoints().front().y()}}) {
+        const auto found = runs(image, static_cast<int>(y * frame.scale));
+        RC_ASSERT(found.size() == static_cast<size_t>(count));
+        for (size_t i = 1; i < found.size(); ++i)
+            RC_ASSERT(found[i - 1].second + 1 - found[i - 1].first <=
+                      0.8 * (found[i].first - found[i - 1].first) + 1);
     }
 }
 

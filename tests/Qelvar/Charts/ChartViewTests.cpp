@@ -1,7 +1,10 @@
 #include <QFontMetricsF>
 #include <cmath>
 
+#include <QDBusVariant>
+
 #include "ChartTestSupport.h"
+#include "Platform/Appearance.h"
 #include "Platform/StyledText.h"
 #include "Platform/SystemEvents.h"
 #include "Platform/TextScale.h"
@@ -177,6 +180,47 @@ TEST_F(ChartView, NewImagesCrossFade) {
     EXPECT_EQ(colorAt(75, 50), QColor(0, 0, 200)) << "not animated: at once";
 }
 
+TEST_F(ChartView, NothingFadesOrMovesForAPersonWhoWantsLessMotion) {
+    // As the desktop says it.
+    const auto desktopSays = [](uint wanted) {
+        QMetaObject::invokeMethod(&platform::Appearance::shared(), "portalSettingChanged",
+                                  Q_ARG(QString, QStringLiteral("org.freedesktop.appearance")),
+                                  Q_ARG(QString, QStringLiteral("reduced-motion")),
+                                  Q_ARG(QDBusVariant, QDBusVariant(wanted)));
+    };
+    desktopSays(1);
+    chart.setAnimationStyle(QVChart::AnimationStyle::CrossFade);
+    axis->given = {{"a", at(0)}};
+    series->chart = QColor(200, 0, 0);
+    show();
+    series->chart = QColor(0, 200, 0);
+    axis->given = {{"a", at(40)}, {"b", at(100)}};
+    axis->invalidateCache();
+    chart.reloadData(true);
+    chart.refreshView();
+    settle();
+    EXPECT_EQ(colorAt(75, 50), QColor(0, 200, 0));
+    EXPECT_EQ(labelCenters(), (std::vector<double>{60, 120}));
+    EXPECT_FALSE(chart.advance(now));
+    desktopSays(0);
+}
+
+TEST_F(ChartView, ThePlotEndsBeforeTheLabelsOfItsBounds) {
+    background->setBoundFormatter(
+        [](double value, const VSNumberFormatter&) { return value > 5 ? "a long bound" : "0"; });
+    show({250, 103});
+    const double label = chart.backgroundFrame().left() + background->maximumLabelFrame().left();
+    EXPECT_GT(250 - renderer->chartInsets().right, label - 7);
+    EXPECT_LE(250 - renderer->chartInsets().right, label - 5);
+    EXPECT_EQ(background->chartInsets(), renderer->chartInsets());
+    axis->given = {{"a", at(100)}};
+    axis->invalidateCache();
+    chart.refreshView();
+    paint();
+    EXPECT_NEAR(chart.xAxisLabels()[0].centerX.target(), 250 - renderer->chartInsets().right, 0.5)
+        << "dates stand where the plot has them";
+}
+
 TEST_F(ChartView, AReloadWithoutAnimationEndsAFadeAtOnce) {
     series->chart = QColor(200, 0, 0);
     show();
@@ -329,6 +373,7 @@ TEST_F(ChartView, LabelsThatDoNotFitShrinkTogether) {
 TEST_F(ChartView, TheFirstAndTheLastLabelStayAndAreWhole) {
     const double one = QFontMetricsF(axis->highlightedLabelFont()).horizontalAdvance("mmmm");
     chart.setDividerInset(12);
+    background->setHideMinMaxLabels(true);
     axis->given = {{"mmmm", at(0)}, {"b", at(50)}, {"mmmm", at(100)}};
     renderer->setChartInsets({0, 20, 0, 20});
     const double width = 40 + 4 * std::ceil(one);

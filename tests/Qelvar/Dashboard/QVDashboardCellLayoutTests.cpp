@@ -2,128 +2,180 @@
 
 #include <gtest/gtest.h>
 
+#include <rapidcheck/gtest.h>
+
+#include "CardTestSupport.h"
+
 namespace {
+
+using Text = QVDashboardCellContent::Text;
 
 /// A card of a phone's width, with texts of the given widths at full size.
 QVDashboardCellContent content(double titleWidth, double valueWidth) {
     QVDashboardCellContent content;
     content.width = 375;
     content.screenScale = 2;
-    content.titleWidth = [titleWidth](double factor) { return titleWidth * factor; };
-    content.valueWidth = [valueWidth](double factor) { return valueWidth * factor; };
-    content.averageWidth = 100;
-    content.lastUpdatedWidth = 80;
-    content.firstLineAscent = 18;
-    content.firstLineDescent = 5;
+    content.title = {titleWidth, 14, 4};
+    content.value = {valueWidth, 14, 4};
+    content.average = {100, 8, 2};
+    content.lastUpdated = {80, 8, 2};
     content.secondLineAscent = 10;
     content.secondLineDescent = 3;
     return content;
 }
 
 TEST(DashboardCellLayout, PartsStandWhereTheyBelong) {
-    const auto layout = QVDashboardCellLayout::make(content(60, 90));
+    auto parts = content(60, 90);
+    auto layout = QVDashboardCellLayout::make(parts);
     EXPECT_EQ(layout.background, QRectF(4, 4, 367, 183));
-    EXPECT_EQ(layout.fontFactor, 1);
-    EXPECT_EQ(layout.firstBaseline, 4 + 22);
-    EXPECT_EQ(layout.secondBaseline, 4 + 36.5) << "a pixel more than 36";
-    EXPECT_EQ(layout.value, QRectF(4 + 367 - 11 - 90, 4 + 4, 90, 23));
-    EXPECT_EQ(layout.title, QRectF(4 + 12, 4 + 4, 367 - 11 - 90 - 8 - 12, 23))
+    EXPECT_EQ(layout.titleFactor, 1);
+    EXPECT_EQ(layout.titleBaseline, 4 + 22);
+    EXPECT_EQ(layout.averageBaseline, 4 + 36.5) << "a pixel more than 36";
+    EXPECT_EQ(layout.value, QRectF(4 + 367 - 11 - 90, 4 + 8, 90, 18));
+    EXPECT_EQ(layout.title, QRectF(4 + 12, 4 + 8, 367 - 11 - 90 - 8 - 12, 18))
         << "up to 8 points before the value";
-    EXPECT_EQ(layout.average.topLeft(), QPointF(16, 4 + 26.5));
-    EXPECT_EQ(layout.average.width(), 100);
+    EXPECT_EQ(layout.average, QRectF(16, 4 + 28.5, 100, 10));
     EXPECT_EQ(layout.lastUpdated.right(), 4 + 367 - 11);
     EXPECT_EQ(layout.chart, QRectF(4, 48, 367, 139));
     EXPECT_TRUE(layout.categoryIcon.isEmpty());
     EXPECT_TRUE(layout.averageIcon.isEmpty());
-}
 
-TEST(DashboardCellLayout, AnIconMovesTheTextsAndTheUnitIconFollowsTheAverage) {
-    auto withIcons = content(60, 90);
-    withIcons.hasCategoryIcon = withIcons.hasAverageIcon = true;
-    const auto layout = QVDashboardCellLayout::make(withIcons);
+    parts.hasCategoryIcon = parts.hasAverageIcon = true;
+    layout = QVDashboardCellLayout::make(parts);
     EXPECT_EQ(layout.categoryIcon, QRectF(4 + 12, 4 + 8, 25, 28));
     EXPECT_EQ(layout.title.left(), 4 + 41);
     EXPECT_EQ(layout.average.left(), 4 + 41);
-    EXPECT_EQ(layout.averageIcon.left(), layout.average.right() + 1.5);
-    EXPECT_EQ(layout.averageIcon.size(), QSizeF(7.5, layout.average.height()));
+    EXPECT_EQ(layout.averageIcon, QRectF(layout.average.right() + 1.5, 4 + 26.5, 7.5, 13));
 }
 
-TEST(DashboardCellLayout, RightToLeftMirrorsEveryFrame) {
-    auto mirrored = content(60, 90);
-    mirrored.hasCategoryIcon = mirrored.hasAverageIcon = true;
-    const auto leftToRight = QVDashboardCellLayout::make(mirrored);
-    mirrored.rightToLeft = true;
-    const auto layout = QVDashboardCellLayout::make(mirrored);
-    const auto isMirrored = [](const QRectF& a, const QRectF& b) {
-        return a.size() == b.size() && a.top() == b.top() && qAbs(a.left() + b.right() - 375) < 1e-9;
-    };
-    EXPECT_TRUE(isMirrored(layout.title, leftToRight.title));
-    EXPECT_TRUE(isMirrored(layout.value, leftToRight.value));
-    EXPECT_TRUE(isMirrored(layout.categoryIcon, leftToRight.categoryIcon));
-    EXPECT_TRUE(isMirrored(layout.average, leftToRight.average));
-    EXPECT_TRUE(isMirrored(layout.averageIcon, leftToRight.averageIcon));
-    EXPECT_TRUE(isMirrored(layout.lastUpdated, leftToRight.lastUpdated));
-    EXPECT_EQ(layout.chart, leftToRight.chart);
-    EXPECT_EQ(layout.value.left(), 4 + 11);
-}
-
-TEST(DashboardCellLayout, FontsShrinkInStepsOfFivePercentUntilBothTextsFit) {
+TEST(DashboardCellLayout, FontsOfALineShrinkInStepsOfFivePercentUntilBothTextsFit) {
     const double room = 367 - 24 - 8;  // without an icon
-    EXPECT_EQ(QVDashboardCellLayout::make(content(room - 100, 100)).fontFactor, 1);
-    EXPECT_EQ(QVDashboardCellLayout::make(content(room - 99, 100)).fontFactor, 0.95);
-    EXPECT_EQ(QVDashboardCellLayout::make(content(room / 0.72 - 100, 100)).fontFactor, 0.70);
-    EXPECT_EQ(QVDashboardCellLayout::make(content(3000, 100)).fontFactor, 0.6) << "no further";
-    auto withIcon = content(room - 37 - 4 - 100, 100);
-    withIcon.hasCategoryIcon = true;
-    EXPECT_EQ(QVDashboardCellLayout::make(withIcon).fontFactor, 1);
-    withIcon.titleWidth = [=](double factor) { return (room - 37 - 4 - 99) * factor; };
-    EXPECT_EQ(QVDashboardCellLayout::make(withIcon).fontFactor, 0.95);
-}
-
-TEST(DashboardCellLayout, TextsThatStillDoNotFitNeverOverlap) {
-    for (const double title : {300.0, 500.0, 600.0, 5000.0})
-        for (const double value : {100.0, 200.0, 400.0, 5000.0})
-            for (const double width : {320.0, 375.0, 20.0}) {
-                auto tight = content(title, value);
-                tight.width = width;
-                const auto layout = QVDashboardCellLayout::make(tight);
-                EXPECT_GE(layout.title.width(), 0);
-                EXPECT_GE(layout.value.width(), 0);
-                if (layout.title.width() > 0 && width > 100) {
-                    EXPECT_LE(layout.title.right() + 8, layout.value.left() + 1e-9);
-                }
-            }
-    // 400 and 200 at 60 % are 240 and 120: the value gives way by what is missing.
+    EXPECT_EQ(QVDashboardCellLayout::make(content(room - 100, 100)).titleFactor, 1);
+    EXPECT_EQ(QVDashboardCellLayout::make(content(room - 99, 100)).titleFactor, 0.95);
+    EXPECT_EQ(QVDashboardCellLayout::make(content(room / 0.72 - 100, 100)).valueFactor, 0.70);
+    // 400 and 200 at 60 %, and no further, are 240 and 120: the value gives way by what is missing.
     const auto layout = QVDashboardCellLayout::make(content(400, 200));
-    EXPECT_EQ(layout.fontFactor, 0.6);
+    EXPECT_EQ(layout.titleFactor, 0.6);
     EXPECT_EQ(layout.title.width(), 240);
     EXPECT_EQ(layout.value.left(), 4 + 12 + 240 + 8);
+
+    auto second = content(60, 90);
+    second.average.width = 367 - 11 - 12 - 8 - 79;
+    EXPECT_EQ(QVDashboardCellLayout::make(second).lastUpdatedFactor, 0.95);
+    second.average.width = 1000;
+    EXPECT_EQ(QVDashboardCellLayout::make(second).averageFactor, 0.6);
 }
 
-TEST(DashboardCellLayout, TheAverageGivesWayToTheLastUpdate) {
-    auto wide = content(60, 90);
-    wide.averageWidth = 300;
-    auto layout = QVDashboardCellLayout::make(wide);
-    EXPECT_EQ(layout.average.right() + 8, layout.lastUpdated.left());
-    EXPECT_EQ(layout.lastUpdated.width(), 80);
-    wide.lastUpdatedWidth = 340;
-    EXPECT_EQ(QVDashboardCellLayout::make(wide).average.width(), 0);
-    wide.lastUpdatedWidth = 0;
-    EXPECT_EQ(QVDashboardCellLayout::make(wide).average.width(), 300);
+/// Anything that cards are asked to hold.
+QVDashboardCellContent anyContent() {
+    QVDashboardCellContent content;
+    content.width = *rc::gen::elementOf(std::vector<double>{320, 360.2, 375, 412, 768});
+    content.screenScale = *rc::gen::element(1.0, 1.5, 2.0, 3.0);
+    content.textScale = *rc::gen::inRange(100, 201) / 100.0;
+    content.rightToLeft = *rc::gen::arbitrary<bool>();
+    content.hasCategoryIcon = *rc::gen::arbitrary<bool>();
+    content.hasAverageIcon = *rc::gen::arbitrary<bool>();
+    // How far letters reach from the baseline, in parts of the font's size: from Latin to Arabic.
+    const double above = *rc::gen::inRange(70, 96) / 100.0, below = *rc::gen::inRange(0, 46) / 100.0;
+    const auto text = [&](double size, int longest) {
+        const double points = size * content.textScale;
+        return Text{*rc::gen::inRange(0, longest) * points / 2, above * points, below * points};
+    };
+    content.title = text(19, 60);
+    content.value = text(19, 40);
+    content.average = text(11, 70);
+    content.lastUpdated = text(11, 50);
+    content.secondLineAscent = 1.07 * 11 * content.textScale;
+    content.secondLineDescent = 0.29 * 11 * content.textScale;
+    return content;
 }
 
-TEST(DashboardCellLayout, FramesLieOnThePixelGrid) {
-    auto odd = content(60.3, 90.7);
-    odd.screenScale = 3;
-    odd.firstLineAscent = 17.67;
-    odd.width = 360.2;
-    for (const bool rightToLeft : {false, true}) {
-        odd.rightToLeft = rightToLeft;
-        const auto layout = QVDashboardCellLayout::make(odd);
-        for (const QRectF& frame : {layout.title, layout.value, layout.average, layout.lastUpdated})
-            for (const double value : {frame.x(), frame.y(), frame.width(), frame.height()})
-                EXPECT_NEAR(value * 3, qRound(value * 3), 1e-6) << rightToLeft;
+/// The text is whole, or its font as small as it may become.
+void expectWhole(const QRectF& frame, const Text& text, double factor) {
+    RC_ASSERT(frame.width() >= text.width * factor - 1e-6 || factor <= 0.6);
+}
+
+RC_GTEST_PROP(DashboardCellLayout, HoldsWhateverItIsGiven, ()) {
+    const QVDashboardCellContent given = anyContent();
+    const auto layout = QVDashboardCellLayout::make(given);
+    expectWhole(layout.title, given.title, layout.titleFactor);
+    expectWhole(layout.value, given.value, layout.valueFactor);
+    expectWhole(layout.average, given.average, layout.averageFactor);
+    expectWhole(layout.lastUpdated, given.lastUpdated, layout.lastUpdatedFactor);
+
+    const std::vector<QRectF> frames{layout.categoryIcon, layout.title,       layout.value,
+                                     layout.average,      layout.averageIcon, layout.lastUpdated};
+    for (size_t i = 0; i < frames.size(); ++i) {
+        if (frames[i].isEmpty()) continue;
+        RC_ASSERT(layout.background.contains(frames[i]));
+        RC_ASSERT(frames[i].bottom() <= layout.chart.top() + 1 / given.screenScale);
+        for (const double value : {frames[i].x(), frames[i].y(), frames[i].width(), frames[i].height()})
+            RC_ASSERT(std::abs(value * given.screenScale - std::round(value * given.screenScale)) < 1e-6);
+        // A tail may come near an accent of the next line.
+        for (size_t j = 0; j < i; ++j)
+            RC_ASSERT((frames[i] & frames[j]).height() <= 2 * given.textScale + 1 / given.screenScale);
     }
+    const double plot = layout.chart.height() - QVDashboardCellLayout::axisGutterHeight(given.textScale) -
+                        1 / given.screenScale;
+    RC_ASSERT(plot >= QVDashboardCellLayout::kSmallestPlotHeight);
+
+    auto other = given;
+    other.rightToLeft = !given.rightToLeft;
+    const auto mirrored = QVDashboardCellLayout::make(other);
+    const double pixel = 1 / given.screenScale + 1e-9;
+    RC_ASSERT(mirrored.chart == layout.chart);
+    for (const auto& [a, b] : {std::pair(mirrored.title, layout.title),
+                               {mirrored.value, layout.value},
+                               {mirrored.average, layout.average},
+                               {mirrored.lastUpdated, layout.lastUpdated}})
+        RC_ASSERT(a.size() == b.size() && a.top() == b.top() &&
+                  std::abs(a.left() + b.right() - given.width) < pixel);
+}
+
+using CardPlots = test::CardTest;
+
+/// The first and the last column of each run of columns that are filled in a row of pixels.
+std::vector<std::pair<int, int>> runs(const QImage& image, int y) {
+    std::vector<std::pair<int, int>> found;
+    for (int x = 0; x < image.width(); ++x) {
+        if (qAlpha(image.pixel(x, y)) < 64) continue;
+        if (found.empty() || found.back().second != x - 1) found.emplace_back(x, x);
+        found.back().second = x;
+    }
+    return found;
+}
+
+TEST_F(CardPlots, NeighboursStayApartAndNothingReachesTheLabels) {
+    constexpr double kScale = 2;
+    for (const char* locale : {"en_US", "de_DE", "ar_EG", "hi_IN"})
+        for (const double textScale : {1.0, 1.5, 2.0})
+            for (const double width : {320.0, 375.0, 768.0}) {
+                setLook({locale, textScale});
+                for (const int id : {VSGroupID::Steps, VSGroupID::HeartRate, VSGroupID::SleepAnalysis}) {
+                    SCOPED_TRACE(testing::Message()
+                                 << locale << ' ' << textScale << ' ' << width << ' ' << id);
+                    const bool rows = id == VSGroupID::SleepAnalysis;
+                    const auto cell =
+                        card(group(id), rows ? QVTimeScope::Day : QVTimeScope::Month, width, kScale);
+                    const QImage fill = cell->chartItem()->chartRenderer()->chartFillImage();
+                    const QRectF background = cell->chartView().backgroundFrame();
+                    const double labels =
+                        rows ? cell->chartView().size().width() -
+                                   cell->chartItem()->chartRenderer()->chartInsets().right
+                             : background.left() +
+                                   std::min(cell->chartBackground().minimumLabelFrame().left(),
+                                            cell->chartBackground().maximumLabelFrame().left());
+                    EXPECT_GE(background.height(), QVDashboardCellLayout::kSmallestPlotHeight);
+                    for (int y = 0; y < fill.height(); y += 5) {
+                        const auto bars = runs(fill, y);
+                        for (size_t i = 1; i < bars.size(); ++i)
+                            EXPECT_LE(bars[i - 1].second + 1 - bars[i - 1].first,
+                                      0.8 * (bars[i].first - bars[i - 1].first) + 1)
+                                << y;
+                        if (!bars.empty()) EXPECT_LE(bars.back().second / kScale + 2, labels) << y;
+                    }
+                }
+            }
 }
 
 }  // namespace
