@@ -1,5 +1,7 @@
 #pragma once
 
+#include <gtest/gtest.h>
+
 #include <cmath>
 
 #include "Platform/Appearance.h"
