@@ -2,6 +2,7 @@
 
 #include <QDBusConnection>
 #include <QDBusMessage>
+#include <QDBusMetaType>
 #include <QDBusPendingCallWatcher>
 #include <QDBusPendingReply>
 #include <QFile>
@@ -31,6 +32,9 @@ void listenToDesktopSetting(QObject* receiver, const char* slotName, const QStri
 
 void listenToDesktopSetting(QDBusConnection bus, QObject* receiver, const char* slotName,
                             const QString& group, const QString& key) {
+    // A slot with a type that the library does not know yet is refused without a word, and no change is heard
+    // of.
+    qDBusRegisterMetaType<QDBusVariant>();
     const QByteArray slot = QByteArray("1") + slotName + "(QString,QString,QDBusVariant)";
     bus.connect(kService, kPath, kInterface, QStringLiteral("SettingChanged"), receiver, slot.constData());
     auto read = QDBusMessage::createMethodCall(kService, kPath, kInterface, QStringLiteral("Read"));

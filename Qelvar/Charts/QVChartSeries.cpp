@@ -59,7 +59,8 @@ double QVChartSeries::xForChartPoint(const QVChartPoint& point) const {
     if (minXValue_ && maxXValue_)
         position = relativePosition(VSSecondsFromDuration(point.xValue() - *minXValue_), 0,
                                     VSSecondsFromDuration(*maxXValue_ - *minXValue_));
-    return std::floor(position * renderSize().width()) + insets_.left;
+    // A product of fractions ends a hair below the point that it means, and neighbours would come nearer.
+    return std::floor(position * renderSize().width() + 1e-6) + insets_.left;
 }
 
 double QVChartSeries::yForValue(std::optional<double> value) const {

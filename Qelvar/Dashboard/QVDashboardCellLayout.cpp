@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <functional>
 
 namespace {
 
@@ -30,10 +31,10 @@ constexpr double kTallestHeader = 91;
 
 using Text = QVDashboardCellContent::Text;
 
-/// The largest factor of the fonts with which texts of that natural width fit; the smallest when none does.
-double fittingFactor(double width, double room, int smallestPercent) {
+/// The largest factor of the fonts with which texts of that width fit; the smallest when none does.
+double fittingFactor(const std::function<double(double)>& width, double room, int smallestPercent) {
     for (int percent = 100; percent > smallestPercent; percent -= kFontStepPercent)
-        if (width * percent <= room * 100) return percent / 100.0;
+        if (width(percent / 100.0) <= room) return percent / 100.0;
     return smallestPercent / 100.0;
 }
 
@@ -73,14 +74,16 @@ struct Header {
  private:
     /// How two texts fit, the leading one with `extra` points beside it.
     Pair fit(const Text& leading, double extra, const Text& trailing, double room) const {
-        const double factor =
-            fittingFactor(leading.width + extra + trailing.width, room, kSmallestFontPercent);
+        const auto leadingWidth = [&](double factor) { return widthOf(leading, factor) + extra * factor; };
+        const auto trailingWidth = [&](double factor) { return widthOf(trailing, factor); };
+        const auto bothWidths = [&](double factor) { return leadingWidth(factor) + trailingWidth(factor); };
+        const double factor = fittingFactor(bothWidths, room, kSmallestFontPercent);
         if (scale_ <= 1 || factor >= kSharedLineFactor || leading.width <= 0 || trailing.width <= 0)
             return {factor, factor, false};
         // No further than to the size that texts have for others.
         const int smallest = std::min(kSmallestFontPercent, static_cast<int>(std::ceil(100 / scale_)));
-        return {fittingFactor(leading.width + extra, line_, smallest),
-                fittingFactor(trailing.width, line_, smallest), true};
+        return {fittingFactor(leadingWidth, line_, smallest), fittingFactor(trailingWidth, line_, smallest),
+                true};
     }
 
     /// What the text takes of a line: whole pixels, so that nothing is cut.
