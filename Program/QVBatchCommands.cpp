@@ -1,7 +1,9 @@
 #include <charconv>
+#include <cstdio>
 
 #include "Program/QVCommand.h"
 #include "Program/QVTabOutput.h"
+#include "Vessa/VSStoreMigration.h"
 
 namespace {
 
@@ -38,6 +40,7 @@ QVExitStatus runUndo(const QVCommandContext& context) {
         return QVFail({VSErrorCode::NotFound, "there is no store in " + context.storeFolder.string()});
     VSHealthStore::Options options;
     options.createIfMissing = false;
+    options.quiet = VSDuration::max();  // at the end, not in between
     auto store = VSHealthStore::open(context.storeFolder, options);
     if (!store) return QVFail(store.error());
     const auto report = (*store)->undoBatch(batch);
@@ -46,7 +49,16 @@ QVExitStatus runUndo(const QVCommandContext& context) {
     output.row({"removed", "kept", "gone", "characteristics"});
     output.row({std::to_string(report->removed), std::to_string(report->kept), std::to_string(report->gone),
                 std::to_string(report->characteristics)});
-    return finish(output);
+    const QVExitStatus status = finish(output);
+    // Where others read or write just now, a program that has the store open does it when they are through.
+    (void)(*store)->cleanUp();
+    for (const auto& copy : VSStoreMigration::keptCopies(context.storeFolder))
+        std::fprintf(
+            stderr,
+            "qelvar: %s is the store as it was before its format changed, and still holds what it held "
+            "then; delete the file when you need it no more\n",
+            copy.c_str());
+    return status;
 }
 
 }  // namespace
@@ -69,7 +81,8 @@ const QVCommand QVUndoCommand{"undo",
 Takes back what an import did; `qelvar batches` lists the imports by number. What it added is removed, except
 what another import had in its documents too. What was entered by hand stays. Characteristics that it set and
 that have not been changed since are not set again, unless another import told them too. It is done at once,
-without a question, and as a whole; importing the same documents again brings everything back.
+without a question, and as a whole; importing the same documents again brings everything back. What was
+removed is overwritten on the disk and its space given back.
 
 Standard output: removed, kept (for another import), gone (what had been deleted before), characteristics.
 )",

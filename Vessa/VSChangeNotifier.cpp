@@ -28,8 +28,12 @@ void touch(const std::filesystem::path& file) {
 
 }  // namespace
 
-VSChangeNotifier::VSChangeNotifier(std::filesystem::path folder, VSReaderPool& readers, Handler handler)
-    : folder_(std::move(folder)), readers_(readers), handler_(std::move(handler)) {
+VSChangeNotifier::VSChangeNotifier(std::filesystem::path folder, VSReaderPool& readers,
+                                   std::string application, Handler handler)
+    : folder_(std::move(folder)),
+      readers_(readers),
+      application_(std::move(application)),
+      handler_(std::move(handler)) {
     wakeDescriptor_ = ::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK);
     watchDescriptor_ = ::inotify_init1(IN_CLOEXEC | IN_NONBLOCK);
     if (watchDescriptor_ >= 0 &&
@@ -45,8 +49,7 @@ VSChangeNotifier::~VSChangeNotifier() {
 }
 
 void VSChangeNotifier::start(std::shared_ptr<void> owner) {
-    const auto now = readers_.read([](VSStoreReader& reader) { return reader.typeChanges(); });
-    if (now) known_ = *now;
+    if (auto now = read()) known_ = std::move(*now);
     thread_ = std::thread([this, keep = std::move(owner)]() mutable {
         run();
         keep.reset();  // may end the life of this notifier
@@ -109,18 +112,29 @@ void VSChangeNotifier::run() {
     }
 }
 
+VSResult<VSChangeNotifier::State> VSChangeNotifier::read() {
+    return readers_.read([this](VSStoreReader& reader) {
+        return State{reader.typeChanges(), reader.defaultTexts(application_)};
+    });
+}
+
 void VSChangeNotifier::look() {
-    const auto now = readers_.read([](VSStoreReader& reader) { return reader.typeChanges(); });
+    auto now = read();
     if (!now) {
         VSLog(vs_isDatabaseAccessibilityError(now.error()) ? VSLogLevel::Debug : VSLogLevel::Error,
               "The store's changes cannot be read: " + now.error().message);
         return;
     }
-    std::vector<Change> changes;
-    for (const auto& [type, number] : *now) {
-        int64_t& known = known_[type];
-        if (number > known) changes.push_back({type, number});
+    Changes changes;
+    for (const auto& [type, number] : now->types) {
+        int64_t& known = known_.types[type];
+        if (number > known) changes.types.push_back({type, number});
         known = number;
     }
-    if (!changes.empty()) handler_(changes);
+    for (const auto& [key, text] : now->defaults) {
+        const auto known = known_.defaults.find(key);
+        if (known == known_.defaults.end() || known->second != text) changes.defaultKeys.push_back(key);
+    }
+    known_.defaults = std::move(now->defaults);
+    handler_(changes);
 }

@@ -4,23 +4,29 @@
 #include <functional>
 #include <map>
 #include <memory>
+#include <string>
 #include <thread>
 #include <vector>
 
 #include "Vessa/VSReaderPool.h"
 
-/// Learns of commits of this and of other processes and tells which types they changed. Other processes are
-/// heard of through a file in the folder that every commit touches.
+/// Learns of commits of this and of other processes and tells which types and default values they changed.
+/// Other processes are heard of through a file in the folder that every commit touches.
 class VSChangeNotifier {
  public:
     struct Change {
         int type;
         int64_t number;
     };
-    /// Called on the notifier's thread, one call at a time.
-    using Handler = std::function<void(const std::vector<Change>&)>;
+    struct Changes {
+        std::vector<Change> types;
+        std::vector<std::string> defaultKeys;  // of the application's default values
+    };
+    /// Called on the notifier's thread, one call at a time, after each look; there may be no changes.
+    using Handler = std::function<void(const Changes&)>;
 
-    VSChangeNotifier(std::filesystem::path folder, VSReaderPool& readers, Handler handler);
+    VSChangeNotifier(std::filesystem::path folder, VSReaderPool& readers, std::string application,
+                     Handler handler);
     ~VSChangeNotifier();
     VSChangeNotifier(const VSChangeNotifier&) = delete;
     VSChangeNotifier& operator=(const VSChangeNotifier&) = delete;
@@ -35,13 +41,21 @@ class VSChangeNotifier {
  private:
     void run();
     void look();
+    /// By key, as stored.
+    using Defaults = std::map<std::string, std::string>;
+    struct State {
+        std::map<int, int64_t> types;
+        Defaults defaults;
+    };
+    VSResult<State> read();
     bool noticeTouched();
 
     const std::filesystem::path folder_;
     VSReaderPool& readers_;
+    const std::string application_;
     const Handler handler_;
     int wakeDescriptor_ = -1, watchDescriptor_ = -1;
     std::atomic<bool> finishing_ = false;
-    std::map<int, int64_t> known_;  // of the thread
-    std::thread thread_;            // of the thread that starts and finishes
+    State known_;         // of the thread
+    std::thread thread_;  // of the thread that starts and finishes
 };

@@ -9,6 +9,8 @@
 #include <cstring>
 #include <thread>
 
+#include "Vessa/VSPageScrubber.h"
+
 namespace {
 
 VSErrorCode errorCode(int code) {
@@ -226,6 +228,7 @@ VSDatabase::VSDatabase(const std::filesystem::path& file, Mode mode, VSDuration 
         close();
         throw VSDatabaseFailure(error);
     }
+    if (mode == Mode::Write) scrubber_ = std::make_unique<VSPageScrubber>(handle_);
     sqlite3_busy_handler(handle_, &VSDatabase::waitForLock, this);
     if (mode == Mode::ReadAlone)
         sqlite3_exec(handle_, "PRAGMA locking_mode = EXCLUSIVE", nullptr, nullptr, nullptr);
@@ -283,6 +286,22 @@ VSStatement VSDatabase::use(std::string_view sql) {
                                         SQLITE_PREPARE_PERSISTENT, &statement, nullptr);
     if (code) fail(code);
     return VSStatement(*this, statement, list);
+}
+
+void VSDatabase::define(const char* name, int count, Predicate block) {
+    constexpr int mostArguments = 8;
+    const auto call = [](sqlite3_context* context, int given, sqlite3_value** values) {
+        int64_t arguments[mostArguments];
+        for (int index = 0; index < given; ++index) arguments[index] = sqlite3_value_int64(values[index]);
+        const auto& predicate = *static_cast<const Predicate*>(sqlite3_user_data(context));
+        sqlite3_result_int(context, predicate(arguments) ? 1 : 0);
+    };
+    const int code = count > mostArguments ? SQLITE_TOOBIG
+                                           : sqlite3_create_function_v2(
+                                                 handle_, name, count, SQLITE_UTF8 | SQLITE_DIRECTONLY,
+                                                 new Predicate(std::move(block)), call, nullptr, nullptr,
+                                                 [](void* data) { delete static_cast<Predicate*>(data); });
+    if (code) fail(code);
 }
 
 void VSDatabase::execute(const char* sql) {

@@ -19,6 +19,7 @@
 struct sqlite3;
 struct sqlite3_stmt;
 class VSDatabase;
+class VSPageScrubber;
 
 /// What every failure of the database becomes inside the store; it never leaves the store's operations,
 /// which answer with the error it holds.
@@ -86,6 +87,10 @@ class VSDatabase {
 
     /// The statement of this text, prepared once and kept.
     VSStatement use(std::string_view sql);
+    /// Makes `block` known to SQL as name(integer, ...), with so many arguments (NULL is 0), in place of what
+    /// had the name before. It must not throw.
+    using Predicate = std::function<bool(const int64_t* arguments)>;
+    void define(const char* name, int count, Predicate block);
     /// One or several statements without parameters and rows.
     void execute(const char* sql);
     int64_t integer(std::string_view sql);
@@ -113,6 +118,7 @@ class VSDatabase {
     void close();
 
     sqlite3* handle_ = nullptr;
+    std::unique_ptr<VSPageScrubber> scrubber_;  // of what this connection writes; outlives the handle
     VSDuration patience_, longWait_{};
     const Deadline* deadline_ = nullptr;
     const std::atomic<bool>* giveUp_ = nullptr;

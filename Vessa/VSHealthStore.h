@@ -85,6 +85,9 @@ class VSHealthStore {
         bool survivesPowerLoss = true;
         /// How long an operation that changes something waits for other programs that hold the store.
         VSDuration patience = std::chrono::minutes(2);
+        /// After a change and so long a time in which nothing was asked, the connection cleans the store's
+        /// files as `cleanUp` does, a little at a time. The longest duration: never by itself.
+        VSDuration quiet = std::chrono::seconds(1);
     };
     /// Waits. Opens or makes the database in the folder (made with mode 0700). A store of an older format is
     /// brought to this one after a copy was kept beside it, which may take a while; NotAccessible while other
@@ -156,6 +159,18 @@ class VSHealthStore {
 
     // Default values of the application of the connection; each has its own. None: not set.
     virtual void setDefaultValue(VSValue value, std::string key, Completion completion) = 0;
+    /// Reads, changes and writes in one transaction, so that nothing that others wrote is lost. `change` gets
+    /// the value and answers the new one (none: it stays as it is), on the store's thread; the completion
+    /// gets what is stored then.
+    using DefaultValueChange = std::function<std::optional<VSValue>(const std::optional<VSValue>& current)>;
+    virtual void updateDefaultValue(
+        std::string key, DefaultValueChange change,
+        std::function<void(const VSResult<std::optional<VSValue>>&)> completion) = 0;
+    /// Calls the handler with the key of each default value that was changed, by this or another process,
+    /// until the answer and all its copies are gone (a call that is under way goes on). On a thread of the
+    /// store's.
+    [[nodiscard]] virtual std::shared_ptr<const void> observeDefaultValues(
+        std::function<void(const std::string& key)> handler) = 0;
     virtual void getDefaultValue(std::string key,
                                  std::function<void(const VSResult<std::optional<VSValue>>&)> handler) = 0;
 
@@ -248,6 +263,9 @@ class VSHealthStore {
     /// that no other import told are unset. NotFound: there is no such batch.
     virtual VSResult<VSUndoReport> undoBatch(int64_t batch) = 0;
 
+    /// Waits. What is deleted is overwritten in the database file at once; this cuts the log, which may hold
+    /// copies, and gives free space back to the disk. NotAccessible: others read or write just now.
+    virtual VSStatus cleanUp() = 0;
     virtual VSResult<int64_t> databaseSizeInBytes() = 0;
     virtual const std::filesystem::path& folder() const = 0;
 };

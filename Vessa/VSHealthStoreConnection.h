@@ -32,6 +32,12 @@ class VSHealthStoreConnection final : public VSHealthStore {
         std::function<void(const VSResult<std::optional<VSMedicalIDData>>&)> completion) override;
     void updateMedicalIDData(VSMedicalIDData data, Completion completion) override;
     void setDefaultValue(VSValue value, std::string key, Completion completion) override;
+    void updateDefaultValue(std::string key, DefaultValueChange change,
+                            std::function<void(const VSResult<std::optional<VSValue>>&)> completion) override;
+    std::shared_ptr<const void> observeDefaultValues(
+        std::function<void(const std::string& key)> handler) override {
+        return core_->observeDefaultValues(std::move(handler));
+    }
     void getDefaultValue(std::string key,
                          std::function<void(const VSResult<std::optional<VSValue>>&)> handler) override;
     void orderedSources(const VSObjectType* type,
@@ -50,6 +56,7 @@ class VSHealthStoreConnection final : public VSHealthStore {
     VSResult<VSCheckReport> check() override;
     VSResult<std::unique_ptr<ImportTransaction>> beginImport(const std::string& name, VSDuration patience,
                                                              const std::atomic<bool>* giveUp) override;
+    VSStatus cleanUp() override { return core_->cleanUp(); }
     VSResult<int64_t> databaseSizeInBytes() override;
     const std::filesystem::path& folder() const override { return core_->folder; }
     void allSources(std::function<void(const VSResult<std::vector<VSSource>>&)> completion) override;

@@ -2,6 +2,31 @@
 
 #include "Vessa/VSStoreCharacteristics.h"
 
+namespace {
+
+std::optional<VSValue> readDefaultValue(VSDatabase& database, const std::string& application,
+                                        const std::string& key) {
+    auto row = database.use("SELECT value FROM defaults WHERE application = ? AND key = ?");
+    if (!row.bindText(1, application).bindText(2, key).step()) return std::nullopt;
+    auto value = VSValue::fromSerialized(row.text(0));
+    if (!value)
+        throw VSDatabaseFailure({VSErrorCode::Corrupt, "the default value " + key + " cannot be read"});
+    return value;
+}
+
+void writeDefaultValue(VSDatabase& database, const std::string& application, const std::string& key,
+                       const VSValue& value) {
+    database
+        .use(
+            "INSERT INTO defaults VALUES (?1, ?2, ?3) ON CONFLICT(application, key) DO UPDATE SET value = ?3")
+        .bindText(1, application)
+        .bindText(2, key)
+        .bindText(3, value.serialized())
+        .run();
+}
+
+}  // namespace
+
 VSResult<std::optional<VSBirthDate>> VSHealthStoreConnection::dateOfBirth() {
     const auto* type = VSObjectType::dataTypeWithCode(VSCode::DateOfBirth);
     return readOf(type, {}, [type](VSStoreReader& reader) -> std::optional<VSBirthDate> {
@@ -44,31 +69,40 @@ void VSHealthStoreConnection::setDefaultValue(VSValue value, std::string key, Co
     core_->write(
         [application = core_->options.applicationIdentifier, value = std::move(value),
          key = std::move(key)](VSStoreWriter& writer) {
-            writer.database()
-                .use(
-                    "INSERT INTO defaults VALUES (?1, ?2, ?3) ON CONFLICT(application, key) DO UPDATE "
-                    "SET value = ?3")
-                .bindText(1, application)
-                .bindText(2, key)
-                .bindText(3, value.serialized())
-                .run();
+            writeDefaultValue(writer.database(), application, key, value);
             return VSStatus();
         },
         std::move(completion));
 }
 
+void VSHealthStoreConnection::updateDefaultValue(
+    std::string key, DefaultValueChange change,
+    std::function<void(const VSResult<std::optional<VSValue>>&)> completion) {
+    auto stored = std::make_shared<std::optional<VSValue>>();
+    core_->write(
+        [application = core_->options.applicationIdentifier, key = std::move(key), change = std::move(change),
+         stored](VSStoreWriter& writer) {
+            *stored = readDefaultValue(writer.database(), application, key);
+            if (auto changed = change(*stored); changed && changed != *stored) {
+                writeDefaultValue(writer.database(), application, key, *changed);
+                *stored = std::move(changed);
+            }
+            return VSStatus();
+        },
+        [completion = std::move(completion), stored](const VSStatus& status) {
+            if (!completion) return;
+            if (status)
+                completion(std::move(*stored));
+            else
+                completion(status.error());
+        });
+}
+
 void VSHealthStoreConnection::getDefaultValue(
     std::string key, std::function<void(const VSResult<std::optional<VSValue>>&)> handler) {
     core_->readLater(
-        [application = core_->options.applicationIdentifier,
-         key = std::move(key)](VSStoreReader& reader) -> std::optional<VSValue> {
-            auto row = reader.database().use("SELECT value FROM defaults WHERE application = ? AND key = ?");
-            if (!row.bindText(1, application).bindText(2, key).step()) return std::nullopt;
-            auto value = VSValue::fromSerialized(row.text(0));
-            if (!value)
-                throw VSDatabaseFailure(
-                    {VSErrorCode::Corrupt, "the default value " + key + " cannot be read"});
-            return value;
+        [application = core_->options.applicationIdentifier, key = std::move(key)](VSStoreReader& reader) {
+            return readDefaultValue(reader.database(), application, key);
         },
         std::move(handler));
 }

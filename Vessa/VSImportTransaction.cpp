@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "Vessa/Base/VSEnvironment.h"
+#include "Vessa/Base/VSLog.h"
 #include "Vessa/VSStoreCharacteristics.h"
 #include "Vessa/VSStoreSchema.h"
 
@@ -70,7 +71,18 @@ VSImportTransaction::VSImportTransaction(std::shared_ptr<VSStoreCore> core,
     while (types.step()) hadSamples_[static_cast<size_t>(types.integer(0))] = true;
 }
 
-VSImportTransaction::~VSImportTransaction() = default;
+VSImportTransaction::~VSImportTransaction() {
+    if (!transaction_) return;
+    // What does not fit into memory is in the log already, also of an import that nobody wants any more.
+    transaction_.reset();
+    database_->setPatience(VSDuration(0));  // who is in the way ends some time, and then the cleaner comes
+    try {
+        VSCutLog(*database_);
+    } catch (const VSDatabaseFailure& failure) {
+        VSLog(VSLogLevel::Debug, "The store's log cannot be cut now: " + failure.error().message);
+    }
+    core_->filesChanged();
+}
 
 VSError VSImportTransaction::ended() const {
     return failure_.value_or(VSError{VSErrorCode::Invalid, "the import has ended"});

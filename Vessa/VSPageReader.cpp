@@ -115,6 +115,24 @@ VSPageReader::Kind VSPageReader::kind(uint32_t page) const {
     }
 }
 
+bool VSPageReader::isPointerMap(uint32_t page) const {
+    constexpr uint32_t entrySize = 5, kinds = 5;
+    if (page < 2 || page > pageCount_) return false;
+    // The file's head says whether there is such a map; without it the map's first page, of which each entry
+    // begins with the kind of a page.
+    const auto looksLikeMap = [this] {
+        const uint8_t* first = at(2);
+        for (uint32_t entry = 0; entry < std::min(usable_ / entrySize, pageCount_ - 2); ++entry)
+            if (first[entry * entrySize] < 1 || first[entry * entrySize] > kinds) return false;
+        return pageCount_ > 2;
+    };
+    const bool hasHead = std::memcmp(bytes_, "SQLite format 3", 16) == 0;
+    if (hasHead ? number(bytes_ + 52, 4) == 0 : !looksLikeMap()) return false;
+    constexpr uint32_t lockBytes = 1 << 30;
+    const uint32_t place = page - (page - 2) % (usable_ / entrySize + 1);
+    return page == (place == lockBytes / pageSize_ + 1 ? place + 1 : place);
+}
+
 uint32_t VSPageReader::cellCount(uint32_t page) const {
     const Kind k = kind(page);
     if (k == Kind::None || k == Kind::TableInner) return 0;

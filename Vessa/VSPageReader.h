@@ -61,6 +61,8 @@ class VSPageReader {
     }
     /// The pages below an inner page, as far as they exist. False: some pointers lead nowhere.
     bool children(uint32_t page, std::vector<uint32_t>& pages) const;
+    /// Whether a page is of the map that a file which can shrink has beside its trees.
+    bool isPointerMap(uint32_t page) const;
     /// The pages that hold nothing, as the file's own list says; none where the list is damaged.
     std::vector<uint32_t> freePages() const;
 

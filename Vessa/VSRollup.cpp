@@ -13,6 +13,8 @@ static_assert(std::endian::native == std::endian::little, "the rollups on disk a
 namespace {
 
 constexpr size_t entriesKept = 512;  // 4 MB
+/// Reading on is faster than finding the next place.
+constexpr int64_t daysReadForNothing = 2;
 constexpr int dayBits = 28, sourceBits = 20;
 constexpr int64_t dayOffset = int64_t{1} << (dayBits - 1);
 constexpr size_t bitmapSize = VSQuartersPerDay / 8;
@@ -232,7 +234,12 @@ void VSRollupWriter::add(int type, int64_t source, int64_t start, int64_t durati
 void VSRollupWriter::rebuild(int type, int64_t source, int64_t start, int64_t duration) {
     if (duration > VSStoreSchema::longSpan.count()) return;
     forEachDay(start, duration, [&](int64_t day, int first, int last) {
-        rebuild_[VSRollupSlot(type, source, day)].include(first, last);
+        const Place place{type, day, source};
+        if (!recentRebuild_ || recentPlace_ != place) {
+            recentRebuild_ = &rebuild_[place];
+            recentPlace_ = place;
+        }
+        recentRebuild_->include(first, last);
     });
 }
 
@@ -255,18 +262,59 @@ void VSRollupWriter::writeEntries() {
 
 void VSRollupWriter::flush(VSStoreProvenances& provenances) {
     writeEntries();
-    for (const auto& [slot, changed] : rebuild_) {
-        write(slot, VSRollupFromSamples(database_, provenances, VSRollupTypeOfSlot(slot),
-                                        VSRollupSourceOfSlot(slot), VSRollupDayOfSlot(slot)));
-        note(slot, changed);
+    for (auto first = rebuild_.cbegin(); first != rebuild_.cend();) {
+        // Days close to each other are read in one go.
+        auto last = first;
+        for (int64_t day = first->first.day;
+             last != rebuild_.cend() && last->first.type == first->first.type &&
+             last->first.day <= day + daysReadForNothing;
+             ++last)
+            day = last->first.day;
+        makeAnew(first, last, provenances);
+        first = last;
     }
     rebuild_.clear();
+    recentRebuild_ = nullptr;
+}
+
+/// Of one type, in one pass over the samples that touch the days from the first to the last.
+void VSRollupWriter::makeAnew(Places::const_iterator first, Places::const_iterator last,
+                              VSStoreProvenances& provenances) {
+    const int type = first->first.type;
+    std::map<Place, VSDayRollup> made;
+    const auto writeDaysBefore = [&](int64_t day) {
+        for (; first != last && first->first.day < day; ++first) {
+            const int64_t slot = VSRollupSlot(type, first->first.source, first->first.day);
+            const auto found = made.extract(first->first);
+            write(slot, found ? found.mapped() : VSDayRollup());
+            note(slot, first->second);
+        }
+    };
+    auto longest = database_.use("SELECT longest FROM types WHERE type = ?");
+    const int64_t back = longest.bind(1, type).step() ? longest.integer(0) : VSStoreSchema::longSpan.count();
+    const int64_t begin = first->first.day * VSDayMicroseconds,
+                  end = (std::prev(last)->first.day + 1) * VSDayMicroseconds;
+    auto rows = database_.use(
+        "SELECT start, duration, value, provenance FROM samples WHERE type = ?1 AND start >= ?2 AND start < "
+        "?3 AND start + duration >= ?4 AND duration <= " VS_LONG_SPAN_SQL " ORDER BY start");
+    rows.bind(1, type).bind(2, begin - back).bind(3, end).bind(4, begin);
+    while (rows.step()) {
+        const int64_t start = rows.integer(0), duration = rows.integer(1);
+        writeDaysBefore(VSFloorDivide(start, VSDayMicroseconds));  // no sample that comes later touches them
+        const int64_t source = provenances.sourceOfProvenance(rows.integer(3));
+        forEachDay(start, duration, [&](int64_t day, int, int) {
+            const Place place{type, day, source};
+            if (rebuild_.contains(place)) made[place].add(day, start, duration, rows.real(2));
+        });
+    }
+    writeDaysBefore(INT64_MAX);
 }
 
 void VSRollupWriter::clear() {
     entries_.clear();
     lastEntry_ = nullptr;
     rebuild_.clear();
+    recentRebuild_ = nullptr;
     changes_.clear();
 }
 
@@ -282,22 +330,4 @@ void VSWriteRollupRow(VSDatabase& database, int64_t slot, const std::string& byt
         .bind(1, slot)
         .bindBlob(2, bytes.data(), bytes.size())
         .run();
-}
-
-VSDayRollup VSRollupFromSamples(VSDatabase& database, VSStoreProvenances& provenances, int type,
-                                int64_t source, int64_t day) {
-    auto statement = database.use(
-        "SELECT start, duration, value, provenance FROM samples WHERE type = ?1 AND start >= ?2 AND "
-        "start < ?3"
-        " AND start + duration >= ?4 AND duration <= " VS_LONG_SPAN_SQL);
-    const int64_t dayStart = day * VSDayMicroseconds;
-    auto longest = database.use("SELECT longest FROM types WHERE type = ?");
-    const int64_t back = longest.bind(1, type).step() ? longest.integer(0) : VSStoreSchema::longSpan.count();
-    statement.bind(1, type).bind(2, dayStart - back).bind(3, dayStart + VSDayMicroseconds).bind(4, dayStart);
-    VSDayRollup rollup;
-    while (statement.step()) {
-        if (provenances.sourceOfProvenance(statement.integer(3)) == source)
-            rollup.add(day, statement.integer(0), statement.integer(1), statement.real(2));
-    }
-    return rollup;
 }

@@ -118,7 +118,17 @@ class VSRollupWriter {
         VSDayRollup rollup;
         Changed changed;
     };
+    /// A day of one source to make anew. In the order in which samples are read: a type's days, of all
+    /// sources.
+    struct Place {
+        int type;
+        int64_t day, source;
+        auto operator<=>(const Place&) const = default;
+    };
+    using Places = std::map<Place, Changed>;
+
     Entry& entry(int64_t slot);
+    void makeAnew(Places::const_iterator first, Places::const_iterator last, VSStoreProvenances& provenances);
     void write(int64_t slot, const VSDayRollup& rollup);
     void writeEntries();
     void note(int64_t slot, const Changed& changed);
@@ -127,16 +137,14 @@ class VSRollupWriter {
     std::map<int64_t, std::unique_ptr<Entry>> entries_;
     int64_t lastSlot_ = 0;
     Entry* lastEntry_ = nullptr;
-    std::map<int64_t, Changed> rebuild_;
+    Places rebuild_;
+    Place recentPlace_{-1, 0, 0};
+    Changed* recentRebuild_ = nullptr;
     Changes changes_;
 };
 
 /// Writes a row of `rollups`, or removes it when there are no bytes.
 void VSWriteRollupRow(VSDatabase& database, int64_t slot, const std::string& bytes);
-
-/// The rollup of a day made anew from its samples: what `rollups` must hold, bit for bit.
-VSDayRollup VSRollupFromSamples(VSDatabase& database, VSStoreProvenances& provenances, int type,
-                                int64_t source, int64_t day);
 
 /// Makes all rollups, merged rows and noted orders of the store anew from its samples, in one pass, inside a
 /// writing transaction. REQUIRES: `type_sources` and `source_order` are right. Throws VSDatabaseFailure.

@@ -124,6 +124,8 @@ VSSalvageReader::VSSalvageReader(const std::filesystem::path& file, const std::f
     if (pages_.error()) return;
     known_.resize(size_t{pages_.pageCount()} + 1);
     for (const uint32_t page : pages_.freePages()) known_[page] = true;
+    for (uint32_t page = 2; page <= pages_.pageCount(); ++page)
+        if (pages_.isPointerMap(page)) known_[page] = true;
     readSchema(layout);
     for (size_t table = 1; table < roots_.size(); ++table) {
         if (roots_[table]) walk(static_cast<Table>(table), roots_[table]);

@@ -10,6 +10,7 @@ namespace {
 constexpr int readingThreadCount = 3;
 /// A store that is written to can be opened and read at once: whoever keeps others from that keeps all of it.
 constexpr VSDuration mostPatienceToRead = std::chrono::seconds(10);
+constexpr VSDuration patienceToClean = std::chrono::seconds(1);
 /// For all locks together that the last writes need.
 constexpr auto patienceToClose = std::chrono::seconds(5);
 
@@ -37,6 +38,8 @@ VSResult<std::shared_ptr<VSStoreCore>> VSStoreCore::open(const std::filesystem::
         core->notifier.start(core);
         core->readingThreads.start(readingThreadCount, core);
         if (core->writer_) core->writing_.start(1, core);
+        if (core->writer_ && options.quiet < VSDuration::max()) core->cleaner_.start();
+        core->cleaner_.wake();  // a process that was killed may have left something
         return core;
     } catch (const VSDatabaseFailure& failure) {
         VSError error = failure.error();
@@ -53,7 +56,9 @@ VSStoreCore::VSStoreCore(const std::filesystem::path& storeFolder, const VSHealt
       access(options.applicationIdentifier, options.applicationName),
       readers(folder, std::min(options.patience, mostPatienceToRead)),
       queries(readers, readingThreads, access),
-      notifier(folder, readers, [this](const auto& changes) { queries.typesChanged(changes); }) {
+      notifier(folder, readers, options.applicationIdentifier,
+               [this](const VSChangeNotifier::Changes& changes) { heard(changes); }),
+      cleaner_(folder, options.quiet, [this] { return isBusy(); }) {
     if (!database) return;
     closingDeadline_ = std::chrono::steady_clock::time_point::max();
     database->setDeadline(&closingDeadline_);
@@ -71,6 +76,7 @@ void VSStoreCore::close() {
     queries.stopAll();
     closingDeadline_ = std::chrono::steady_clock::now() + patienceToClose;
     writing_.finish();
+    cleaner_.finish();
     notifier.finish();
     readingThreads.finish();
 }
@@ -116,6 +122,53 @@ VSStatus VSStoreCore::apply(const Change& change) {
     }
     committed();
     return {};
+}
+
+void VSStoreCore::committed() {
+    notifier.announce();
+    filesChanged();
+}
+
+void VSStoreCore::filesChanged() {
+    cleaner_.wake();
+}
+
+void VSStoreCore::heard(const VSChangeNotifier::Changes& changes) {
+    if (!changes.types.empty()) queries.typesChanged(changes.types);
+    filesChanged();
+    if (changes.defaultKeys.empty()) return;
+    std::vector<std::shared_ptr<const DefaultValueHandler>> handlers;
+    {
+        std::lock_guard lock(observersMutex_);
+        std::erase_if(observers_, [](const auto& observer) { return observer.expired(); });
+        for (const auto& observer : observers_) handlers.push_back(observer.lock());
+    }
+    for (const auto& handler : handlers) {
+        for (const std::string& key : changes.defaultKeys)
+            if (handler) (*handler)(key);
+    }
+}
+
+std::shared_ptr<const void> VSStoreCore::observeDefaultValues(DefaultValueHandler handler) {
+    auto observer = std::make_shared<const DefaultValueHandler>(std::move(handler));
+    std::lock_guard lock(observersMutex_);
+    observers_.push_back(observer);
+    return observer;
+}
+
+VSStatus VSStoreCore::cleanUp() {
+    if (!writer_) return VSError{VSErrorCode::NotAccessible, "the store was opened for reading only"};
+    try {
+        VSStoreCleaning cleaning(folder, std::min(options.patience, patienceToClean), nullptr);
+        for (;;) {
+            const auto outcome = cleaning.step();
+            if (outcome == VSStoreCleaning::Outcome::Clean) return {};
+            if (outcome == VSStoreCleaning::Outcome::Held)
+                return VSError{VSErrorCode::NotAccessible, "the store's files are in use", true};
+        }
+    } catch (const VSDatabaseFailure& failure) {
+        return VSErrorNamingStore(failure.error(), folder);
+    }
 }
 
 void VSStoreCore::ask(Question question) {

@@ -12,6 +12,7 @@
 #include "Vessa/VSQueryRunner.h"
 #include "Vessa/VSReaderPool.h"
 #include "Vessa/VSStoreAuthorizations.h"
+#include "Vessa/VSStoreCleaning.h"
 #include "Vessa/VSStoreWriter.h"
 #include "Vessa/VSWorkQueue.h"
 
@@ -44,7 +45,14 @@ class VSStoreCore : public std::enable_shared_from_this<VSStoreCore> {
         });
     }
     /// Tells the queries of all processes.
-    void committed() { notifier.announce(); }
+    void committed();
+    /// The files may hold what is to be cleaned away, here or through another process.
+    void filesChanged();
+    /// Cleans the files now, as far as others let it. On the calling thread.
+    VSStatus cleanUp();
+
+    using DefaultValueHandler = std::function<void(const std::string& key)>;
+    std::shared_ptr<const void> observeDefaultValues(DefaultValueHandler handler);
 
     const std::filesystem::path folder;
     const VSHealthStore::Options options;
@@ -59,6 +67,7 @@ class VSStoreCore : public std::enable_shared_from_this<VSStoreCore> {
     VSStoreCore(const std::filesystem::path& storeFolder, const VSHealthStore::Options& storeOptions,
                 std::unique_ptr<VSDatabase> database);
     VSStatus apply(const Change& change);
+    void heard(const VSChangeNotifier::Changes& changes);
     /// Answers, or hands on the error that is given. On a reading thread.
     using Question = std::function<void(const VSError* refusal)>;
     void ask(Question question);
@@ -66,11 +75,16 @@ class VSStoreCore : public std::enable_shared_from_this<VSStoreCore> {
     /// Of the writer's thread: whether it has waited too long for others.
     void setWriterIsHeld(bool isHeld);
 
+    bool isBusy() const { return !writing_.isIdle() || !readingThreads.isIdle(); }
+
     VSWorkQueue writing_;
     VSDatabase::Deadline closingDeadline_;
     std::mutex questionsMutex_;
     std::map<int64_t, Question> questions_;  // that follow writes; guarded by questionsMutex_
     int64_t lastQuestion_ = 0;               // guarded by questionsMutex_
     bool writerIsHeld_ = false;              // guarded by questionsMutex_
-    std::unique_ptr<Writer> writer_;         // of the writer's thread; null when opened for reading
+    std::mutex observersMutex_;
+    std::vector<std::weak_ptr<const DefaultValueHandler>> observers_;  // guarded by observersMutex_
+    std::unique_ptr<Writer> writer_;  // of the writer's thread; null when opened for reading
+    VSStoreCleaner cleaner_;          // idle when opened for reading
 };

@@ -240,3 +240,14 @@ bool VSStoreMigration::mayBeUnderWay(const fs::path& file) {
 void VSStoreMigration::clearUp(const fs::path& file) {
     if (mayBeUnderWay(file)) removeDatabase(unfinishedCopy(file));
 }
+
+std::vector<fs::path> VSStoreMigration::keptCopies(const fs::path& folder) {
+    std::vector<fs::path> copies;
+    std::error_code ignored;
+    for (const auto& entry : fs::directory_iterator(folder, ignored)) {
+        const std::string name = entry.path().filename().string();
+        if (name.starts_with("vessa.version-") && name.ends_with(".sqlite")) copies.push_back(entry.path());
+    }
+    std::sort(copies.begin(), copies.end());
+    return copies;
+}

@@ -2,6 +2,7 @@
 
 #include <chrono>
 #include <filesystem>
+#include <vector>
 
 #include "Vessa/Base/VSDate.h"
 
@@ -26,5 +27,8 @@ bool mayBeUnderWay(const std::filesystem::path& file);
 /// Removes what a migration leaves that was killed when all was done.
 /// REQUIRES: a connection of the caller has read that the file has the current format.
 void clearUp(const std::filesystem::path& file);
+
+/// The copies that migrations kept of the store in a folder, by name. They hold what was deleted since.
+std::vector<std::filesystem::path> keptCopies(const std::filesystem::path& folder);
 
 }  // namespace VSStoreMigration

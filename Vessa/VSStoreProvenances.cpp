@@ -43,6 +43,11 @@ const VSSource& VSStoreProvenances::source(int64_t id) {
     return *entry;
 }
 
+void VSStoreProvenances::loadAll() {
+    auto rows = database_.use("SELECT provenance FROM provenances");
+    while (rows.step()) provenance(rows.integer(0));
+}
+
 std::vector<VSDevice> VSStoreProvenances::allDevices() {
     std::vector<VSDevice> devices;
     auto rows = database_.use(
@@ -98,10 +103,27 @@ void VSStoreProvenances::forgetNumbers() {
     recent_ = {};
 }
 
+int64_t VSStoreProvenances::nextNumber(const std::string& table, const std::string& column) {
+    return database_.integer("SELECT max((SELECT coalesce(max(" + column + "), 0) FROM " + table +
+                             "), (SELECT coalesce(max(seq), 0) FROM sqlite_sequence WHERE name = '" + table +
+                             "')) + 1");
+}
+
+void VSStoreProvenances::dropRow(const std::string& table, const std::string& column, int64_t number) {
+    auto note = database_.use("UPDATE sqlite_sequence SET seq = max(seq, ?2) WHERE name = ?1 RETURNING seq");
+    if (!note.bindText(1, table).bind(2, number).step())
+        database_.use("INSERT INTO sqlite_sequence(name, seq) VALUES (?, ?)")
+            .bindText(1, table)
+            .bind(2, number)
+            .run();
+    note.reset();
+    database_.use("DELETE FROM " + table + " WHERE " + column + " = ?").bind(1, number).run();
+}
+
 int64_t VSStoreProvenances::sourceFor(const VSSource& source) {
     loadNumbers();
     if (auto found = sourceNumbers_.find(source); found != sourceNumbers_.end()) return found->second;
-    const int64_t id = database_.integer("SELECT coalesce(max(source), 0) + 1 FROM sources");
+    const int64_t id = nextNumber("sources", "source");
     database_.use("INSERT INTO sources(source, name, bundle) VALUES (?, ?, ?)")
         .bind(1, id)
         .bindText(2, source.name)
@@ -113,7 +135,7 @@ int64_t VSStoreProvenances::sourceFor(const VSSource& source) {
 
 int64_t VSStoreProvenances::deviceFor(const VSDevice& device) {
     if (auto found = deviceNumbers_.find(device); found != deviceNumbers_.end()) return found->second;
-    const int64_t id = database_.integer("SELECT coalesce(max(device), 0) + 1 FROM devices");
+    const int64_t id = nextNumber("devices", "device");
     auto insert = database_.use("INSERT INTO devices VALUES (?, ?, ?, ?, ?, ?, ?, ?, ?)");
     insert.bind(1, id)
         .bindOptionalText(2, device.name)
@@ -140,7 +162,7 @@ int64_t VSStoreProvenances::provenanceFor(const VSProvenance& provenance) {
                   provenance.device ? deviceFor(*provenance.device) : 0, provenance.timeZoneOffset};
     auto [place, isNew] = provenanceNumbers_.try_emplace(key, 0);
     if (isNew) {
-        place->second = database_.integer("SELECT coalesce(max(provenance), 0) + 1 FROM provenances");
+        place->second = nextNumber("provenances", "provenance");
         auto insert = database_.use("INSERT INTO provenances VALUES (?, ?, ?, ?, ?)");
         insert.bind(1, place->second).bind(2, key.source).bindText(3, key.version);
         if (key.device) insert.bind(4, key.device);
@@ -194,20 +216,19 @@ void VSStoreMetadata::release(int64_t id) {
 }
 
 void VSStoreMetadata::flush() {
-    bool removed = false;
+    std::vector<int64_t> unused;
     {
         auto update = database_.use("UPDATE metadata SET uses = uses + ? WHERE metadata = ? RETURNING uses");
         for (auto [id, change] : usesChanged_) {
             update.bind(1, change).bind(2, id);
-            if (update.step() && update.integer(0) <= 0) removed = true;
+            if (update.step() && update.integer(0) <= 0) unused.push_back(id);
             update.reset();
         }
     }
     usesChanged_.clear();
-    if (removed) {
-        database_.use("DELETE FROM metadata WHERE uses <= 0").run();
-        numbers_.clear();
-    }
+    auto remove = database_.use("DELETE FROM metadata WHERE metadata = ?");
+    for (const int64_t id : unused) remove.bind(1, id).run();
+    if (!unused.empty()) numbers_.clear();
     if (last_) database_.use("UPDATE state SET last_metadata = ?").bind(1, *last_).run();
     last_.reset();
 }

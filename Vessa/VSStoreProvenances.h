@@ -34,14 +34,20 @@ class VSStoreProvenances {
     /// None: no object ever came from it.
     std::optional<int64_t> findSource(const VSSource& source);
 
+    /// Reads every provenance at once.
+    void loadAll();
+
     // Inside a writing transaction:
     int64_t provenanceFor(const VSProvenance& provenance);
     int64_t sourceFor(const VSSource& source);
+    /// Removes a row that nothing uses any more; its number never comes again. Then call forgetNumbers.
+    void dropRow(const std::string& table, const std::string& column, int64_t number);
     /// Forgets the numbers given in a transaction that was rolled back, and what others may have added.
     void forgetNumbers();
 
  private:
     void loadNumbers();
+    int64_t nextNumber(const std::string& table, const std::string& column);
     std::shared_ptr<const VSDevice> device(int64_t id);
     int64_t deviceFor(const VSDevice& device);
 

@@ -396,6 +396,14 @@ std::map<int, int64_t> VSStoreReader::typeChanges() {
     return changes;
 }
 
+std::map<std::string, std::string> VSStoreReader::defaultTexts(const std::string& application) {
+    std::map<std::string, std::string> texts;
+    auto rows = database_.use("SELECT key, value FROM defaults WHERE application = ?");
+    rows.bindText(1, application);
+    while (rows.step()) texts[rows.text(0)] = rows.text(1);
+    return texts;
+}
+
 int64_t VSStoreReader::lastChange(const VSObjectType* type) {
     auto row = database_.use("SELECT change FROM types WHERE type = ?");
     return row.bind(1, codeOf(type)).step() ? row.integer(0) : 0;

@@ -64,6 +64,8 @@ class VSStoreReader {
     /// The number of the last change of each type.
     std::map<int, int64_t> typeChanges();
     int64_t lastChange(const VSObjectType* type);
+    /// The default values of an application by key, serialized.
+    std::map<std::string, std::string> defaultTexts(const std::string& application);
     int64_t lastNumber() { return database_.integer("SELECT last FROM state"); }
 
     VSDatabase& database() { return database_; }

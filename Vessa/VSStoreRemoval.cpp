@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <exception>
 
 #include "Vessa/VSStoreWriter.h"
 
@@ -32,19 +33,25 @@ void VSStoreWriter::removeRow(const VSObjectType* type, const VSSampleRow& row) 
         .bind(2, row.start)
         .bind(3, row.id)
         .run();
+    noteRemoved(code, row);
+    noteDeletion(code, row.id);
+}
+
+void VSStoreWriter::noteRemoved(int type, const VSSampleRow& row) {
     metadata_.release(row.metadata);
-    const int64_t change = ++last_;
-    database_.use("INSERT INTO deleted(change, type, id) VALUES (?, ?, ?)")
-        .bind(1, change)
-        .bind(2, code)
-        .bind(3, row.id)
-        .run();
-    types_[static_cast<size_t>(code)].change = change;
     const int64_t source = provenances_.sourceOfProvenance(row.provenance);
-    SourceChange& summary = sourceChange(code, source);
+    SourceChange& summary = sourceChange(type, source);
     --summary.count;
     summary.removed = true;
-    rollups_.rebuild(code, source, row.start, row.duration);
+    if (recentRemovedFrom_ != row.provenance) removedFrom_[row.provenance] = {type, row.start};
+    recentRemovedFrom_ = row.provenance;
+    rollups_.rebuild(type, source, row.start, row.duration);
+}
+
+void VSStoreWriter::noteDeletion(int type, int64_t id) {
+    const int64_t change = ++last_;
+    insertDeleted_.bind(1, change).bind(2, type).bind(3, id).run();
+    types_[static_cast<size_t>(type)].change = change;
 }
 
 /// What hangs on a correlation or a workout.
@@ -114,11 +121,55 @@ std::vector<VSSampleRow> VSStoreWriter::rowsNumbered(const VSObjectType* type, c
     return rows;
 }
 
+bool VSStoreWriter::isMostOf(int type, const VSNumberRanges& numbers) {
+    auto all = database_.use("SELECT coalesce(sum(count), 0) FROM type_sources WHERE type = ?");
+    all.bind(1, type).step();
+    auto rows = database_.use(
+        "SELECT count(*) FROM samples INDEXED BY samples_by_id WHERE type = ? AND id BETWEEN ? AND ?");
+    int64_t wanted = 0;
+    for (const VSNumberRange& range : numbers.ranges()) {
+        rows.bind(1, type).bind(2, range.first).bind(3, range.last).step();
+        wanted += rows.integer(0);
+        rows.reset();
+    }
+    return wanted > rowsAtOnce && wanted > all.integer(0) / 4;
+}
+
+int64_t VSStoreWriter::removeInOnePass(int type, const VSNumberRanges& numbers,
+                                       const std::function<bool(const VSSampleRow&)>& accept) {
+    provenances_.loadAll();  // the function below asks nothing of the database
+    std::exception_ptr failure;
+    std::vector<int64_t> ids;
+    isToGo_ = [&](const VSSampleRow& row) {
+        try {
+            if (failure || !numbers.contains(row.id) || (accept && !accept(row))) return false;
+            noteRemoved(type, row);
+            ids.push_back(row.id);
+            return true;
+        } catch (...) {  // the store lacks a provenance, or no memory; not through SQLite
+            failure = std::current_exception();
+            return false;
+        }
+    };
+    database_
+        .use("DELETE FROM samples WHERE type = ? AND is_to_go(start, id, duration, provenance, metadata)")
+        .bind(1, type)
+        .run();
+    isToGo_ = nullptr;
+    if (failure) std::rethrow_exception(failure);
+    std::sort(ids.begin(), ids.end());
+    for (const int64_t id : ids) noteDeletion(type, id);
+    return static_cast<int64_t>(ids.size());
+}
+
 int64_t VSStoreWriter::removeNumbers(const VSObjectType* type, const VSNumberRanges& numbers,
                                      const std::function<bool(const VSSampleRow&)>& accept) {
     auto member = database_.use("SELECT 1 FROM members WHERE type = ? LIMIT 1");
     const bool hasMembers = member.bind(1, codeOf(type)).step();
     member.reset();
+    const int code = codeOf(type);
+    if (!hasMembers && !VSCanHaveMembers(type) && isMostOf(code, numbers))
+        return removeInOnePass(code, numbers, accept);
     int64_t removed = 0;
     for (int64_t next = numbers.nextFrom(1); next != 0;) {
         auto rows = rowsNumbered(type, numbers, next);
@@ -135,6 +186,53 @@ int64_t VSStoreWriter::removeNumbers(const VSObjectType* type, const VSNumberRan
         removed += static_cast<int64_t>(rows.size());
     }
     return removed;
+}
+
+// What only removed samples told of where they came from goes with them: a device's name says who had it.
+
+void VSStoreWriter::dropUnusedProvenances() {
+    bool dropped = false;
+    for (const auto& [provenance, removed] : removedFrom_) {
+        if (isProvenanceUsed(provenance, removed)) continue;
+        std::optional<int64_t> device;
+        int64_t source = 0;
+        {
+            auto row = database_.use("SELECT source, device FROM provenances WHERE provenance = ?");
+            if (!row.bind(1, provenance).step()) continue;
+            source = row.integer(0);
+            if (!row.isNull(1)) device = row.integer(1);
+        }
+        dropped = true;
+        provenances_.dropRow("provenances", "provenance", provenance);
+        auto ofDevice = database_.use("SELECT 1 FROM provenances WHERE device = ? LIMIT 1");
+        if (device && !ofDevice.bind(1, *device).step()) provenances_.dropRow("devices", "device", *device);
+        // The order that the person chose stays, with what it names.
+        auto ofSource = database_.use(
+            "SELECT 1 FROM provenances WHERE source = ?1 UNION ALL SELECT 1 FROM source_order WHERE source = "
+            "?1 LIMIT 1");
+        if (!ofSource.bind(1, source).step()) provenances_.dropRow("sources", "source", source);
+    }
+    removedFrom_.clear();
+    if (dropped) provenances_.forgetNumbers();
+}
+
+/// Looks first where a removed sample was, then through the types of its source.
+bool VSStoreWriter::isProvenanceUsed(int64_t provenance, const std::pair<int, int64_t>& removed) {
+    auto near = database_.use(
+        "SELECT 1 FROM (SELECT provenance FROM samples WHERE type = ?1 AND start >= ?2 ORDER BY start LIMIT "
+        "1000) WHERE provenance = ?3 UNION ALL SELECT 1 FROM (SELECT provenance FROM samples WHERE type = ?1 "
+        "AND start <= ?2 ORDER BY start DESC LIMIT 1000) WHERE provenance = ?3 LIMIT 1");
+    if (near.bind(1, removed.first).bind(2, removed.second).bind(3, provenance).step()) return true;
+    std::vector<int> types;
+    auto ofSource = database_.use("SELECT type FROM type_sources WHERE source = ? ORDER BY count DESC");
+    ofSource.bind(1, provenances_.sourceOfProvenance(provenance));
+    while (ofSource.step()) types.push_back(static_cast<int>(ofSource.integer(0)));
+    auto anywhere = database_.use("SELECT 1 FROM samples WHERE type = ? AND provenance = ? LIMIT 1");
+    for (const int type : types) {
+        if (anywhere.bind(1, type).bind(2, provenance).step()) return true;
+        anywhere.reset();
+    }
+    return false;
 }
 
 int64_t VSStoreWriter::removeAll(const VSObjectType* type, std::optional<std::string> bundleIdentifier) {

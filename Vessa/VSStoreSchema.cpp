@@ -12,6 +12,8 @@
 
 namespace {
 
+// The indexes last, as SQLite itself orders them when it makes the file anew: a salvage looks for the roots
+// of a file without its list of tables where a new store has them.
 constexpr const char* tables = R"sql(
 CREATE TABLE state(
     only INTEGER PRIMARY KEY CHECK (only = 1),
@@ -56,8 +58,6 @@ CREATE TABLE samples(
     created INTEGER NOT NULL,
     metadata INTEGER,
     PRIMARY KEY (type, start, id)) WITHOUT ROWID;
-CREATE INDEX samples_by_id ON samples(type, id);
-CREATE INDEX samples_long ON samples(type, start) WHERE duration > )sql" VS_LONG_SPAN_SQL R"sql(;
 
 CREATE TABLE members(
     parent INTEGER NOT NULL,
@@ -66,7 +66,6 @@ CREATE TABLE members(
     type INTEGER NOT NULL,
     start INTEGER NOT NULL,
     PRIMARY KEY (parent, position)) WITHOUT ROWID;
-CREATE INDEX members_by_member ON members(member);
 
 CREATE TABLE workouts(
     workout INTEGER PRIMARY KEY,
@@ -84,7 +83,6 @@ CREATE TABLE deleted(
     change INTEGER PRIMARY KEY,
     type INTEGER NOT NULL,
     id INTEGER NOT NULL);
-CREATE INDEX deleted_by_type ON deleted(type, change);
 
 CREATE TABLE type_sources(
     type INTEGER NOT NULL,
@@ -153,6 +151,11 @@ CREATE TABLE medical_id(
     only INTEGER PRIMARY KEY CHECK (only = 1),
     content TEXT NOT NULL,
     picture BLOB);
+
+CREATE INDEX samples_by_id ON samples(type, id);
+CREATE INDEX samples_long ON samples(type, start) WHERE duration > )sql" VS_LONG_SPAN_SQL R"sql(;
+CREATE INDEX members_by_member ON members(member);
+CREATE INDEX deleted_by_type ON deleted(type, change);
 )sql";
 
 constexpr const char* tableNames[] = {"state",          "types",         "sources",
@@ -252,6 +255,8 @@ void checkTables(VSDatabase& database, const std::filesystem::path& file) {
 }
 
 void createTables(VSDatabase& database, const std::filesystem::path& file) {
+    // Before the first table: it is a property of the file.
+    database.execute("PRAGMA auto_vacuum = INCREMENTAL");
     // In the old journal mode, so that the identity stands in the file itself from the first commit on.
     database.execute("BEGIN EXCLUSIVE");
     try {
@@ -299,7 +304,7 @@ void configure(VSDatabase& database) {
 void configureForWriting(VSDatabase& database, bool survivesPowerLoss) {
     // Full: a commit is on the disk before it is acknowledged.
     database.execute(survivesPowerLoss ? "PRAGMA synchronous = FULL" : "PRAGMA synchronous = NORMAL");
-    database.execute("PRAGMA journal_size_limit = 67108864; PRAGMA secure_delete = FAST;");
+    database.execute("PRAGMA journal_size_limit = 67108864; PRAGMA secure_delete = ON;");
 }
 
 }  // namespace
@@ -341,6 +346,11 @@ std::unique_ptr<VSDatabase> VSStoreSchema::openForWriting(const std::filesystem:
     // A connection that has not used the log would not move it into the file when it closes last.
     database->integer("SELECT last FROM state");
     return database;
+}
+
+bool VSStoreSchema::canShrink(VSDatabase& database) {
+    constexpr int64_t incremental = 2;
+    return database.integer("PRAGMA auto_vacuum") == incremental;
 }
 
 std::unique_ptr<VSDatabase> VSStoreSchema::openForReading(const std::filesystem::path& folder,

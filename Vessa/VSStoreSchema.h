@@ -36,4 +36,7 @@ std::unique_ptr<VSDatabase> openForWriting(const std::filesystem::path& folder, 
 /// The same without any change to the disk.
 std::unique_ptr<VSDatabase> openForReading(const std::filesystem::path& folder, VSDuration patience);
 
+/// Whether the file has the pointer map with which it shrinks in steps; those of earlier programs have none.
+bool canShrink(VSDatabase& database);
+
 }  // namespace VSStoreSchema

@@ -77,7 +77,12 @@ VSStoreWriter::VSStoreWriter(VSDatabase& database)
       rollups_(database),
       insert_(
           database.use("INSERT INTO samples(type, start, id, duration, value, provenance, created, metadata)"
-                       " VALUES (?, ?, ?, ?, ?, ?, ?, ?)")) {}
+                       " VALUES (?, ?, ?, ?, ?, ?, ?, ?)")),
+      insertDeleted_(database.use("INSERT INTO deleted(change, type, id) VALUES (?, ?, ?)")) {
+    database.define("is_to_go", 5, [this](const int64_t* row) {
+        return isToGo_ && isToGo_({row[0], row[1], row[2], 0, row[3], 0, row[4]});
+    });
+}
 
 void VSStoreWriter::begin() {
     if (database_.othersHaveCommitted()) {
@@ -100,6 +105,8 @@ void VSStoreWriter::abandon() {
     rollups_.clear();
     sourceChanges_.clear();
     recentChange_ = nullptr;
+    removedFrom_.clear();
+    recentRemovedFrom_ = 0;
 }
 
 void VSStoreWriter::finish() {
@@ -108,6 +115,7 @@ void VSStoreWriter::finish() {
     rollups_.flush(provenances_);
     writeTypeSources();
     updateMergedRollups();
+    dropUnusedProvenances();
     database_.use("UPDATE state SET last = ?").bind(1, last_).run();
 }
 

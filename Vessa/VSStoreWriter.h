@@ -78,6 +78,15 @@ class VSStoreWriter {
     void removeDetails(int64_t id);
     int64_t leaveParents(int64_t id);
     int64_t loseMember(const VSObjectType* type, const VSSampleRow& parent);
+    /// Notes what follows from a row's end, but for its deletion record.
+    void noteRemoved(int type, const VSSampleRow& row);
+    void noteDeletion(int type, int64_t id);
+    /// Whether so much of a type is wanted that it is faster to read all of it.
+    bool isMostOf(int type, const VSNumberRanges& numbers);
+    int64_t removeInOnePass(int type, const VSNumberRanges& numbers,
+                            const std::function<bool(const VSSampleRow&)>& accept);
+    void dropUnusedProvenances();
+    bool isProvenanceUsed(int64_t provenance, const std::pair<int, int64_t>& removed);
     /// Some rows of the type from the number `next` on, which becomes that of the next ones or 0.
     std::vector<VSSampleRow> rowsNumbered(const VSObjectType* type, const VSNumberRanges& numbers,
                                           int64_t& next);
@@ -91,7 +100,9 @@ class VSStoreWriter {
     VSStoreMetadata metadata_;
     VSStoreMatcher matcher_;
     VSRollupWriter rollups_;
-    VSStatement insert_;
+    VSStatement insert_, insertDeleted_;
+
+    std::function<bool(const VSSampleRow&)> isToGo_;  // what SQL calls by that name; null: nothing is
 
     int64_t last_ = 0;
     std::unordered_map<const VSSample*, int64_t> inserted_;  // the objects of this transaction
@@ -99,4 +110,6 @@ class VSStoreWriter {
     std::map<std::pair<int, int64_t>, SourceChange> sourceChanges_;
     std::pair<int, int64_t> recentKey_{-1, -1};
     SourceChange* recentChange_ = nullptr;
+    std::map<int64_t, std::pair<int, int64_t>> removedFrom_;  // provenances, with a removed row's place
+    int64_t recentRemovedFrom_ = 0;
 };

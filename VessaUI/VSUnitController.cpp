@@ -44,40 +44,44 @@ VSUnitController::VSUnitController(std::shared_ptr<VSHealthStore> healthStore)
     forEachQuantityUnit([this](const VSDataUnit* unit) {
         defaultsTold_.insert_or_assign(unit->dataType(), unitForDataUnit(unit));
     });
+    observation_ =
+        healthStore_->observeDefaultValues([this, alive = std::weak_ptr(alive_)](const std::string& key) {
+            if (key != VSPreferredUnitsKey) return;
+            platform::mainQueue().async([this, alive] {
+                if (!alive.expired()) load();
+            });
+        });
     load();
 }
 
 // ---- The store ----
 
 void VSUnitController::load() {
-    loadState_ = LoadState::Loading;
     healthStore_->getDefaultValue(VSPreferredUnitsKey, [this, alive = std::weak_ptr(alive_)](
                                                            const VSResult<std::optional<VSValue>>& result) {
         platform::mainQueue().async([this, alive, result] {
-            if (alive.expired()) return;
-            if (!result) {
-                VSLog(VSLogLevel::Error,
-                      "VSUnitController: Error reading preferred units: " + result.error().message);
-                loadState_ = LoadState::Failed;
-                return;
-            }
-            const VSValue::Dictionary* dictionary = result.value() ? result.value()->dictionary() : nullptr;
-            preferencesLoaded(dictionary ? *dictionary : VSValue::Dictionary{});
+            if (!alive.expired()) wasRead(result, "reading");
         });
     });
 }
 
-void VSUnitController::preferencesLoaded(const VSValue::Dictionary& stored) {
-    // What was chosen while the store was being read stands.
-    VSValue::Dictionary merged = stored;
-    for (const auto& [identifier, unit] : stored_) merged.insert_or_assign(identifier, unit);
-    stored_ = std::move(merged);
-    loadState_ = LoadState::Loaded;
+void VSUnitController::wasRead(const VSResult<std::optional<VSValue>>& result, const char* what) {
+    if (!result) {
+        VSLog(VSLogLevel::Error,
+              std::string("VSUnitController: Error ") + what + " preferred units: " + result.error().message);
+        return;
+    }
+    const VSValue::Dictionary* dictionary = *result ? (*result)->dictionary() : nullptr;
+    if (dictionary) adopt(*dictionary);
+}
 
+void VSUnitController::adopt(const VSValue::Dictionary& stored) {
     QSet<const VSObjectType*> changed;
     forEachQuantityUnit([&](const VSDataUnit* unit) {
-        const auto entry = stored_.find(unit->dataType()->identifier());
-        const std::string* text = entry == stored_.end() ? nullptr : entry->second.string();
+        // What was chosen here and is not stored yet stands.
+        if (unsaved_.contains(unit->dataType()->identifier())) return;
+        const auto entry = stored.find(unit->dataType()->identifier());
+        const std::string* text = entry == stored.end() ? nullptr : entry->second.string();
         if (!text) return;
         const VSResult<VSUnit> parsed = VSUnit::parse(*text);
         // An unknown unit is left alone in the store: another version may understand it.
@@ -85,23 +89,32 @@ void VSUnitController::preferencesLoaded(const VSValue::Dictionary& stored) {
         if (unitForDataUnit(unit) != parsed.value()) changed.insert(unit->dataType());
         preferred_.insert_or_assign(unit->dataType(), parsed.value());
     });
-    if (std::exchange(saveWhenLoaded_, false)) save();
     if (!changed.isEmpty()) emit unitPreferencesDidChange(changed);
 }
 
+/// The dictionary holds the choices of all types, also those of other windows: only what was chosen here is
+/// changed in it.
 void VSUnitController::save() {
-    // The dictionary holds the choices of all types: written before it was read it would wipe out the
-    // others.
-    if (loadState_ != LoadState::Loaded) {
-        saveWhenLoaded_ = true;
-        if (loadState_ == LoadState::Failed) load();
-        return;
-    }
-    healthStore_->setDefaultValue(VSValue(stored_), VSPreferredUnitsKey, [](const VSStatus& status) {
-        if (!status)
-            VSLog(VSLogLevel::Error,
-                  "VSUnitController: Error saving preferred units: " + status.error().message);
-    });
+    healthStore_->updateDefaultValue(
+        VSPreferredUnitsKey,
+        [choices = unsaved_](const std::optional<VSValue>& current) {
+            const VSValue::Dictionary* known = current ? current->dictionary() : nullptr;
+            VSValue::Dictionary units = known ? *known : VSValue::Dictionary{};
+            for (const auto& [identifier, unit] : choices) units.insert_or_assign(identifier, unit);
+            return VSValue(std::move(units));
+        },
+        [this, choices = unsaved_,
+         alive = std::weak_ptr(alive_)](const VSResult<std::optional<VSValue>>& result) {
+            platform::mainQueue().async([this, alive, choices, result] {
+                if (alive.expired()) return;
+                if (result)
+                    std::erase_if(unsaved_, [&](const auto& entry) {
+                        const auto saved = choices.find(entry.first);
+                        return saved != choices.end() && saved->second == entry.second;
+                    });
+                wasRead(result, "saving");
+            });
+        });
 }
 
 // ---- Units ----
@@ -128,7 +141,7 @@ void VSUnitController::updatePreferredUnit(const VSUnit& unit, const VSDataUnit*
     }
     const bool changes = unitForDataUnit(dataUnit) != unit;
     preferred_.insert_or_assign(dataUnit->dataType(), unit);
-    stored_.insert_or_assign(dataUnit->dataType()->identifier(), VSValue(unit.unitString()));
+    unsaved_.insert_or_assign(dataUnit->dataType()->identifier(), VSValue(unit.unitString()));
     save();
     if (changes) emit unitPreferencesDidChange({dataUnit->dataType()});
 }

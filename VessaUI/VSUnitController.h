@@ -13,8 +13,8 @@
 /// The user's preferred units, kept in the health service's default values (key "VSPreferredUnits": a
 /// dictionary from type identifier to unit string). A preference not set follows the user's region (US
 /// customary in US, LR, MM; glucose in mmol/L where that is customary ...) and its changes. Until the stored
-/// preferences have been read the region's units answer; the signal tells when that changed anything. Main
-/// thread only.
+/// preferences have been read the region's units answer; the signal tells when that, or a choice in another
+/// window or program, changed anything. Main thread only.
 class VSUnitController : public QObject {
     Q_OBJECT
  public:
@@ -42,9 +42,9 @@ class VSUnitController : public QObject {
     void unitPreferencesDidChange(const QSet<const VSObjectType*>& changedTypes);
 
  private:
-    enum class LoadState { Loading, Loaded, Failed };
     void load();
-    void preferencesLoaded(const VSValue::Dictionary& stored);
+    void wasRead(const VSResult<std::optional<VSValue>>& result, const char* what);
+    void adopt(const VSValue::Dictionary& stored);
     void save();
     void localeDidChange();
     QString nameOfUnit(const VSDataUnit* dataUnit, const VSUnit& unit, std::optional<double> value) const;
@@ -52,10 +52,8 @@ class VSUnitController : public QObject {
                                                      const VSValueRange& range) const;
 
     std::shared_ptr<VSHealthStore> healthStore_;
-    LoadState loadState_ = LoadState::Loading;
-    bool saveWhenLoaded_ = false;
-    VSValue::Dictionary
-        stored_;  // as read and changed, with the entries that this version does not understand
+    std::shared_ptr<const void> observation_;
+    VSValue::Dictionary unsaved_;  // choices made here that are not known to be stored
     std::map<const VSObjectType*, VSUnit> preferred_;
     std::map<const VSObjectType*, VSUnit> defaultsTold_;  // the region's, as observers know them
     std::shared_ptr<bool> alive_ = std::make_shared<bool>(true);

@@ -12,6 +12,7 @@
 namespace {
 
 using Groups = QVDashboardDataUnitGroupsController::Groups;
+using IDs = QVDashboardDataUnitGroupsController::IDs;
 
 // Names of settings on disk: never change.
 constexpr const char* dashboardKey = "QVUserSettingsActiveUnitGroupsForDashboardKey";
@@ -29,62 +30,72 @@ bool contains(const std::vector<T>& values, const T& value) {
     return std::find(values.begin(), values.end(), value) != values.end();
 }
 
-std::vector<int> integers(const VSValue& value) {
-    std::vector<int> result;
+IDs integers(const VSValue& value) {
+    IDs result;
     if (const auto* array = value.array())
         for (const VSValue& entry : *array)
             if (const auto number = entry.integer()) result.push_back(static_cast<int>(*number));
     return result;
 }
 
-VSValue::Array arrayOf(const std::vector<int>& ids) {
+VSValue::Array arrayOf(const IDs& ids) {
     return VSValue::Array(ids.begin(), ids.end());
 }
 
-std::vector<int> idsOf(const Groups& groups) {
-    std::vector<int> ids;
+IDs idsOf(const Groups& groups) {
+    IDs ids;
     for (const VSDataUnitGroup* group : groups) ids.push_back(group->dataUnitGroupID());
     return ids;
 }
 
 /// The IDs under the key inside the dictionary that is stored under the same key; none when never stored.
-std::optional<std::vector<int>> storedIDs(const VSResult<std::optional<VSValue>>& answer, const char* key) {
-    if (!answer || !*answer) return std::nullopt;
-    const VSValue* entry = (**answer)[key];
+std::optional<IDs> storedIDs(const std::optional<VSValue>& stored, const char* key) {
+    const VSValue* entry = stored ? (*stored)[key] : nullptr;
     if (!entry || !entry->array()) return std::nullopt;
     return integers(*entry);
 }
+std::optional<IDs> storedIDs(const VSResult<std::optional<VSValue>>& answer, const char* key) {
+    return answer ? storedIDs(*answer, key) : std::nullopt;
+}
 
-Groups withoutRepetition(const Groups& groups) {
-    Groups result;
-    for (const VSDataUnitGroup* group : groups)
-        if (!contains(result, group)) result.push_back(group);
+VSValue toStore(const IDs& ids, const char* key) {
+    return VSValue(VSValue::Dictionary{{key, arrayOf(ids)}});
+}
+
+template <typename T>
+std::vector<T> withoutRepetition(const std::vector<T>& values) {
+    std::vector<T> result;
+    for (const T& value : values)
+        if (!contains(result, value)) result.push_back(value);
     return result;
 }
 
-/// Those of `groups` that `others` holds too.
-Groups sharedWith(const Groups& others, const Groups& groups) {
-    Groups result;
-    for (const VSDataUnitGroup* group : groups)
-        if (contains(others, group)) result.push_back(group);
+IDs united(IDs ids, const IDs& others) {
+    ids.insert(ids.end(), others.begin(), others.end());
+    return withoutRepetition(ids);
+}
+
+/// Those of `ids` that `others` holds too.
+IDs sharedWith(const IDs& others, const IDs& ids) {
+    IDs result;
+    for (const int id : ids)
+        if (contains(others, id)) result.push_back(id);
     return result;
 }
 
 /// `list` after what made `after` of `before`: what was removed is gone, what was moved stands in its new
 /// order in the places that these had, and what was added stands at the end. What `before` never held stays.
-Groups withChange(const Groups& list, const Groups& before, const Groups& after) {
-    Groups result = withoutRepetition(list);
-    std::erase_if(result, [&](const VSDataUnitGroup* group) {
-        return contains(before, group) && !contains(after, group);
-    });
+IDs withChange(const IDs& list, const IDs& before, const IDs& after) {
+    IDs result = withoutRepetition(list);
+    std::erase_if(result, [&](int id) { return contains(before, id) && !contains(after, id); });
     if (sharedWith(after, before) != sharedWith(before, after)) {
-        const Groups ordered = sharedWith(result, withoutRepetition(after));
+        const IDs ordered = sharedWith(result, withoutRepetition(after));
         auto next = ordered.begin();
-        for (const VSDataUnitGroup*& group : result)
-            if (contains(ordered, group)) group = *next++;
+        for (int& id : result)
+            if (contains(ordered, id)) id = *next++;
     }
-    for (const VSDataUnitGroup* group : after)
-        if (!contains(before, group) && !contains(result, group)) result.push_back(group);
+    for (const int id : after)
+        if (!contains(before, id) && !contains(result, id)) result.push_back(id);
     return result;
 }
 
@@ -108,6 +119,12 @@ QVDashboardDataUnitGroupsController::QVDashboardDataUnitGroupsController(
         loadDemoSelection();
         return;
     }
+    observation_ = userDefaults_.observe([this, alive = std::weak_ptr<bool>(alive_)](const std::string& key) {
+        if (key != dashboardKey && key != selectionKey) return;
+        platform::mainQueue().async([this, alive] {
+            if (!alive.expired()) readWhatOthersWrote();
+        });
+    });
     load();
     pairing_ = QObject::connect(&platform::PairedDevices::shared(), &platform::PairedDevices::deviceDidPair,
                                 [this] { addGroupsForPairedWatch(); });
@@ -136,15 +153,15 @@ void QVDashboardDataUnitGroupsController::loadAgainIfFailed() {
         loadSelection();
 }
 
-void QVDashboardDataUnitGroupsController::dashboardRead(const std::optional<std::vector<int>>& storedIDs,
-                                                        bool wasRead) {
+void QVDashboardDataUnitGroupsController::dashboardRead(const std::optional<IDs>& storedIDs, bool wasRead) {
     isReading_ = false;
     if (loadState_ == LoadState::Loaded) return loadSelection();  // set by the user, while it was being read
     if (!wasRead) return dashboardCouldNotBeRead();
     const bool wasFailed = std::exchange(loadState_, LoadState::Loaded) == LoadState::Failed;
-    const Groups read = groupsWithIDs(storedIDs ? *storedIDs : hardwareDefaultIDs());
+    const IDs read = storedIDs ? *storedIDs : hardwareDefaultIDs();
+    dashboardBase_ = read;
     const bool wasChanged = wasFailed && *dashboard_ != standIn_;
-    dashboard_ = wasChanged ? withChange(read, standIn_, *dashboard_) : read;
+    dashboard_ = groupsWithIDs(wasChanged ? withChange(read, idsOf(standIn_), idsOf(*dashboard_)) : read);
     if (wasChanged) persistDashboard();
     if (platform::PairedDevices::shared().hasActivePairedDevice()) addGroupsForPairedWatch();
     tellObservers();
@@ -175,21 +192,21 @@ void QVDashboardDataUnitGroupsController::loadSelection() {
     });
 }
 
-void QVDashboardDataUnitGroupsController::selectionRead(const std::optional<std::vector<int>>& storedIDs,
-                                                        bool wasRead) {
+void QVDashboardDataUnitGroupsController::selectionRead(const std::optional<IDs>& storedIDs, bool wasRead) {
     if (selectionState_ == LoadState::Loaded) return;  // by the user, while it was being read
     // What could not be read may be there all the same, and is the user's.
     const bool isKnown = wasRead && (storedIDs || loadState_ == LoadState::Loaded);
     selectionState_ = isKnown ? LoadState::Loaded : LoadState::Failed;
     selected_ = storedIDs ? withoutRepetition(groupsWithIDs(*storedIDs)) : firstThreeOfDashboard();
+    selectionBase_ = storedIDs ? *storedIDs : idsOf(selected_);
     if (!isKnown) return;
     if (!storedIDs && !selected_.empty()) persistSelection();
     if (std::exchange(dropUnshownWhenRead_, false)) dropUnshownFromSelection();
 }
 
-std::vector<int> QVDashboardDataUnitGroupsController::hardwareDefaultIDs() {
+IDs QVDashboardDataUnitGroupsController::hardwareDefaultIDs() {
     const auto hardware = platform::MotionHardware::current();
-    std::vector<int> ids;
+    IDs ids;
     if (hardware->canCountSteps()) ids.push_back(VSGroupID::Steps);
     if (hardware->canMeasureDistance()) ids.push_back(VSGroupID::WalkingRunningDistance);
     if (hardware->canCountFloors()) ids.push_back(VSGroupID::FlightsClimbed);
@@ -197,7 +214,7 @@ std::vector<int> QVDashboardDataUnitGroupsController::hardwareDefaultIDs() {
 }
 
 QVDashboardDataUnitGroupsController::Groups QVDashboardDataUnitGroupsController::groupsWithIDs(
-    const std::vector<int>& ids) const {
+    const IDs& ids) const {
     Groups groups;
     for (const int id : ids)
         if (const VSDataUnitGroup* group = catalogue_.dataUnitGroupWithID(id)) groups.push_back(group);
@@ -268,8 +285,8 @@ void QVDashboardDataUnitGroupsController::setSelectedDataUnitGroups(const Groups
 void QVDashboardDataUnitGroupsController::addGroupsForPairedWatch() {
     // Before the list is loaded there is nothing to add to; loading looks for a paired watch itself.
     if (loadState_ != LoadState::Loaded) return;
-    std::vector<int>& ever = autoAddedIDs();
-    std::vector<int> additions;
+    IDs& ever = autoAddedIDs();
+    IDs additions;
     for (const int id : watchGroupIDs) {
         const VSDataUnitGroup* group = catalogue_.dataUnitGroupWithID(id);
         if ((group && isOnDashboard(group)) || contains(ever, id)) continue;
@@ -282,12 +299,11 @@ void QVDashboardDataUnitGroupsController::addGroupsForPairedWatch() {
     setDataUnitGroupsForDashboard(std::move(groups));
 }
 
-std::vector<int>& QVDashboardDataUnitGroupsController::autoAddedIDs() {
-    if (!autoAddedIDs_) {
-        const auto stored = platform::UserDefaults::standard().value(autoAddedKey);
-        autoAddedIDs_ = stored ? integers(*stored) : std::vector<int>{};
-    }
-    return *autoAddedIDs_;
+IDs& QVDashboardDataUnitGroupsController::autoAddedIDs() {
+    // Another window may have added some since.
+    const auto stored = platform::UserDefaults::standard().value(autoAddedKey);
+    const IDs known = autoAddedIDs_.value_or(IDs{});
+    return autoAddedIDs_.emplace(united(stored ? integers(*stored) : IDs{}, known));
 }
 
 // Persistence
@@ -297,13 +313,57 @@ void QVDashboardDataUnitGroupsController::persistDashboard() {
         tellObservers();
         return load();  // and then the change is made to what was read
     }
-    userDefaults_.setValue({{dashboardKey, arrayOf(idsOf(dataUnitGroupsForDashboard()))}}, dashboardKey,
-                           [](bool success) {
-                               if (!success) VSLog(VSLogLevel::Error, "Error saving user defaults");
-                           });
+    const IDs wanted = idsOf(dataUnitGroupsForDashboard());
+    ++dashboardWrites_;
+    userDefaults_.updateValue(
+        dashboardKey,
+        [base = dashboardBase_, wanted](const std::optional<VSValue>& current) {
+            const auto stored = storedIDs(current, dashboardKey);
+            return toStore(stored && base ? withChange(*stored, *base, wanted) : wanted, dashboardKey);
+        },
+        [this, alive = std::weak_ptr<bool>(alive_)](const auto& answer) {
+            if (!answer) VSLog(VSLogLevel::Error, "Error saving user defaults");
+            platform::mainQueue().async([this, alive, ids = storedIDs(answer, dashboardKey)] {
+                if (alive.expired()) return;
+                --dashboardWrites_;
+                if (ids) adoptDashboard(*ids);
+            });
+        });
     tellObservers();
     dropUnshownFromSelection();
-    if (autoAddedIDs_) platform::UserDefaults::standard().setValue(autoAddedKey, arrayOf(*autoAddedIDs_));
+    if (!autoAddedIDs_) return;
+    platform::UserDefaults::standard().updateValue(
+        autoAddedKey, [this](const std::optional<VSValue>& stored) {
+            return arrayOf(united(stored ? integers(*stored) : IDs{}, *autoAddedIDs_));
+        });
+}
+
+/// What is stored, when it is not what is shown: others have changed it too.
+void QVDashboardDataUnitGroupsController::adoptDashboard(const IDs& ids) {
+    dashboardBase_ = ids;
+    if (dashboardWrites_ > 0 || loadState_ != LoadState::Loaded) return;  // what follows will say
+    Groups groups = groupsWithIDs(ids);
+    if (groups == *dashboard_) return;
+    dashboard_ = std::move(groups);
+    tellObservers();
+}
+
+void QVDashboardDataUnitGroupsController::adoptSelection(const IDs& ids) {
+    selectionBase_ = ids;
+    if (selectionWrites_ == 0 && selectionState_ == LoadState::Loaded)
+        selected_ = withoutRepetition(groupsWithIDs(ids));
+}
+
+void QVDashboardDataUnitGroupsController::readWhatOthersWrote() {
+    for (const char* key : {dashboardKey, selectionKey})
+        userDefaults_.valueForKey(key, [this, key, alive = std::weak_ptr<bool>(alive_)](const auto& answer) {
+            platform::mainQueue().async([this, key, alive, ids = storedIDs(answer, key)] {
+                if (alive.expired() || !ids) return;
+                // An answer on its way may be older than a change that is made here meanwhile.
+                if (key == dashboardKey && dashboardWrites_ == 0) adoptDashboard(*ids);
+                if (key == selectionKey && selectionWrites_ == 0) adoptSelection(*ids);
+            });
+        });
 }
 
 void QVDashboardDataUnitGroupsController::dropUnshownFromSelection() {
@@ -316,9 +376,21 @@ void QVDashboardDataUnitGroupsController::dropUnshownFromSelection() {
 }
 
 void QVDashboardDataUnitGroupsController::persistSelection() {
-    userDefaults_.setValue({{selectionKey, arrayOf(idsOf(selected_))}}, selectionKey, [](bool success) {
-        if (!success) VSLog(VSLogLevel::Error, "Error saving selected dashboard data unit groups");
-    });
+    ++selectionWrites_;
+    userDefaults_.updateValue(
+        selectionKey,
+        [base = selectionBase_, wanted = idsOf(selected_)](const std::optional<VSValue>& current) {
+            const auto stored = storedIDs(current, selectionKey);
+            return toStore(stored && base ? withChange(*stored, *base, wanted) : wanted, selectionKey);
+        },
+        [this, alive = std::weak_ptr<bool>(alive_)](const auto& answer) {
+            if (!answer) VSLog(VSLogLevel::Error, "Error saving selected dashboard data unit groups");
+            platform::mainQueue().async([this, alive, ids = storedIDs(answer, selectionKey)] {
+                if (alive.expired()) return;
+                --selectionWrites_;
+                if (ids) adoptSelection(*ids);
+            });
+        });
 }
 
 void QVDashboardDataUnitGroupsController::tellObservers() {

@@ -19,13 +19,15 @@ class QVDashboardDataUnitGroupsObserver {
 };
 
 /// Which display types the dashboard shows, in which order, and which of them the landscape chart compares.
-/// Main thread only. The lists are read from the service's default values once, after construction, and
-/// written there with every change by the user. A list that could not be read may be there all the same: the
-/// defaults are shown in its place, nothing is added on its own account, and the user's next change reads it
-/// again and is made to what is then read.
+/// Main thread only. The lists are read from the service's default values after construction and whenever
+/// another window or program has written them, and every change by the user is made to what is stored then:
+/// windows on one store show, and keep, each other's changes. A list that could not be read may be there all
+/// the same: the defaults are shown in its place, nothing is added on its own account, and the user's next
+/// change reads it again and is made to what is then read.
 class QVDashboardDataUnitGroupsController {
  public:
     using Groups = std::vector<const VSDataUnitGroup*>;
+    using IDs = std::vector<int>;
     /// Reads the demo document ("demodata.plist" of the resources); none when it is missing or broken.
     using DemoDataLoader = std::function<std::optional<VSValue::Dictionary>()>;
 
@@ -69,19 +71,22 @@ class QVDashboardDataUnitGroupsController {
     enum class LoadState { Loading, Loaded, Failed };
     void load();
     void loadSelection();
-    void dashboardRead(const std::optional<std::vector<int>>& storedIDs, bool wasRead);
+    void dashboardRead(const std::optional<IDs>& storedIDs, bool wasRead);
     void dashboardCouldNotBeRead();
-    void selectionRead(const std::optional<std::vector<int>>& storedIDs, bool wasRead);
+    void selectionRead(const std::optional<IDs>& storedIDs, bool wasRead);
     void loadDemoSelection();
-    static std::vector<int> hardwareDefaultIDs();
-    Groups groupsWithIDs(const std::vector<int>& ids) const;
+    static IDs hardwareDefaultIDs();
+    Groups groupsWithIDs(const IDs& ids) const;
     Groups firstThreeOfDashboard() const;
     void addGroupsForPairedWatch();
-    std::vector<int>& autoAddedIDs();
+    IDs& autoAddedIDs();
     void persistDashboard();
     void dropUnshownFromSelection();
     void persistSelection();
     void tellObservers();
+    void adoptDashboard(const IDs& ids);
+    void adoptSelection(const IDs& ids);
+    void readWhatOthersWrote();
 
     const VSDataUnitGroupController& catalogue_;
     const DemoDataLoader demoDataLoader_;
@@ -93,9 +98,14 @@ class QVDashboardDataUnitGroupsController {
     Groups selected_;
     LoadState selectionState_ = LoadState::Loading;
     bool dropUnshownWhenRead_ = false;
+    // As stored, as far as it is known here: what a change is measured against; without it a list is
+    // replaced as a whole. And how many changes are on their way.
+    std::optional<IDs> dashboardBase_, selectionBase_;
+    int dashboardWrites_ = 0, selectionWrites_ = 0;
     std::vector<std::function<void()>> afterLoading_;  // changes asked for before there was a list to change
-    std::optional<std::vector<int>> autoAddedIDs_;     // none: not read in this process
+    std::optional<IDs> autoAddedIDs_;                  // none: not read in this process
     platform::ObserverSet<QVDashboardDataUnitGroupsObserver> observers_;
+    std::shared_ptr<const void> observation_;
     QMetaObject::Connection pairing_;
     std::shared_ptr<bool> alive_ = std::make_shared<bool>(true);
 };

@@ -17,6 +17,16 @@ void QVUserDefaults::setValue(VSValue::Dictionary value, const std::string& key,
                                   });
 }
 
+void QVUserDefaults::updateValue(const std::string& key, VSHealthStore::DefaultValueChange change,
+                                 std::function<void(const VSResult<std::optional<VSValue>>&)> completion) {
+    if (healthStore_) return healthStore_->updateDefaultValue(key, std::move(change), std::move(completion));
+    if (completion) completion(VSError{VSErrorCode::NotAccessible, "no connection to the health store"});
+}
+
+std::shared_ptr<const void> QVUserDefaults::observe(std::function<void(const std::string& key)> handler) {
+    return healthStore_ ? healthStore_->observeDefaultValues(std::move(handler)) : nullptr;
+}
+
 void QVUserDefaults::valueForKey(const std::string& key,
                                  std::function<void(const VSResult<std::optional<VSValue>>&)> callback) {
     if (!callback) return;

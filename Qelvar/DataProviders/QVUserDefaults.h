@@ -26,6 +26,13 @@ class QVUserDefaults {
     /// The completion gets whether the value was stored; it may be empty.
     void setValue(VSValue::Dictionary value, const std::string& key,
                   std::function<void(bool success)> completion);
+    /// Reads, changes and writes in one transaction, as VSHealthStore::updateDefaultValue does; the
+    /// completion gets what is stored then and may be empty.
+    void updateValue(const std::string& key, VSHealthStore::DefaultValueChange change,
+                     std::function<void(const VSResult<std::optional<VSValue>>&)> completion);
+    /// Calls the handler with the key of each value that this or another process changed, until the answer is
+    /// gone. Null without a connection.
+    [[nodiscard]] std::shared_ptr<const void> observe(std::function<void(const std::string& key)> handler);
     /// Without a callback it does nothing. The callback gets none when the value was never set.
     void valueForKey(const std::string& key,
                      std::function<void(const VSResult<std::optional<VSValue>>&)> callback);

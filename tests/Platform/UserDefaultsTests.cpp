@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -87,6 +88,36 @@ TEST_F(UserDefaultsTest, FailedWriteLeavesTheOldFileAndSaysSo) {
     EXPECT_EQ(log_.size(), 1u);
     EXPECT_FALSE(defaults.boolean("flag"));
     EXPECT_TRUE(UserDefaults(file()).boolean("flag"));
+}
+
+/// Each process adds to one list and sets keys of its own; the other's are there too.
+TEST_F(UserDefaultsTest, ProcessesLoseNothingOfEachOther) {
+    fs::create_directories(file().parent_path());
+    constexpr int times = 50;
+    const auto work = [this](const std::string& name) {
+        UserDefaults defaults(file());
+        for (int i = 0; i < times; ++i) {
+            defaults.setValue(name + std::to_string(i), i);
+            defaults.updateValue("list", [&](const std::optional<VSValue>& current) {
+                VSValue::Array list = current ? *current->array() : VSValue::Array{};
+                list.emplace_back(name);
+                return VSValue(list);
+            });
+        }
+    };
+    UserDefaults before(file());
+    before.setValue("list", VSValue::Array{});
+    const pid_t other = fork();
+    if (other == 0) {
+        work("theirs");
+        _exit(0);
+    }
+    work("ours");
+    ASSERT_EQ(waitpid(other, nullptr, 0), other);
+    EXPECT_EQ(before.value("list")->array()->size(), 2u * times) << "seen without reading anew";
+    for (int i = 0; i < times; ++i)
+        EXPECT_TRUE(before.value("theirs" + std::to_string(i)) && before.value("ours" + std::to_string(i)));
+    EXPECT_TRUE(log_.empty());
 }
 
 TEST_F(UserDefaultsTest, LeftOverOfAKilledProcessDoesNoHarm) {

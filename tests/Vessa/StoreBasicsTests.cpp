@@ -2,6 +2,7 @@
 
 #include <set>
 
+#include "ChildProcess.h"
 #include "StoreTestSupport.h"
 
 using namespace test;
@@ -145,6 +146,38 @@ TEST_F(StoreBasics, RelatesSamplesToAWorkoutOnce) {
     EXPECT_OK(relate());
     EXPECT_EQ(allSamples(*store, distance->sampleType()).size(), 1u) << "it was saved already";
     expectSound(*store);
+}
+
+/// Two processes count in one value; each is told of what the other wrote.
+TEST_F(StoreBasics, DefaultValuesAreChangedInTurn) {
+    constexpr int times = 50;
+    const auto countUp = [](VSHealthStore& counting) {
+        for (int i = 0; i < times; ++i)
+            EXPECT_TRUE(answerOf<std::optional<VSValue>>([&](auto done) {
+                            counting.updateDefaultValue(
+                                "count",
+                                [](const std::optional<VSValue>& current) {
+                                    return VSValue(current ? *current->integer() + 1 : 1);
+                                },
+                                done);
+                        }).ok());
+    };
+    store = nullptr;
+    Child other([&](const auto& say, const auto& listen) {
+        listen();
+        const auto theirs = openStore(folder.path());
+        countUp(*theirs);
+        say('+');
+    });
+    store = openStore(folder.path());
+    Log<std::string> told;
+    const auto observation = store->observeDefaultValues([&](const std::string& key) { told.add(key); });
+    other.tell();
+    EXPECT_TRUE(told.waitFor(1)) << "nothing was written here";
+    countUp(*store);
+    EXPECT_TRUE(other.hear());
+    EXPECT_EQ(*defaultValueOf(*store, "count"), VSValue(2 * times));
+    for (const std::string& key : told.entries()) EXPECT_EQ(key, "count");
 }
 
 TEST_F(StoreBasics, KeepsDefaultsCharacteristicsAndMedicalID) {

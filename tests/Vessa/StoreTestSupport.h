@@ -59,6 +59,8 @@ inline VSSamplePtr quantity(const VSObjectType* type, double value, const std::s
 inline std::shared_ptr<VSHealthStore> openStore(const std::filesystem::path& folder,
                                                 VSHealthStore::Options options = {}) {
     options.survivesPowerLoss = false;
+    // Nothing happens in the files but what a test does, unless it says otherwise.
+    if (options.quiet == VSHealthStore::Options().quiet) options.quiet = VSDuration::max();
     auto store = VSHealthStore::open(folder, options);
     if (!store) {
         ADD_FAILURE() << store.error().message;

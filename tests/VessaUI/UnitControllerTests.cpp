@@ -141,9 +141,18 @@ TEST_F(Units, AChoiceBeforeTheStoreAnsweredLosesNothing) {
         ASSERT_TRUE((*value)[key]) << key;
         EXPECT_EQ(*(*value)[key]->string(), text);
     }
-    EXPECT_EQ(unit(units, "Height"), "m");
+    ASSERT_TRUE(test::waitUntil([&] { return unit(units, "Height") == "m"; }));
     EXPECT_EQ(unit(units, "BodyTemperature"), "degF");
     EXPECT_EQ(unit(units, "ActiveEnergyBurned"), "kJ");
+}
+
+TEST_F(Units, OfTwoWindowsAreEachOthers) {
+    VSUnitController units(open(folder)), others(open(folder));
+    units.updatePreferredUnit(parsed("kJ"), unitOf("ActiveEnergyBurned"));
+    others.updatePreferredUnit(parsed("st"), unitOf("BodyMass"));
+    for (const VSUnitController* each : {&units, &others})
+        EXPECT_TRUE(test::waitUntil(
+            [&] { return unit(*each, "ActiveEnergyBurned") == "kJ" && unit(*each, "BodyMass") == "st"; }));
 }
 
 TEST_F(Units, ALocaleChangeIsToldForWhatItChanges) {

@@ -1,4 +1,8 @@
+#include <gtest/gtest.h>
+#include <rapidcheck/gtest.h>
+
 #include <mutex>
+#include <set>
 
 #include "Platform/MotionHardware.h"
 #include "Platform/PairedDevices.h"
@@ -263,6 +267,45 @@ TEST_F(SelectionTest, WithoutAStoreTheDefaultsApply) {
     EXPECT_NE(std::find(lines.begin(), lines.end(), "Error saving user defaults"), lines.end());
     EXPECT_NE(std::find(lines.begin(), lines.end(), "Error saving selected dashboard data unit groups"),
               lines.end());
+}
+
+/// Two windows on one store, each with a connection of its own; each changes another card before it has heard
+/// of the other's change, with its own store's answers coming when they come.
+RC_GTEST_FIXTURE_PROP(SelectionTest, WindowsKeepAndShowEachOthersChanges, ()) {
+    relaunch();
+    QVUserDefaults otherDefaults(*VSHealthStore::open(folder.path()));
+    const auto first = loadedController();
+    QVDashboardDataUnitGroupsController second(VSDataUnitGroupController::shared(), {}, otherDefaults);
+    RC_ASSERT(waitUntil([&] { return second.hasLoadedDashboard(); }));
+    QVDashboardDataUnitGroupsController* const windows[] = {first.get(), &second};
+    std::vector<int> cards;
+    for (const auto* each : VSDataUnitGroupController::shared().allDataUnitGroups())
+        cards.push_back(each->dataUnitGroupID());
+    IDs expected = ids(first->dataUnitGroupsForDashboard());
+    std::set<int> shown(expected.begin(), expected.end());
+    for (int round = *rc::gen::inRange(1, 6); round > 0; --round) {
+        const auto changed = *rc::gen::unique<std::vector<int>>(*rc::gen::inRange<std::size_t>(2, 5),
+                                                                rc::gen::elementOf(cards));
+        for (size_t i = 0; i < changed.size(); ++i) {
+            auto& window = *windows[i % 2];
+            if (shown.erase(changed[i])) {
+                window.removeDataUnitGroupFromDashboard(group(changed[i]));
+            } else {
+                shown.insert(changed[i]);
+                window.addDataUnitGroupToDashboard(group(changed[i]));
+            }
+        }
+        if (*rc::gen::arbitrary<bool>()) {
+            auto turned = first->dataUnitGroupsForDashboard();
+            std::reverse(turned.begin(), turned.end());
+            first->setDataUnitGroupsForDashboard(turned);
+        }
+        RC_ASSERT(waitUntil([&] {
+            const IDs a = ids(first->dataUnitGroupsForDashboard()),
+                      b = ids(second.dataUnitGroupsForDashboard());
+            return a == b && std::set<int>(a.begin(), a.end()) == shown;
+        }));
+    }
 }
 
 namespace {
