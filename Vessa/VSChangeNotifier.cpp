@@ -114,7 +114,7 @@ void VSChangeNotifier::run() {
 
 VSResult<VSChangeNotifier::State> VSChangeNotifier::read() {
     return readers_.read([this](VSStoreReader& reader) {
-        return State{reader.typeChanges(), reader.defaultTexts(application_)};
+        return State{reader.typeChanges(), watchesDefaults_ ? reader.defaultTexts(application_) : Defaults()};
     });
 }
 

@@ -35,6 +35,8 @@ class VSChangeNotifier {
     void start(std::shared_ptr<void> owner);
     /// After a commit of this process: look now, and let the others look. Any thread.
     void announce();
+    /// From now on changes of default values are told too; at first all may count as changed. Any thread.
+    void watchDefaults() { watchesDefaults_ = true; }
     /// Ends the thread; does not wait when called on it. Once.
     void finish();
 
@@ -55,7 +57,7 @@ class VSChangeNotifier {
     const std::string application_;
     const Handler handler_;
     int wakeDescriptor_ = -1, watchDescriptor_ = -1;
-    std::atomic<bool> finishing_ = false;
+    std::atomic<bool> finishing_ = false, watchesDefaults_ = false;
     State known_;         // of the thread
     std::thread thread_;  // of the thread that starts and finishes
 };

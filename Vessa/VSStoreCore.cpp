@@ -153,6 +153,7 @@ std::shared_ptr<const void> VSStoreCore::observeDefaultValues(DefaultValueHandle
     auto observer = std::make_shared<const DefaultValueHandler>(std::move(handler));
     std::lock_guard lock(observersMutex_);
     observers_.push_back(observer);
+    notifier.watchDefaults();
     return observer;
 }
 

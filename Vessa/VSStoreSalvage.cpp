@@ -7,7 +7,10 @@
 #include <algorithm>
 #include <cerrno>
 #include <map>
+#include <optional>
+#include <unordered_map>
 #include <unordered_set>
+#include <utility>
 
 #include "Vessa/Base/VSCalendar.h"
 #include "Vessa/VSNumberSet.h"
@@ -197,12 +200,36 @@ class Salvage {
         });
     }
 
+    /// The numbers that several rows have, with the type and start that the index of numbers tells.
+    std::unordered_map<int64_t, std::optional<std::pair<int64_t, int64_t>>> numbersGivenTwice() {
+        std::unordered_map<int64_t, std::optional<std::pair<int64_t, int64_t>>> doubles;
+        VSNumberSet seen;
+        damaged_.forEachRow(Table::Samples, [&](const VSPageRow& row) {
+            const int64_t id = row.fields[2].integer;
+            if (isPossible(id) && !seen.insert(id)) doubles.try_emplace(id);
+        });
+        if (doubles.empty()) return doubles;
+        damaged_.forEachRow(Table::SamplesByID, [&](const VSPageRow& row) {
+            const auto found = doubles.find(row.fields[1].integer);
+            if (found != doubles.end() && !found->second)
+                found->second = {row.fields[0].integer, row.fields[2].integer};
+        });
+        return doubles;
+    }
+
     void copySamples() {
         auto insert = database_.use("INSERT OR IGNORE INTO samples VALUES (?, ?, ?, ?, ?, ?, ?, ?)");
         int64_t withoutSource = 0, withoutMetadata = 0;
+        const auto doubles = numbersGivenTwice();
         damaged_.forEachRow(Table::Samples, [&](const VSPageRow& row) {
             const int64_t id = row.fields[2].integer;
-            if (!isPossible(id) || deleted_.contains(id) || !samples_.insert(id)) return;
+            if (!isPossible(id) || deleted_.contains(id)) return;
+            // Of several the one that the index knows: a broken bit may have given a row another's number.
+            const auto known = doubles.find(id);
+            if (known != doubles.end() && known->second &&
+                *known->second != std::pair(row.fields[0].integer, row.fields[1].integer))
+                return;
+            if (!samples_.insert(id)) return;
             for (int column = 0; column < 8; ++column)
                 bindField(insert, column + 1, row.fields[static_cast<size_t>(column)]);
             const int64_t provenance = row.fields[5].integer;

@@ -159,7 +159,7 @@ void QVDashboardDataUnitGroupsController::dashboardRead(const std::optional<IDs>
     if (!wasRead) return dashboardCouldNotBeRead();
     const bool wasFailed = std::exchange(loadState_, LoadState::Loaded) == LoadState::Failed;
     const IDs read = storedIDs ? *storedIDs : hardwareDefaultIDs();
-    dashboardBase_ = read;
+    dashboardBase_ = dashboardStored_ = idsOf(groupsWithIDs(read));
     const bool wasChanged = wasFailed && *dashboard_ != standIn_;
     dashboard_ = groupsWithIDs(wasChanged ? withChange(read, idsOf(standIn_), idsOf(*dashboard_)) : read);
     if (wasChanged) persistDashboard();
@@ -198,7 +198,7 @@ void QVDashboardDataUnitGroupsController::selectionRead(const std::optional<IDs>
     const bool isKnown = wasRead && (storedIDs || loadState_ == LoadState::Loaded);
     selectionState_ = isKnown ? LoadState::Loaded : LoadState::Failed;
     selected_ = storedIDs ? withoutRepetition(groupsWithIDs(*storedIDs)) : firstThreeOfDashboard();
-    selectionBase_ = storedIDs ? *storedIDs : idsOf(selected_);
+    selectionBase_ = selectionStored_ = idsOf(selected_);
     if (!isKnown) return;
     if (!storedIDs && !selected_.empty()) persistSelection();
     if (std::exchange(dropUnshownWhenRead_, false)) dropUnshownFromSelection();
@@ -317,7 +317,7 @@ void QVDashboardDataUnitGroupsController::persistDashboard() {
     ++dashboardWrites_;
     userDefaults_.updateValue(
         dashboardKey,
-        [base = dashboardBase_, wanted](const std::optional<VSValue>& current) {
+        [base = std::exchange(dashboardBase_, wanted), wanted](const std::optional<VSValue>& current) {
             const auto stored = storedIDs(current, dashboardKey);
             return toStore(stored && base ? withChange(*stored, *base, wanted) : wanted, dashboardKey);
         },
@@ -326,7 +326,10 @@ void QVDashboardDataUnitGroupsController::persistDashboard() {
             platform::mainQueue().async([this, alive, ids = storedIDs(answer, dashboardKey)] {
                 if (alive.expired()) return;
                 --dashboardWrites_;
-                if (ids) adoptDashboard(*ids);
+                if (ids)
+                    adoptDashboard(*ids);
+                else
+                    dashboardBase_ = dashboardStored_;  // the next change brings this one too
             });
         });
     tellObservers();
@@ -340,18 +343,20 @@ void QVDashboardDataUnitGroupsController::persistDashboard() {
 
 /// What is stored, when it is not what is shown: others have changed it too.
 void QVDashboardDataUnitGroupsController::adoptDashboard(const IDs& ids) {
-    dashboardBase_ = ids;
-    if (dashboardWrites_ > 0 || loadState_ != LoadState::Loaded) return;  // what follows will say
     Groups groups = groupsWithIDs(ids);
+    dashboardStored_ = idsOf(groups);
+    if (dashboardWrites_ > 0 || loadState_ != LoadState::Loaded) return;  // what follows will say
+    dashboardBase_ = dashboardStored_;
     if (groups == *dashboard_) return;
     dashboard_ = std::move(groups);
     tellObservers();
 }
 
 void QVDashboardDataUnitGroupsController::adoptSelection(const IDs& ids) {
-    selectionBase_ = ids;
-    if (selectionWrites_ == 0 && selectionState_ == LoadState::Loaded)
-        selected_ = withoutRepetition(groupsWithIDs(ids));
+    selectionStored_ = idsOf(withoutRepetition(groupsWithIDs(ids)));
+    if (selectionWrites_ > 0 || selectionState_ != LoadState::Loaded) return;
+    selectionBase_ = selectionStored_;
+    selected_ = groupsWithIDs(*selectionStored_);
 }
 
 void QVDashboardDataUnitGroupsController::readWhatOthersWrote() {
@@ -376,10 +381,11 @@ void QVDashboardDataUnitGroupsController::dropUnshownFromSelection() {
 }
 
 void QVDashboardDataUnitGroupsController::persistSelection() {
+    const IDs wanted = idsOf(selected_);
     ++selectionWrites_;
     userDefaults_.updateValue(
         selectionKey,
-        [base = selectionBase_, wanted = idsOf(selected_)](const std::optional<VSValue>& current) {
+        [base = std::exchange(selectionBase_, wanted), wanted](const std::optional<VSValue>& current) {
             const auto stored = storedIDs(current, selectionKey);
             return toStore(stored && base ? withChange(*stored, *base, wanted) : wanted, selectionKey);
         },
@@ -388,7 +394,10 @@ void QVDashboardDataUnitGroupsController::persistSelection() {
             platform::mainQueue().async([this, alive, ids = storedIDs(answer, selectionKey)] {
                 if (alive.expired()) return;
                 --selectionWrites_;
-                if (ids) adoptSelection(*ids);
+                if (ids)
+                    adoptSelection(*ids);
+                else
+                    selectionBase_ = selectionStored_;  // the next change brings this one too
             });
         });
 }

@@ -98,9 +98,10 @@ class QVDashboardDataUnitGroupsController {
     Groups selected_;
     LoadState selectionState_ = LoadState::Loading;
     bool dropUnshownWhenRead_ = false;
-    // As stored, as far as it is known here: what a change is measured against; without it a list is
-    // replaced as a whole. And how many changes are on their way.
-    std::optional<IDs> dashboardBase_, selectionBase_;
+    // What is stored as far as it is known here, without what the catalogue does not know; and the same with
+    // the changes that are on their way, which is what the next change is measured against (without it a list
+    // is replaced as a whole). And how many are on their way.
+    std::optional<IDs> dashboardStored_, selectionStored_, dashboardBase_, selectionBase_;
     int dashboardWrites_ = 0, selectionWrites_ = 0;
     std::vector<std::function<void()>> afterLoading_;  // changes asked for before there was a list to change
     std::optional<IDs> autoAddedIDs_;                  // none: not read in this process
