@@ -44,7 +44,7 @@ struct Traces {
         provenance.device = std::make_shared<VSDevice>(made);
         const std::string content = text();
         std::string padded;
-        do padded += content;
+        do padded += content + std::string(size ? 1000 : 0, 'x');
         while (padded.size() < size);
         if (random() % 3 || size)
             provenance.metadata = std::make_shared<VSMetadata>(VSMetadata{{"note", padded}});
