@@ -111,6 +111,14 @@ QRectF QVChart::chartRectangle() const {
     return {0, -kChartOverhang, size_.width(), size_.height() - xAxisGutterHeight_ + 2 * kChartOverhang};
 }
 
+bool QVChart::imagesFit() const {
+    const QImage image = renderer_ ? renderer_->chartImage() : QImage();
+    if (image.isNull()) return true;
+    const QSizeF pixels = chartRectangle().size() * screenScale_;
+    return image.size() ==
+           QSize(static_cast<int>(std::ceil(pixels.width())), static_cast<int>(std::ceil(pixels.height())));
+}
+
 void QVChart::layoutIfNeeded() {
     if (!needsLayout_ || size_.isEmpty()) return;
     needsLayout_ = false;

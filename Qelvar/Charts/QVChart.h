@@ -82,6 +82,8 @@ class QVChart {
     /// Moves animations to a time; returns whether one is still running.
     bool advance(QVAnimationTime now);
     bool isAnimating() const { return animating_; }
+    /// Whether what was drawn last is of the present size. After a change of it the new images come later.
+    bool imagesFit() const;
 
     // Where things are, in points of the chart.
 

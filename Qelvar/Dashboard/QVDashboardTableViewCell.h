@@ -72,7 +72,7 @@ class QVDashboardTableViewCell : public QQuickItem {
     /// Whether the item has loaded all that the card shows and the chart is drawn from it.
     bool showsItsData() const;
     /// The same, and nothing is moving any more.
-    bool isSettled() const { return showsItsData() && !chart_.isAnimating(); }
+    bool isSettled() const { return showsItsData() && chart_.imagesFit() && !chart_.isAnimating(); }
     /// The same of what was painted into the scene last.
     bool wasPaintedWithData() const { return painted_ >= Painted::WithData; }
     bool wasPaintedSettled() const { return painted_ == Painted::Settled; }
