@@ -246,6 +246,7 @@ void WeekOfBars(benchmark::State& state) {
     series->setBarWidth(kBarWidth);
     series->setLineCapStyle(QVLineCapStyle::Round);
     series->setFillColor(kHalfWhite);
+    series->setEdgeColor(QColor::fromRgbF(1, 1, 1, 0.75f));
     series->setBottomPadding(kBarBottom);
     const auto data = readings(7);
     Ours ours(series, points(data, numberPoint), 7);
@@ -261,6 +262,7 @@ void ranges(benchmark::State& state, int days) {
     series->setPointRadius(kRadius);
     series->setPointLineWidth(kRingWidth);
     series->setFillColor(kHalfWhite);
+    series->setEdgeColor(QColor::fromRgbF(1, 1, 1, 0.75f));
     const auto data = readings(days);
     Ours ours(series, points(data, rangePoint), days);
     const Bare bare(data);

@@ -35,6 +35,69 @@ bool overlap(const std::vector<QRectF>& outlines) {
     return false;
 }
 
+/// The hairlines along both long sides of an outline. They lie on whole pixels: nothing is to be smoothed,
+/// which would take several times as long.
+void drawSides(QPainter& painter, const QRectF& outline, const QColor& color, Qt::Orientation direction) {
+    const double edge = edgeWidth(painter);
+    const bool vertical = direction == Qt::Vertical;
+    if ((vertical ? outline.width() : outline.height()) <= 2 * edge) {
+        painter.fillRect(outline, color);
+    } else if (vertical) {
+        painter.fillRect(QRectF(outline.left(), outline.top(), edge, outline.height()), color);
+        painter.fillRect(QRectF(outline.right() - edge, outline.top(), edge, outline.height()), color);
+    } else {
+        painter.fillRect(QRectF(outline.left(), outline.top(), outline.width(), edge), color);
+        painter.fillRect(QRectF(outline.left(), outline.bottom() - edge, outline.width(), edge), color);
+    }
+}
+
+/// Runs `draw` without smoothing.
+template <typename Draw>
+void withoutSmoothing(QPainter& painter, Draw draw) {
+    const bool smooth = painter.testRenderHint(QPainter::Antialiasing);
+    painter.setRenderHint(QPainter::Antialiasing, false);
+    draw();
+    painter.setRenderHint(QPainter::Antialiasing, smooth);
+}
+
+/// The edge of a dot of so many pixels.
+QImage ringImage(int side, int edge, const QColor& color) {
+    QImage image(side, side, QImage::Format_ARGB32_Premultiplied);
+    image.fill(Qt::transparent);
+    QPainter painter(&image);
+    painter.setRenderHint(QPainter::Antialiasing);
+    QPainterPath path = rounded(QRectF(0, 0, side, side));
+    if (side > 2 * edge) path.addPath(rounded(QRectF(edge, edge, side - 2 * edge, side - 2 * edge)));
+    painter.fillPath(path, color);  // odd-even
+    return image;
+}
+
+/// The edge of a rounded outline: the halves of a dot's, which is made once for all that are as thick, and
+/// the sides between them.
+void drawEdge(QPainter& painter, const QRectF& outline, const QColor& color, QImage& ring) {
+    const double pixels = painter.device()->devicePixelRatio();
+    const double thickness = std::min(outline.width(), outline.height());
+    const int side = static_cast<int>(std::lround(thickness * pixels));
+    if (side <= 0) return;
+    if (ring.width() != side)
+        ring = ringImage(side, static_cast<int>(std::lround(edgeWidth(painter) * pixels)), color);
+    const bool vertical = outline.height() >= outline.width();
+    const int first = side / 2, last = side - first;
+    const auto drawHalf = [&](QPointF place, int from, int length) {
+        const QRect part = vertical ? QRect(0, from, side, length) : QRect(from, 0, length, side);
+        painter.drawImage(QRectF(place, QSizeF(part.size()) / pixels), ring, part);
+    };
+    const double firstEnd = first / pixels, lastStart = last / pixels;
+    drawHalf(outline.topLeft(), 0, first);
+    if (vertical) {
+        drawHalf({outline.left(), outline.bottom() - lastStart}, first, last);
+        drawSides(painter, outline.adjusted(0, firstEnd, 0, -lastStart), color, Qt::Vertical);
+    } else {
+        drawHalf({outline.right() - lastStart, outline.top()}, first, last);
+        drawSides(painter, outline.adjusted(firstEnd, 0, -lastStart, 0), color, Qt::Horizontal);
+    }
+}
+
 }  // namespace
 
 QImage QVTransparentImage(QSizeF size, double scale) {
@@ -83,16 +146,15 @@ void QVFillSegment(QPainter& painter, QPointF a, QPointF b, double width, QVLine
 
 void QVDrawEdges(QPainter& painter, QSizeF imageSize, const std::vector<QRectF>& outlines,
                  const QColor& color) {
-    const double edge = edgeWidth(painter);
-    const auto inside = [edge](const QRectF& outline) { return outline.adjusted(edge, edge, -edge, -edge); };
     if (!overlap(outlines)) {
-        for (const QRectF& outline : outlines) {
-            QPainterPath path = rounded(outline);
-            if (!inside(outline).isEmpty()) path.addPath(rounded(inside(outline)));
-            painter.fillPath(path, color);  // odd-even
-        }
+        QImage ring;
+        withoutSmoothing(painter, [&] {
+            for (const QRectF& outline : outlines) drawEdge(painter, outline, color, ring);
+        });
         return;
     }
+    const double edge = edgeWidth(painter);
+    const auto inside = [edge](const QRectF& outline) { return outline.adjusted(edge, edge, -edge, -edge); };
     QVPaintLayer(painter, imageSize, color.alphaF(), [&](QPainter& layer) {
         for (const QRectF& outline : outlines) layer.fillPath(rounded(outline), QVOpaque(color));
         layer.setCompositionMode(QPainter::CompositionMode_DestinationOut);
@@ -102,15 +164,9 @@ void QVDrawEdges(QPainter& painter, QSizeF imageSize, const std::vector<QRectF>&
 }
 
 void QVDrawSideEdges(QPainter& painter, const std::vector<QRectF>& outlines, const QColor& color) {
-    const double edge = edgeWidth(painter);
-    for (const QRectF& outline : outlines) {
-        if (outline.width() <= 2 * edge) {
-            painter.fillRect(outline, color);
-            continue;
-        }
-        painter.fillRect(QRectF(outline.left(), outline.top(), edge, outline.height()), color);
-        painter.fillRect(QRectF(outline.right() - edge, outline.top(), edge, outline.height()), color);
-    }
+    withoutSmoothing(painter, [&] {
+        for (const QRectF& outline : outlines) drawSides(painter, outline, color, Qt::Vertical);
+    });
 }
 
 void QVEraseCircles(QPainter& painter, const std::vector<QPointF>& centers, double radius) {
