@@ -10,6 +10,7 @@ T.Button {
     implicitWidth: label.implicitWidth + (filled ? 40 : 16)
     focusPolicy: Qt.StrongFocus
     Accessible.name: text
+    Accessible.onPressAction: button.clicked()
     Keys.onReturnPressed: button.clicked()
     Keys.onEnterPressed: button.clicked()
     contentItem: Text {

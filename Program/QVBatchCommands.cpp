@@ -1,11 +1,16 @@
+#include <unistd.h>
+
 #include <charconv>
 #include <cstdio>
+#include <future>
 
 #include "Program/QVCommand.h"
 #include "Program/QVTabOutput.h"
 #include "Vessa/VSStoreMigration.h"
 
 namespace {
+
+constexpr auto kSilentPatience = std::chrono::milliseconds(500);
 
 QVExitStatus finish(QVTabOutput& output) {
     const VSStatus status = output.finish();
@@ -27,6 +32,18 @@ QVExitStatus runBatches(const QVCommandContext& context) {
     return finish(output);
 }
 
+/// Has no limit to its patience: what holds the store lives and works, and a signal ends the wait.
+VSResult<VSUndoReport> undoWaiting(VSHealthStore& store, int64_t batch) {
+    auto undone = std::async(std::launch::async, [&store, batch] { return store.undoBatch(batch); });
+    QVWaitingLine line;
+    while (undone.wait_for(kSilentPatience) == std::future_status::timeout) {
+        const auto holder = VSReadStoreHolder(store.folder());
+        // Without a note it may be this undoing itself that takes its time to end.
+        if (holder && holder->process != getpid()) line.show(holder);
+    }
+    return undone.get();
+}
+
 QVExitStatus runUndo(const QVCommandContext& context) {
     const auto& words = context.arguments.words();
     if (words.size() != 1) return QVFailUsage("undo", "undo needs the number of one batch");
@@ -41,9 +58,10 @@ QVExitStatus runUndo(const QVCommandContext& context) {
     VSHealthStore::Options options;
     options.createIfMissing = false;
     options.quiet = VSDuration::max();  // at the end, not in between
+    options.patience = VSDuration::max();
     auto store = VSHealthStore::open(context.storeFolder, options);
     if (!store) return QVFail(store.error());
-    const auto report = (*store)->undoBatch(batch);
+    const auto report = undoWaiting(**store, batch);
     if (!report) return QVFail(report.error());
     QVTabOutput output;
     output.row({"removed", "kept", "gone", "characteristics"});
@@ -82,7 +100,8 @@ Takes back what an import did; `qelvar batches` lists the imports by number. Wha
 what another import had in its documents too. What was entered by hand stays. Characteristics that it set and
 that have not been changed since are not set again, unless another import told them too. It is done at once,
 without a question, and as a whole; importing the same documents again brings everything back. What was
-removed is overwritten on the disk and its space given back.
+removed is overwritten on the disk and its space given back. While another program writes to the store, it
+waits and says for whom; Ctrl+C ends it.
 
 Standard output: removed, kept (for another import), gone (what had been deleted before), characteristics.
 )",

@@ -42,6 +42,16 @@ QVExitStatus QVFailUsage(std::string_view command, std::string_view message) {
     return QVExitStatus::Usage;
 }
 
+void QVWaitingLine::show(const std::optional<VSStoreHolder>& holder) {
+    const std::string who = holder ? " (" + holder->description() + ", since " +
+                                         VSISO8601FromDate(holder->since, VSCalendar::current()) + ")"
+                                   : "";
+    if (told_ == who) return;
+    told_ = who;
+    QVPrintError("another program writes to the store" + who +
+                 "; waiting until it has finished (Ctrl+C ends)");
+}
+
 VSResult<std::shared_ptr<VSHealthStore>> QVOpenStoreForReading(const std::filesystem::path& folder) {
     std::error_code error;
     if (!std::filesystem::exists(folder, error))
@@ -52,11 +62,43 @@ VSResult<std::shared_ptr<VSHealthStore>> QVOpenStoreForReading(const std::filesy
     return VSHealthStore::open(folder, options);
 }
 
+void QVSayNoRecords(const VSObjectType& type) {
+    QVPrintError("the store has no records of " + std::string(type.name()) +
+                 "; `qelvar types --recorded` lists what it has");
+}
+
+namespace {
+
+std::string lowerCase(std::string_view text) {
+    std::string lower(text);
+    for (char& c : lower)
+        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c + 'a' - 'A');
+    return lower;
+}
+
+/// The types whose names hold the text, whatever its case; a few.
+std::string similarTypes(std::string_view text) {
+    constexpr int kMost = 5;
+    std::string names;
+    int count = 0;
+    for (const VSObjectType* type : VSObjectType::allTypes()) {
+        const bool isSimilar = text.size() > 2 && type->isSampleType() &&
+                               lowerCase(type->name()).find(lowerCase(text)) != std::string::npos;
+        if (isSimilar && ++count <= kMost) names += (names.empty() ? "" : ", ") + std::string(type->name());
+    }
+    return names;
+}
+
+}  // namespace
+
 VSResult<const VSObjectType*> QVTypeForArgument(std::string_view text) {
     const VSObjectType* type = VSObjectType::typeForIdentifier(text);
-    if (!type)
-        return VSError{VSErrorCode::NotFound,
-                       "there is no type " + std::string(text) + "; `qelvar types` lists them"};
+    if (!type) {
+        const std::string similar = similarTypes(text);
+        return VSError{VSErrorCode::NotFound, "there is no type " + std::string(text) +
+                                                  (similar.empty() ? "" : "; do you mean " + similar + "?") +
+                                                  "; `qelvar types` lists them"};
+    }
     if (!type->isSampleType())
         return VSError{VSErrorCode::Invalid,
                        std::string(text) + " is a characteristic of the person and has no records"};

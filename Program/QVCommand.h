@@ -9,6 +9,7 @@
 #include "Program/QVCommandArguments.h"
 #include "Vessa/Base/VSError.h"
 #include "Vessa/VSHealthStore.h"
+#include "Vessa/VSStoreHolder.h"
 
 /// The exit statuses. Scripts know them: never change a number.
 enum class QVExitStatus : int {
@@ -47,8 +48,20 @@ struct QVCommand {
     QVExitStatus (*run)(const QVCommandContext& context);
 };
 
+/// Tells, each time that it is another, whom a command waits for that wants to write to the store.
+class QVWaitingLine {
+ public:
+    void show(const std::optional<VSStoreHolder>& holder);
+
+ private:
+    std::optional<std::string> told_;
+};
+
 /// The store for reading. NotFound when there is none in the folder.
 VSResult<std::shared_ptr<VSHealthStore>> QVOpenStoreForReading(const std::filesystem::path& folder);
+
+/// On standard error, that the store has no records of the type: no rows alone do not tell why.
+void QVSayNoRecords(const VSObjectType& type);
 
 /// A type by identifier with or without its prefix. NotFound.
 VSResult<const VSObjectType*> QVTypeForArgument(std::string_view text);
@@ -57,5 +70,5 @@ VSResult<VSDate> QVDateForArgument(std::string_view option, std::string_view tex
 /// The date of an option; none when it is not given.
 VSResult<std::optional<VSDate>> QVDateOption(const QVCommandArguments& arguments, std::string_view option);
 
-extern const QVCommand QVImportCommand, QVExportCommand, QVStatisticsCommand, QVSamplesCommand, QVTypesCommand,
-    QVSourcesCommand, QVCheckCommand, QVBatchesCommand, QVUndoCommand, QVSalvageCommand;
+extern const QVCommand QVImportCommand, QVExportCommand, QVStatisticsCommand, QVSamplesCommand,
+    QVTypesCommand, QVSourcesCommand, QVCheckCommand, QVBatchesCommand, QVUndoCommand, QVSalvageCommand;

@@ -8,6 +8,7 @@
 #include "Program/QVCommand.h"
 #include "Program/QVInterruption.h"
 #include "Program/QVTabOutput.h"
+#include "Qelvar/Import/QVFileKind.h"
 #include "Qelvar/Import/QVRecordsImporter.h"
 #include "Vessa/VSStoreSchema.h"
 
@@ -23,10 +24,8 @@ class ProgressLine {
     ~ProgressLine() {
         if (line_) std::fputs("\r\033[K", stderr);
     }
-    void show(const QVImportProgress& progress) const {
-        if (progress.isWaiting)
-            return QVPrintError(
-                "another program writes to the store; waiting until it has finished (Ctrl+C ends)");
+    void show(const QVImportProgress& progress) {
+        if (progress.isWaiting) return waiting_.show(progress.holder);
         if (!rows_ && !line_) return;
         const auto done = static_cast<unsigned long long>(progress.bytesDone),
                    total = static_cast<unsigned long long>(progress.bytesTotal);
@@ -43,6 +42,7 @@ class ProgressLine {
  private:
     const bool rows_;
     const bool line_;
+    QVWaitingLine waiting_;
 };
 
 void printReasons(const std::string& what, const std::map<std::string, int64_t>& reasons) {
@@ -140,6 +140,29 @@ OpenedStore openForTrial(const std::filesystem::path& folder, std::optional<Tria
     return VSHealthStore::open(folder, options);
 }
 
+/// Tells of every file that cannot be imported, and the first error.
+VSStatus checkFiles(const std::vector<std::filesystem::path>& files) {
+    std::optional<VSError> first;
+    std::string fit;
+    for (const auto& path : files) {
+        const QVRecognisedFile file = QVRecogniseFile(path);
+        if (file.mayHoldRecords()) {
+            fit += " " + path.string();
+            continue;
+        }
+        const VSError error = QVUnfitFileError(path.string(), file);
+        QVPrintError(error.message);
+        if (!first) first = error;
+    }
+    if (!first) return {};
+    if (!fit.empty())
+        QVPrintError(
+            "nothing was imported, since all files of a command are imported together or none; without the "
+            "others try: qelvar import" +
+            fit);
+    return *first;
+}
+
 QVExitStatus run(const QVCommandContext& context) {
     const auto& words = context.arguments.words();
     if (words.empty()) return QVFailUsage("import", "import needs at least one file");
@@ -148,11 +171,7 @@ QVExitStatus run(const QVCommandContext& context) {
     if (!listed) return QVFailUsage("import", listed.error().message);
     // A second signal ends the process at once, which leaves no trace either.
     QVCatchInterruptions(QVSecondInterruption::EndsProcess);
-    for (const auto& file : files) {
-        std::error_code error;
-        if (!std::filesystem::exists(file, error))
-            return QVFail({VSErrorCode::NotFound, file.string() + ": there is no such file"});
-    }
+    if (const VSStatus status = checkFiles(files); !status) return QVExitStatusForError(status.error());
     QVImportOptions options;
     options.dryRun = context.arguments.has("dry-run");
     std::optional<TrialFolder> trial;
@@ -163,7 +182,7 @@ QVExitStatus run(const QVCommandContext& context) {
     options.cancel = &QVInterrupted();
     options.listedRefusals = *listed;
     const auto report = [&] {
-        const ProgressLine line(context.arguments.has("progress"));
+        ProgressLine line(context.arguments.has("progress"));
         options.progress = [&line](const QVImportProgress& progress) { line.show(progress); };
         return QVRecordsImporter(*store).importFiles(files, options);
     }();

@@ -3,6 +3,7 @@
 #include <limits>
 
 #include "Program/QVCommand.h"
+#include "Program/QVDurationStatistics.h"
 #include "Program/QVTabOutput.h"
 
 namespace {
@@ -56,19 +57,13 @@ std::string quantityText(const VSQuantity& quantity) {
     return QVTabOutput::number(quantity.value()) + " " + quantity.unit().unitString();
 }
 
-std::string categoryText(const VSCategorySample& sample) {
-    const std::string* identifier = sample.sampleType()->identifierForValue(sample.value());
-    return identifier ? *identifier : std::to_string(sample.value());
-}
-
 /// Value, unit and further details of a record of any kind.
 struct Content {
     std::string value, unit, details;
 };
 
 Content workoutContent(const VSWorkout& workout) {
-    const std::string* activity = VSWorkoutActivityTypeIdentifier(workout.workoutActivityType());
-    Content content{activity ? *activity : std::to_string(workout.workoutActivityType()), {}, {}};
+    Content content{QVValueText(workout), {}, {}};
     content.details = "duration=" + QVTabOutput::number(VSSecondsFromDuration(workout.duration())) + " s";
     if (workout.totalDistance()) content.details += "; distance=" + quantityText(*workout.totalDistance());
     if (workout.totalEnergyBurned())
@@ -87,10 +82,8 @@ Content contentOf(const VSSample& sample) {
         return {
             QVTabOutput::number(quantity->quantity().value()), quantity->quantity().unit().unitString(), {}};
     }
-    if (const auto* category = dynamic_cast<const VSCategorySample*>(&sample))
-        return {categoryText(*category), {}, {}};
     if (const auto* workout = dynamic_cast<const VSWorkout*>(&sample)) return workoutContent(*workout);
-    Content content;
+    Content content{QVValueText(sample), {}, {}};
     if (const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample)) {
         for (const VSSamplePtr& member : correlation->objects()) {
             const Content one = contentOf(*member);
@@ -156,6 +149,9 @@ QVExitStatus run(const QVCommandContext& context) {
     }
     const auto summaries = (*store)->typeSummaries();
     if (!summaries) return QVFail(summaries.error());
+    if (std::none_of(summaries->begin(), summaries->end(),
+                     [&type](const auto& summary) { return summary.type == *type; }))
+        QVSayNoRecords(**type);
     QVTabOutput output;
     output.row({"type", "start", "end", "value", "unit", "details", "source", "version", "device", "created",
                 "offset", "metadata"});

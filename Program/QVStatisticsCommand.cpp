@@ -2,6 +2,7 @@
 #include <sstream>
 
 #include "Program/QVCommand.h"
+#include "Program/QVDurationStatistics.h"
 #include "Program/QVTabOutput.h"
 
 namespace {
@@ -12,8 +13,8 @@ struct Request {
     bool manyTypes = false;
     std::optional<VSDate> from, to;
     std::optional<std::string> every;  // none: the range as a whole
-    std::vector<std::string> columns;  // of sum, average, minimum, maximum, as asked for
-    int options = 0;
+    std::vector<std::string> columns;  // of sum, average, minimum, maximum
+    bool hasOptions = false;           // the person chose the columns
     bool bySource = false, emptyBuckets = false, explain = false;
     std::vector<std::string> units;
 };
@@ -68,22 +69,59 @@ VSError usage(std::string message) {
     return VSError{VSErrorCode::Invalid, std::move(message)};
 }
 
-VSStatus readColumns(const QVCommandArguments& arguments, Request& request) {
+/// What adds up has sums; what is measured again and again has averages and bounds. Averages and bounds of
+/// the records of what adds up say how long they happen to be, and are told to those who ask for them.
+bool makesSense(const VSObjectType& type, const StatisticName& statistic, bool isAskedFor) {
+    if (statistic.option == VSStatisticsOptionCumulativeSum) return type.isCumulative();
+    return isAskedFor || !type.isCumulative();
+}
+
+/// Whether records of the type are told by value, with the time that they take.
+bool hasDurations(const VSObjectType& type) {
+    return type.kind() == VSTypeKind::Category || type.kind() == VSTypeKind::Workout;
+}
+bool showsDurations(const Request& request, const VSObjectType* only) {
+    return !request.hasOptions && (!only || hasDurations(*only));
+}
+
+VSError noSense(const VSObjectType& type, const std::string& name) {
+    const std::string what(type.name());
+    if (type.isQuantityType())
+        return usage("--options: a " + name + " of " + what +
+                     " says nothing, since its records are measured and not added up; average, minimum and "
+                     "maximum are what it has");
+    if (hasDurations(type))
+        return usage("--options: " + what + " has no " + name +
+                     ", since its records are no numbers; without --options their number and the time that "
+                     "they take are told");
+    return usage("--options: " + what + " has no " + name +
+                 ", since its records hold several values; ask for the types of these (`qelvar samples " +
+                 what + "` shows them)");
+}
+
+/// `only` is null when all types are asked for.
+VSStatus readColumns(const QVCommandArguments& arguments, const VSObjectType* only, Request& request) {
+    request.hasOptions = arguments.has("options");
     std::istringstream list(arguments.value("options").value_or("sum,average,minimum,maximum"));
     for (std::string name; std::getline(list, name, ',');) {
         const StatisticName* statistic = statisticNamed(name);
         if (!statistic) return usage("--options: " + name + " is not one of sum, average, minimum, maximum");
-        if (request.options & statistic->option) continue;
-        request.options |= statistic->option;
-        request.columns.push_back(name);
+        if (std::find(request.columns.begin(), request.columns.end(), name) != request.columns.end())
+            continue;
+        const bool fits =
+            !only || (only->isQuantityType() && makesSense(*only, *statistic, request.hasOptions));
+        if (fits || arguments.has("explain"))
+            request.columns.push_back(name);
+        else if (request.hasOptions)
+            return noSense(*only, name);
     }
-    if (request.columns.empty()) return usage("--options names nothing");
+    if (request.hasOptions && request.columns.empty()) return usage("--options names nothing");
     return {};
 }
 
-VSResult<Request> readRequest(const QVCommandArguments& arguments) {
+VSResult<Request> readRequest(const QVCommandArguments& arguments, const VSObjectType* only) {
     Request request;
-    if (const VSStatus status = readColumns(arguments, request); !status) return status.error();
+    if (const VSStatus status = readColumns(arguments, only, request); !status) return status.error();
     for (const auto& [option, date] : {std::pair("from", &request.from), std::pair("to", &request.to)}) {
         const auto given = QVDateOption(arguments, option);
         if (!given) return given.error();
@@ -99,7 +137,6 @@ VSResult<Request> readRequest(const QVCommandArguments& arguments) {
     if (request.explain && (request.bySource || request.emptyBuckets || arguments.has("options")))
         return usage("--explain goes without --options, --by-source and --empty");
     request.units = arguments.values("unit");
-    if (request.bySource) request.options |= VSStatisticsOptionSeparateBySource;
     return request;
 }
 
@@ -114,6 +151,9 @@ class TypeStatistics {
           output_(output),
           from_(request.from.value_or(summary.firstStart)),
           to_(request.to.value_or(summary.lastEnd + VSDuration(1))) {
+        for (const std::string& column : request.columns)
+            if (has(column) || request.explain) options_ |= statisticNamed(column)->option;
+        if (request.bySource) options_ |= VSStatisticsOptionSeparateBySource;
         if (request.every) beginning_ = beginning(*request.every, from_, calendar_);
         // Without a date given, the range is that of the records, in whole intervals.
         if (request.every && !request.from) from_ = beginning_;
@@ -123,17 +163,17 @@ class TypeStatistics {
         if (VSStatus status = findUnit(); !status) return status;
         if (from_ >= to_) return {};
         if (request_.explain) return explain();
-        if (!type_->isQuantityType()) return writeCounts();
+        if (!type_->isQuantityType()) return writeDurations();
         const auto predicate = VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionNone);
         if (!request_.every) {
-            auto statistics = store_.statistics(type_, predicate, request_.options);
+            auto statistics = store_.statistics(type_, predicate, options_);
             if (!statistics) return statistics.error();
             statistics->startDate = from_;
             statistics->endDate = to_;
             writeRows(*statistics);
             return {};
         }
-        const auto collection = store_.statisticsCollection(type_, predicate, request_.options, beginning_,
+        const auto collection = store_.statisticsCollection(type_, predicate, options_, beginning_,
                                                             intervalNamed(*request_.every)->length);
         if (!collection) return collection.error();
         if (request_.emptyBuckets)
@@ -146,13 +186,27 @@ class TypeStatistics {
     }
 
  private:
+    /// Of a quantity.
+    bool has(const std::string& column) const {
+        return type_->isQuantityType() && makesSense(*type_, *statisticNamed(column), request_.hasOptions);
+    }
+
+    VSResult<VSUnit> unitFromString(const std::string& text) const {
+        if (type_->isQuantityType()) return type_->unitFromString(text);
+        auto unit = VSUnit::parse(text);
+        if (!unit || unit->isCompatibleWith(*unit_)) return unit;
+        return usage(text + " is not a unit of time, in which the durations of " +
+                     std::string(type_->name()) + " are told");
+    }
+
     /// The first of the units asked for that fits the type, else the type's own.
     VSStatus findUnit() {
-        if (!type_->isQuantityType()) return {};
-        unit_ = type_->canonicalUnit();
+        if (!type_->isQuantityType() && (request_.hasOptions || !hasDurations(*type_))) return {};
+        unit_ = type_->isQuantityType() ? type_->canonicalUnit() : VSUnit::minuteUnit();
+        if (request_.explain && !type_->isQuantityType()) unit_.reset();
         std::string problem;
         for (const std::string& text : request_.units) {
-            const auto unit = type_->unitFromString(text);
+            const auto unit = unitFromString(text);
             if (unit) {
                 unit_ = *unit;
                 return {};
@@ -168,55 +222,69 @@ class TypeStatistics {
                          : std::string();
     }
 
-    void writeRow(VSDate start, VSDate end, std::string_view source, int64_t count,
-                  const std::vector<std::string>& values) {
+    /// What stands between the source and the unit.
+    struct Fields {
+        std::string value;
+        int64_t count = 0;
+        std::vector<std::string> statistics;
+        std::string duration;
+    };
+    void writeRow(VSDate start, VSDate end, std::string_view source, const Fields& given) {
+        const bool durations = showsDurations(request_, request_.manyTypes ? nullptr : type_);
         std::vector<std::string> fields;
         if (request_.manyTypes) fields.emplace_back(type_->name());
         fields.insert(fields.end(), {output_.date(start), output_.date(end)});
         if (request_.bySource) fields.emplace_back(source);
-        fields.push_back(std::to_string(count));
-        fields.insert(fields.end(), values.begin(), values.end());
+        if (durations) fields.push_back(given.value);
+        fields.push_back(std::to_string(given.count));
+        fields.insert(fields.end(), given.statistics.begin(), given.statistics.end());
+        fields.resize(fields.size() + request_.columns.size() - given.statistics.size());
+        if (durations) fields.push_back(given.duration);
         fields.push_back(unit_ ? unit_->unitString() : "");
         output_.row(fields);
     }
 
     void writeRows(const VSStatistics& statistics) {
-        std::vector<std::string> values;
+        Fields fields{{}, statistics.count, {}, {}};
         for (const std::string& column : request_.columns)
-            values.push_back(value(statistics.*statisticNamed(column)->merged));
-        writeRow(statistics.startDate, statistics.endDate, "", statistics.count, values);
+            fields.statistics.push_back(has(column) ? value(statistics.*statisticNamed(column)->merged) : "");
+        writeRow(statistics.startDate, statistics.endDate, "", fields);
         if (!request_.bySource) return;
         for (const auto& [source, ofSource] : statistics.bySource) {
-            values.clear();
+            fields = {{}, ofSource.count, {}, {}};
             for (const std::string& column : request_.columns)
-                values.push_back(value(ofSource.*statisticNamed(column)->ofSource));
-            writeRow(statistics.startDate, statistics.endDate, source.name, ofSource.count, values);
+                fields.statistics.push_back(has(column) ? value(ofSource.*statisticNamed(column)->ofSource)
+                                                        : "");
+            writeRow(statistics.startDate, statistics.endDate, source.name, fields);
         }
     }
 
-    /// Records without a quantity can only be counted, by the interval that they start in.
-    VSStatus writeCounts() {
+    /// Records without a quantity: their number, by the interval that they start in, and the time they take.
+    VSStatus writeDurations() {
         std::vector<VSDate> boundaries{from_, to_};
         if (request_.every)
             boundaries =
                 calendar_.bucketBoundaries(beginning_, intervalNamed(*request_.every)->length, from_, to_);
         const auto samples =
-            store_.samples(type_, VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionStrictStartDate),
+            store_.samples(type_, VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionNone),
                            VSObjectQueryNoLimit, {{VSSampleSortIdentifierStartDate, true}});
         if (!samples) return samples.error();
-        auto next = samples->begin();
-        for (size_t i = 0; i + 1 < boundaries.size(); ++i) {
-            std::map<std::string, int64_t> bySource;
-            int64_t count = 0;
-            for (; next != samples->end() && (*next)->startDate() < boundaries[i + 1]; ++next, ++count) {
-                ++bySource[(*next)->sourceRevision().source.name];
+        // Where durations are not told, values and what reaches in from before are not told apart either.
+        const bool byValue = unit_.has_value();
+        QVDurationStatistics statistics(std::move(boundaries), from_, to_, byValue);
+        for (const VSSamplePtr& sample : *samples) statistics.add(*sample);
+        for (size_t interval = 0; interval < statistics.count(); ++interval) {
+            const auto& tallies = statistics.tallies(interval);
+            if (tallies.empty() && request_.emptyBuckets)
+                writeRow(statistics.start(interval), statistics.end(interval), "", {});
+            for (const auto& [key, tally] : tallies) {
+                const auto& [value, source] = key;
+                if (!source.empty() && !request_.bySource) continue;
+                const auto duration =
+                    unit_ ? VSUnit::secondUnit().convert(tally.seconds, *unit_) : std::nullopt;
+                writeRow(statistics.start(interval), statistics.end(interval), source,
+                         {value, tally.count, {}, QVTabOutput::number(duration)});
             }
-            if (count == 0 && !request_.emptyBuckets) continue;
-            const std::vector<std::string> none(request_.columns.size());
-            writeRow(boundaries[i], boundaries[i + 1], "", count, none);
-            if (!request_.bySource) continue;
-            for (const auto& [source, ofSource] : bySource)
-                writeRow(boundaries[i], boundaries[i + 1], source, ofSource, none);
         }
         return {};
     }
@@ -226,8 +294,8 @@ class TypeStatistics {
         std::vector<std::pair<VSDate, VSDate>> intervals{{from_, to_}};
         if (request_.every) {
             const auto collection = store_.statisticsCollection(
-                type_, VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionNone), request_.options,
-                beginning_, intervalNamed(*request_.every)->length);
+                type_, VSPredicate::samplesWithStartDate(from_, to_, VSQueryOptionNone), options_, beginning_,
+                intervalNamed(*request_.every)->length);
             if (!collection) return collection.error();
             intervals.clear();
             for (const VSStatistics& one : (*collection)->statistics())
@@ -236,7 +304,7 @@ class TypeStatistics {
         for (const auto& [start, end] : intervals) {
             const auto inside = VSPredicate::samplesWithStartDate(std::max(start, from_), std::min(end, to_),
                                                                   VSQueryOptionNone);
-            const auto explanation = store_.explainStatistics(type_, inside, request_.options);
+            const auto explanation = store_.explainStatistics(type_, inside, options_);
             if (!explanation) return explanation.error();
             for (const auto& contribution : explanation->contributions)
                 writeContribution(start, end, contribution);
@@ -280,10 +348,11 @@ class TypeStatistics {
     QVTabOutput& output_;
     const VSCalendar calendar_ = VSCalendar::current();
     VSDate from_, to_, beginning_;
+    int options_ = 0;
     std::optional<VSUnit> unit_;
 };
 
-void writeHeader(const Request& request, QVTabOutput& output) {
+void writeHeader(const Request& request, const VSObjectType* only, QVTabOutput& output) {
     std::vector<std::string> header;
     if (request.manyTypes) header.emplace_back("type");
     header.insert(header.end(), {"start", "end"});
@@ -295,8 +364,10 @@ void writeHeader(const Request& request, QVTabOutput& output) {
         return;
     }
     if (request.bySource) header.emplace_back("source");
+    if (showsDurations(request, only)) header.emplace_back("value");
     header.emplace_back("count");
     header.insert(header.end(), request.columns.begin(), request.columns.end());
+    if (showsDurations(request, only)) header.emplace_back("duration");
     header.emplace_back("unit");
     output.row(header);
 }
@@ -312,24 +383,36 @@ VSResult<std::vector<VSHealthStore::TypeSummary>> summariesOf(VSHealthStore& sto
     return summaries;
 }
 
+/// What was asked for may be another thing than what was meant.
+void explainColumns(const Request& request, const VSObjectType* only) {
+    const bool ofRecords = std::any_of(request.columns.begin(), request.columns.end(),
+                                       [](const std::string& column) { return column != "sum"; });
+    if (request.hasOptions && ofRecords && only && only->isCumulative())
+        QVPrintError("average, minimum and maximum of " + std::string(only->name()) +
+                     " are over its single records, however long each is; a day's amount is its sum with "
+                     "--every day");
+}
+
 QVExitStatus run(const QVCommandContext& context) {
     const auto& words = context.arguments.words();
     if (words.size() != 1) return QVFailUsage("statistics", "statistics needs one type, or the word all");
-    auto request = readRequest(context.arguments);
-    if (!request) return QVFailUsage("statistics", request.error().message);
     const VSObjectType* only = nullptr;
-    request->manyTypes = words[0] == "all";
-    if (!request->manyTypes) {
+    if (words[0] != "all") {
         const auto type = QVTypeForArgument(words[0]);
         if (!type) return QVFail(type.error());
         only = *type;
     }
+    auto request = readRequest(context.arguments, only);
+    if (!request) return QVFailUsage("statistics", request.error().message);
+    request->manyTypes = !only;
     auto store = QVOpenStoreForReading(context.storeFolder);
     if (!store) return QVFail(store.error());
     const auto summaries = summariesOf(**store, only);
     if (!summaries) return QVFail(summaries.error());
+    if (only && summaries->empty()) QVSayNoRecords(*only);
     QVTabOutput output;
-    writeHeader(*request, output);
+    explainColumns(*request, only);
+    writeHeader(*request, only, output);
     for (const auto& summary : *summaries) {
         if (const VSStatus status = TypeStatistics(**store, *request, summary, output).write(); !status)
             return QVFail(status.error());
@@ -349,19 +432,22 @@ const QVCommand QVStatisticsCommand{
     R"(Usage: qelvar statistics TYPE|all [--from D] [--to D] [--every hour|day|week|month|year]
                          [--options sum,average,minimum,maximum] [--by-source] [--unit U]... [--empty] [--explain]
 
-Average, minimum and maximum are over the records that start in the interval; a sum takes of each record the part
-that lies in the interval, in proportion to time. Records without a quantity (sleep, workouts ...) are counted only.
-Intervals follow the calendar of the time zone (TZ); weeks begin as in the locale (LANG).
+Each kind of record gets what makes sense of it: what adds up (steps) its sum; what is measured (heart rate) average,
+minimum and maximum; categories (sleep) and workouts, by value, how many they are and how long they take. Average,
+minimum, maximum and count are over the records that start in the interval; a sum or a duration takes of each record
+the part that lies in the interval, in proportion to time, and no moment twice. Intervals follow the calendar of the time zone (TZ); weeks begin as in the locale (LANG).
 
-Standard output: type (with `all`), start, end, source (with --by-source), count, the statistics asked for, unit; a row
-for each interval that has a value. A statistic of nothing is an empty field.
+Standard output: type (with `all`), start, end, source (with --by-source), value (of categories and workouts), count,
+the statistics, duration (of categories and workouts), unit; a row for each interval that has records. A statistic of
+nothing, and one that says nothing of its type, is an empty field.
 
   --from D, --to D   the range, from D up to but not including D (2020-03-01, 2020-03-01T12:00, 2020-03-01T12:00+01:00);
                      by default that of the records. Nothing outside of it counts, in the first interval neither
   --every INTERVAL   by default one row for the range as a whole
-  --options LIST     by default all four
+  --options LIST     these statistics and no others; refused where the type has none such (a sum of heart rates). With
+                     `all`, by default all of them, each where it makes sense
   --by-source        after each row, which counts no moment from two sources, a row for each source alone
-  --unit U           by default the unit of the store; may be given several times, the first that fits the type is used
+  --unit U           by default the unit of the store, and minutes for durations; may be given several times, the first that fits the type is used
   --empty            rows for intervals without a value too
   --explain          instead of the statistics, the records that they come from: of each interval with a value the
                      records that lie in it. `value` is a record's own, `in_interval` the share of it that lies in the

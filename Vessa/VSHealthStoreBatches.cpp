@@ -1,6 +1,7 @@
 #include "Vessa/VSHealthStoreConnection.h"
 #include "Vessa/VSImportTransaction.h"
 #include "Vessa/VSStoreBatches.h"
+#include "Vessa/VSStoreHolder.h"
 
 VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> VSHealthStoreConnection::beginImport(
     const std::string& name, VSDuration patience, const std::atomic<bool>* giveUp) {
@@ -16,7 +17,8 @@ VSResult<std::vector<VSBatch>> VSHealthStoreConnection::batches() {
 VSResult<VSUndoReport> VSHealthStoreConnection::undoBatch(int64_t batch) {
     if (auto objection = core_->access.objectionToManaging()) return *objection;
     VSUndoReport report;
-    const VSStatus status = core_->writeAndWait([&report, batch](VSStoreWriter& writer) {
+    const VSStatus status = core_->writeAndWait([&report, batch, folder = core_->folder](VSStoreWriter& writer) {
+        const VSHolderNote note(folder, VSStoreHolder::Work::Undo, std::to_string(batch));
         auto undone = VSUndoBatch(writer, batch);
         if (!undone) return VSStatus(undone.error());
         report = *undone;

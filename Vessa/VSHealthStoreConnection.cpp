@@ -5,6 +5,7 @@
 
 #include "Vessa/Base/VSEnvironment.h"
 #include "Vessa/VSStoreCheck.h"
+#include "Vessa/VSStoreHolder.h"
 #include "Vessa/VSStoreSchema.h"
 
 namespace {
@@ -110,10 +111,11 @@ void VSHealthStoreConnection::deleteAllSamples(std::vector<const VSObjectType*> 
                                                std::optional<std::string> sourceBundleIdentifier,
                                                Completion completion) {
     core_->write(
-        [&access = core_->access, types = std::move(types),
-         source = std::move(sourceBundleIdentifier)](VSStoreWriter& writer) {
+        [&access = core_->access, types = std::move(types), source = std::move(sourceBundleIdentifier),
+         folder = core_->folder](VSStoreWriter& writer) {
             if (auto objection = access.objectionToChanging({"", source.value_or("")}))
                 return VSStatus(*objection);
+            const VSHolderNote note(folder, VSStoreHolder::Work::Deletion, "");
             for (const VSObjectType* type : types) writer.removeAll(type, source);
             return VSStatus();
         },

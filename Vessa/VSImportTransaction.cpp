@@ -65,6 +65,7 @@ VSImportTransaction::VSImportTransaction(std::shared_ptr<VSStoreCore> core,
       hasNewTopLevel_(typeCodes),
       hasNewMembers_(typeCodes) {
     database_->setGiveUp(nullptr);
+    note_.emplace(core_->folder, VSStoreHolder::Work::Import, name_);
     writer_.begin();
     lastBefore_ = writer_.lastNumber();
     auto types = database_->use("SELECT DISTINCT type FROM type_sources");
@@ -200,6 +201,7 @@ VSStatus VSImportTransaction::commit() {
                                characteristics_};
         if (!batch.isEmpty()) VSWriteBatch(*database_, batch);
         writer_.finish();
+        note_.reset();
         transaction_->commit();
         transaction_.reset();
     } catch (const VSDatabaseFailure& failure) {

@@ -7,6 +7,7 @@
 #include "Vessa/VSHealthStore.h"
 #include "Vessa/VSStoreBatches.h"
 #include "Vessa/VSStoreCore.h"
+#include "Vessa/VSStoreHolder.h"
 
 /// An import into a store, on a writing connection of its own. Used by one thread.
 class VSImportTransaction final : public VSHealthStore::ImportTransaction {
@@ -59,5 +60,6 @@ class VSImportTransaction final : public VSHealthStore::ImportTransaction {
     int64_t added_ = 0;
     std::map<int, VSBatchCharacteristic> characteristics_;  // by type code
     bool changedCharacteristics_ = false;
-    std::optional<VSError> failure_;  // after the first one nothing goes on
+    std::optional<VSError> failure_;    // after the first one nothing goes on
+    std::optional<VSHolderNote> note_;  // last: it goes before the transaction
 };

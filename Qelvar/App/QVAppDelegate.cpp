@@ -53,12 +53,14 @@ void QVAppDelegate::willFinishLaunching() {
     controllerManager_ = std::make_shared<QVControllerManager>(healthStore_, &QVDemoDataHead);
     importController_ = std::make_unique<QVImportController>(healthStore_);
     exportController_ = std::make_unique<QVExportController>(controllerManager_);
+    quitController_ = std::make_unique<QVQuitController>(
+        std::vector<QVTransferController*>{importController_.get(), exportController_.get()});
 
     std::vector<QVTabBarController::Tab> tabs;
     tabs.push_back(
         {"DASHBOARD", QStringLiteral("dashboard"), QStringLiteral("dashboard_selected"), dashboardStack()});
     tabs.push_back({"HEALTH_DATA", QStringLiteral("healthdata"), QStringLiteral("healthdata_selected"),
-                    healthDataStack()});
+                    healthDataStack(), true});
     tabs.push_back(
         {"SOURCES", QStringLiteral("sources"), QStringLiteral("sources_selected"), sourcesStack()});
     if (medicalIDIsSupported_) {

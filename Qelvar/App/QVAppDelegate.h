@@ -10,6 +10,7 @@
 #include "Qelvar/App/QVDemoData.h"
 #include "Qelvar/App/QVExportController.h"
 #include "Qelvar/App/QVImportController.h"
+#include "Qelvar/App/QVQuitController.h"
 #include "Qelvar/App/QVTabBarController.h"
 #include "Qelvar/Controllers/QVControllerManager.h"
 #include "Qelvar/Dashboard/QVDashboardViewController.h"
@@ -22,6 +23,7 @@ class QVAppDelegate : public QObject {
     Q_PROPERTY(QVTabBarController* tabBarController READ tabBarController CONSTANT)
     Q_PROPERTY(QVImportController* importController READ importController CONSTANT)
     Q_PROPERTY(QVExportController* exportController READ exportController CONSTANT)
+    Q_PROPERTY(QVQuitController* quitController READ quitController CONSTANT)
     Q_PROPERTY(QColor keyColor READ keyColor CONSTANT)
     Q_PROPERTY(bool rightToLeft READ isRightToLeft NOTIFY localeChanged)
     Q_PROPERTY(QString tabBarName READ tabBarName NOTIFY localeChanged)
@@ -56,6 +58,7 @@ class QVAppDelegate : public QObject {
     QVTabBarController* tabBarController() const { return tabBarController_.get(); }
     QVImportController* importController() const { return importController_.get(); }
     QVExportController* exportController() const { return exportController_.get(); }
+    QVQuitController* quitController() const { return quitController_.get(); }
     QColor keyColor() const;
     bool isRightToLeft() const;
     /// What a screen reader calls the row of tabs.
@@ -83,6 +86,7 @@ class QVAppDelegate : public QObject {
     bool loadingDemoData_ = false;
     std::unique_ptr<QVImportController> importController_;
     std::unique_ptr<QVExportController> exportController_;
+    std::unique_ptr<QVQuitController> quitController_;
     std::unique_ptr<QVTabBarController> tabBarController_;
     QVDashboardViewController* dashboard_ = nullptr;                 // in the first tab's stack
     platform::NavigationStack* medicalIDNavigationStack_ = nullptr;  // null: there is no such tab

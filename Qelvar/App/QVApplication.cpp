@@ -25,6 +25,7 @@
 #include "Qelvar/App/QVTerminationSignals.h"
 #include "Qelvar/App/QVWindow.h"
 #include "Qelvar/DataProviders/QVUserDefaults.h"
+#include "Vessa/VSStoreHolder.h"
 
 namespace {
 
@@ -94,6 +95,7 @@ VSResult<std::shared_ptr<VSHealthStore>> openWaiting(const std::filesystem::path
 /// The store of the folder; an error names the place.
 VSResult<std::shared_ptr<VSHealthStore>> openStore(const std::filesystem::path& folder,
                                                    const QVApplicationOptions& options) {
+    VSStoreHolder::setProgram(VSStoreHolder::Program::Window);
     std::error_code error;
     const std::filesystem::path parent = std::filesystem::absolute(folder).parent_path();
     std::filesystem::create_directories(parent, error);

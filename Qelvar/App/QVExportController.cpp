@@ -116,7 +116,7 @@ QString QVExportController::message() const {
         case State::Verifying:
             return localized("EXPORT_PROMPT");
         case State::Preparing:
-            return localized("EXPORT_PREPARING_MESSAGE") + QLatin1Char('\n') + progressText();
+            return localized("EXPORT_PREPARING_MESSAGE") + QLatin1Char('\n') + stepText();
         case State::Sharing:
             return sharingText();
         case State::Saving:
@@ -130,7 +130,7 @@ QString QVExportController::message() const {
     }
 }
 
-QString QVExportController::progressText() const {
+QString QVExportController::stepText() const {
     const QVExportProgress progress = manager_->progress();
     if (progress.bytesTotal > 0)
         return localized("EXPORT_PROGRESS_PACKING",
@@ -168,12 +168,12 @@ QString QVExportController::suggestedName() const {
 std::vector<QVExportController::Button> QVExportController::buttons() {
     switch (state_) {
         case State::Verifying:
-            return {{"EXPORT_YES", [this] { startExport(); }}, {"CANCEL", [this] { leave(); }}};
+            return {{"EXPORT_YES", [this] { startExport(); }}, {"CANCEL", [this] { close(); }}};
         case State::Preparing:
         case State::Saving:
-            return {{"CANCEL", [this] { leave(); }}};
+            return {{"TRANSFER_PUT_ASIDE", [this] { putAside(); }}, {"CANCEL", [this] { cancel(); }}};
         case State::Failed:
-            return {{"OK", [this] { leave(); }}};
+            return {{"OK", [this] { close(); }}};
         case State::Sharing:
             break;
         default:
@@ -193,7 +193,7 @@ std::vector<QVExportController::Button> QVExportController::buttons() {
                                    source_->itemForActivityType(QVExportSource::Activity::ShowInFolder)));
                            }});
     }
-    buttons.push_back({"DONE", [this] { leave(); }});
+    buttons.push_back({"DONE", [this] { close(); }});
     return buttons;
 }
 
@@ -207,7 +207,9 @@ QStringList QVExportController::buttonTitles() const {
 // --- What happens ---------------------------------------------------------------------------------------
 
 void QVExportController::verifyExport() {
-    if (state_ == State::Idle) setState(State::Verifying);
+    if (state_ != State::Idle) return show();
+    forgetAside();
+    setState(State::Verifying);
 }
 
 void QVExportController::pressButton(int index) {
@@ -216,18 +218,20 @@ void QVExportController::pressButton(int index) {
 }
 
 void QVExportController::leave() {
-    switch (state_) {
-        case State::Preparing:
-            return cancelExport();
-        case State::Saving:
-            *cancelSaving_ = true;
-            return;
-        case State::Idle:
-        case State::Canceling:
-            return;
-        default:
-            return cleanUpExport();
-    }
+    const bool wouldBeLost = state_ == State::Sharing && !savedFile_;
+    if (isWorking() || state_ == State::Canceling || wouldBeLost)
+        putAside();
+    else
+        close();
+}
+
+void QVExportController::cancel() {
+    if (state_ == State::Preparing) cancelExport();
+    if (state_ == State::Saving) *cancelSaving_ = true;
+}
+
+void QVExportController::close() {
+    if (state_ != State::Idle) cleanUpExport();
 }
 
 void QVExportController::startExport() {
@@ -295,7 +299,7 @@ void QVExportController::saved(const fs::path& target, const VSStatus& status) {
     else if (status.error().code != VSErrorCode::Cancelled)
         error_ = status.error();
     setState(State::Sharing);
-    platform::announce(message());
+    platform::announce(isAside() ? title() + QLatin1Char('\n') + message() : message());
 }
 
 void QVExportController::cleanUpExport() {

@@ -1,8 +1,5 @@
 #pragma once
 
-#include <QObject>
-#include <QString>
-#include <QStringList>
 #include <QTimer>
 #include <QUrl>
 #include <atomic>
@@ -14,19 +11,16 @@
 #include "Platform/Queue.h"
 #include "Platform/ShareServices.h"
 #include "Qelvar/App/QVExportSource.h"
+#include "Qelvar/App/QVTransferController.h"
 #include "Qelvar/Controllers/QVControllerManager.h"
 #include "Qelvar/Export/QVExportManager.h"
 
 /// The export while the window is open: asks whether to, tells how far it is, lets the user cancel it, offers
 /// what can be done with the archive, and removes it afterwards. The sheet QVExportSheet.qml shows it: a
 /// title, a message, progress and buttons. Main thread only.
-class QVExportController : public QObject {
+class QVExportController : public QVTransferController {
     Q_OBJECT
     Q_PROPERTY(State state READ state NOTIFY changed)
-    Q_PROPERTY(QString title READ title NOTIFY changed)
-    Q_PROPERTY(QString message READ message NOTIFY changed)
-    Q_PROPERTY(double fraction READ fraction NOTIFY changed)
-    Q_PROPERTY(QStringList buttonTitles READ buttonTitles NOTIFY buttonsChanged)
     Q_PROPERTY(QString saveTitle READ saveTitle NOTIFY changed)
     Q_PROPERTY(QString suggestedName READ suggestedName NOTIFY changed)
  public:
@@ -39,28 +33,27 @@ class QVExportController : public QObject {
     ~QVExportController() override;
 
     State state() const { return state_; }
-    QString title() const;
-    QString message() const;
-    /// How far the work is, 0 to 1; -1: there is none.
-    double fraction() const;
-    QStringList buttonTitles() const;
+    bool isWorking() const override { return state_ == State::Preparing || state_ == State::Saving; }
+    QString title() const override;
+    QString message() const override;
+    double fraction() const override;
+    QStringList buttonTitles() const override;
     /// Those of the application's own dialog for saving.
     QString saveTitle() const;
     QString suggestedName() const;
     const QVExportManager& exportManager() const { return *manager_; }
 
-    /// Asks whether to export; nothing while an export is shown already.
+    /// Asks whether to export; while there is an export shows that.
     Q_INVOKABLE void verifyExport();
-    Q_INVOKABLE void pressButton(int index);
-    /// The user leaves without a choice (Escape, Back): cancels what runs, closes what is done.
-    Q_INVOKABLE void leave();
+    Q_INVOKABLE void pressButton(int index) override;
+    /// An archive that was not saved is put aside too.
+    Q_INVOKABLE void leave() override;
+    Q_INVOKABLE void cancel() override;
     /// What the application's own dialog for saving asks and answers.
     Q_INVOKABLE static bool fileExists(const QUrl& folder, const QString& name);
     Q_INVOKABLE void saveIn(const QUrl& folder, const QString& name);
 
  signals:
-    void changed();
-    void buttonsChanged();
     /// The desktop has no dialog for saving: the application shows its own.
     void saveDialogRequested();
 
@@ -70,16 +63,18 @@ class QVExportController : public QObject {
         std::function<void()> press;
     };
     std::vector<Button> buttons();
+    bool isThere() const override { return state_ != State::Idle; }
     QVExportUnits preferredUnits() const;
     void setState(State state);
     void startExport();
     void cancelExport();
+    void close();
     void ended(const VSResult<std::filesystem::path>& archive);
     void chooseSaveFile();
     void save(const std::filesystem::path& target);
     void saved(const std::filesystem::path& target, const VSStatus& status);
     void cleanUpExport();
-    QString progressText() const;
+    QString stepText() const;
     QString sharingText() const;
     /// The block, on the main queue, if this is still there.
     void onMain(std::function<void()> block) const;

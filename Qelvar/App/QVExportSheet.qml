@@ -1,14 +1,13 @@
 import QtQuick
 import Qelvar.Items
 
-// The question whether to export, its progress, what can be done with the archive.
+// A question of the application, progress, what can be done with a result: a title, a message and buttons.
 SystemSheet {
     id: sheet
     property var controller: null
-    objectName: "exportSheet"
     title: controller.title
     implicitHeight: body.implicitHeight + 2
-    visible: controller.state !== QVExportController.Idle
+    visible: controller.isShown
     onOpened: focusFirst()
 
     // The keyboard is on the first button of whatever is shown.
@@ -79,7 +78,7 @@ SystemSheet {
                     radius: 2
                     color: SystemStyle.emphasis
                     Accessible.role: Accessible.ProgressBar
-                    Accessible.name: sheet.controller.title
+                    Accessible.name: sheet.controller.statusText
                     Accessible.description: sheet.controller.message
                     Rectangle {
                         anchors.left: parent.left

@@ -7,15 +7,27 @@ SystemSheet {
     objectName: "importSheet"
     property var controller: null
     readonly property bool running: controller.state === QVImportController.Running || controller.state === QVImportController.Cancelling
+    // The keyboard is on the first button of whatever is shown.
+    function focusFirst() {
+        const first = buttons.itemAt(0)
+        if (first) first.forceActiveFocus()
+        else keys.forceActiveFocus()
+    }
+    Connections {
+        target: sheet.controller
+        function onButtonsChanged() { if (sheet.opened) Qt.callLater(sheet.focusFirst) }
+    }
     title: controller.title
-    implicitHeight: body.implicitHeight + line.height + button.implicitHeight + 2
-    visible: controller.state !== QVImportController.Idle
-    onOpened: button.forceActiveFocus()
+    implicitHeight: body.implicitHeight + line.height + buttonColumn.height + 2
+    visible: controller.isShown
+    onOpened: focusFirst()
 
     FocusScope {
+        id: keys
         anchors.fill: parent
         focus: true
-        Keys.onEscapePressed: sheet.controller.pressButton()
+        Keys.onEscapePressed: sheet.controller.leave()
+        Keys.onBackPressed: sheet.controller.leave()
         Keys.onUpPressed: scroller.flick(0, 600)
         Keys.onDownPressed: scroller.flick(0, -600)
 
@@ -60,7 +72,7 @@ SystemSheet {
                     Accessible.name: text
                 }
                 Item { // progress
-                    visible: sheet.running
+                    visible: sheet.running && sheet.controller.fraction >= 0
                     width: parent.width
                     height: 28
                     Rectangle {
@@ -71,7 +83,7 @@ SystemSheet {
                         radius: 2
                         color: SystemStyle.emphasis
                         Accessible.role: Accessible.ProgressBar
-                        Accessible.name: sheet.controller.title
+                        Accessible.name: sheet.controller.statusText
                         Accessible.description: sheet.controller.message
                         Rectangle {
                             anchors.left: parent.left
@@ -124,7 +136,7 @@ SystemSheet {
                     clip: true
                     activeFocusOnTab: true
                     boundsBehavior: Flickable.StopAtBounds
-                    model: sheet.controller.refusals
+                    model: sheet.controller.details
                     Keys.onUpPressed: flick(0, 600)
                     Keys.onDownPressed: flick(0, -600)
                     Accessible.role: Accessible.List
@@ -148,18 +160,27 @@ SystemSheet {
         }
         Rectangle {
             id: line
-            anchors { left: parent.left; right: parent.right; bottom: button.top }
+            anchors { left: parent.left; right: parent.right; bottom: buttonColumn.top }
             height: SystemStyle.pixel
             color: SystemStyle.hairline
         }
-        SystemButton {
-            id: button
+        Column {
+            id: buttonColumn
             anchors { left: parent.left; right: parent.right; bottom: parent.bottom }
-            focus: true
-            emphasized: true
-            enabled: sheet.controller.state !== QVImportController.Cancelling
-            text: sheet.controller.buttonTitle
-            onClicked: sheet.controller.pressButton()
+            Repeater {
+                id: buttons
+                model: sheet.controller.buttonTitles
+                SystemButton {
+                    required property string modelData
+                    required property int index
+                    width: buttonColumn.width
+                    emphasized: index === 0
+                    text: modelData
+                    onClicked: sheet.controller.pressButton(index)
+                    Keys.onUpPressed: if (index > 0) buttons.itemAt(index - 1).forceActiveFocus()
+                    Keys.onDownPressed: if (index + 1 < buttons.count) buttons.itemAt(index + 1).forceActiveFocus()
+                }
+            }
         }
     }
 }

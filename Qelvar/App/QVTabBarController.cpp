@@ -38,6 +38,8 @@ QVariant QVTabBarController::data(const QModelIndex& index, int role) const {
             return tab.selectedImage;
         case StackRole:
             return QVariant::fromValue(tab.stack.get());
+        case ShowsTransfersRole:
+            return tab.showsTransfers;
         default:
             return {};
     }
@@ -47,7 +49,8 @@ QHash<int, QByteArray> QVTabBarController::roleNames() const {
     return {{TitleRole, "title"},
             {ImageRole, "image"},
             {SelectedImageRole, "selectedImage"},
-            {StackRole, "stack"}};
+            {StackRole, "stack"},
+            {ShowsTransfersRole, "showsTransfers"}};
 }
 
 void QVTabBarController::setSelectedIndex(int index) {

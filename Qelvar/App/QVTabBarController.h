@@ -15,11 +15,12 @@ class QVTabBarController : public QAbstractListModel {
     Q_PROPERTY(int selectedIndex READ selectedIndex NOTIFY selectedIndexChanged)
     Q_PROPERTY(platform::NavigationStack* selectedStack READ selectedStack NOTIFY selectedIndexChanged)
  public:
-    enum Role { TitleRole = Qt::UserRole + 1, ImageRole, SelectedImageRole, StackRole };
+    enum Role { TitleRole = Qt::UserRole + 1, ImageRole, SelectedImageRole, StackRole, ShowsTransfersRole };
     struct Tab {
         const char* titleKey;
         QString image, selectedImage;
         std::unique_ptr<platform::NavigationStack> stack;
+        bool showsTransfers = false;  // imports and exports are begun here, and told here
     };
     static QString restorationIdentifier() { return QStringLiteral("Tab Bar Controller"); }
 

@@ -11,6 +11,10 @@ FocusScope {
     readonly property bool busy: busyStacks > 0
     property int busyStacks: 0
     focus: true
+    function chooseFiles() { // one import at a time
+        if (app.importController.isWorking) app.importController.show()
+        else fileDialog.open()
+    }
     LayoutMirroring.enabled: app.rightToLeft
     LayoutMirroring.childrenInherit: true
 
@@ -24,7 +28,7 @@ FocusScope {
     Item {
         id: stacks
         anchors.fill: parent
-        anchors.bottomMargin: tabBar.height
+        anchors.bottomMargin: tabBar.height + transfers.height
         Repeater {
             id: repeater
             model: root.tabs
@@ -53,6 +57,14 @@ FocusScope {
         }
     }
 
+    Column { // work that was put aside
+        id: transfers
+        anchors.bottom: tabBar.top
+        width: parent.width
+        QVTransferRow { width: parent.width; controller: root.app.importController }
+        QVTransferRow { width: parent.width; controller: root.app.exportController }
+    }
+
     Rectangle {
         id: tabBar
         anchors.bottom: parent.bottom
@@ -72,7 +84,12 @@ FocusScope {
                     required property string title
                     required property string image
                     required property string selectedImage
+                    required property bool showsTransfers
                     readonly property bool selected: root.tabs.selectedIndex === index
+                    // The work put aside that was begun here.
+                    readonly property var transfer: !showsTransfers ? null
+                        : root.app.exportController.isAside ? root.app.exportController
+                        : root.app.importController.isAside ? root.app.importController : null
                     width: tabBar.width / root.tabs.rowCount()
                     height: tabBar.height
                     text: title
@@ -81,7 +98,9 @@ FocusScope {
                     Keys.onReturnPressed: tab.clicked()
                     Keys.onEnterPressed: tab.clicked()
                     Accessible.role: Accessible.PageTab
+                    Accessible.onPressAction: tab.clicked()
                     Accessible.name: title
+                    Accessible.description: transfer ? transfer.statusText : ""
                     Accessible.selectable: true
                     Accessible.selected: selected
                     contentItem: Item {
@@ -108,6 +127,22 @@ FocusScope {
                             elide: Text.ElideRight
                         }
                     }
+                    Rectangle { // under the icon
+                        anchors.horizontalCenter: parent.horizontalCenter
+                        y: 2
+                        width: 30
+                        height: 3
+                        radius: 1.5
+                        visible: tab.transfer !== null
+                        color: SystemStyle.emphasis
+                        Rectangle {
+                            anchors.left: parent.left
+                            height: parent.height
+                            radius: 1.5
+                            color: SystemStyle.tint
+                            width: parent.width * (tab.transfer ? Math.max(0, tab.transfer.fraction) : 0)
+                        }
+                    }
                     FocusRing { anchors.margins: 2; shown: tab.visualFocus }
                 }
             }
@@ -127,7 +162,7 @@ FocusScope {
     }
     Shortcut {
         sequences: [StandardKey.Open]
-        onActivated: fileDialog.open()
+        onActivated: root.chooseFiles()
     }
     Shortcut {
         sequences: [StandardKey.Quit]
@@ -167,7 +202,7 @@ FocusScope {
     }
     Connections {
         target: root.app
-        function onImportRequested() { fileDialog.open() }
+        function onImportRequested() { root.chooseFiles() }
     }
     Announcement {
         width: 1
@@ -177,12 +212,16 @@ FocusScope {
     }
     Loader { // the sheet of an import: made for the first one
         id: importSheet
-        readonly property bool needed: root.app.importController.state !== QVImportController.Idle
+        readonly property bool needed: root.app.importController.isShown
         onNeededChanged: if (needed && !item) setSource("QVImportSheet.qml", { controller: root.app.importController })
     }
     Loader { // the sheet of an export, likewise
-        readonly property bool needed: root.app.exportController.state !== QVExportController.Idle
-        onNeededChanged: if (needed && !item) setSource("QVExportSheet.qml", { controller: root.app.exportController })
+        readonly property bool needed: root.app.exportController.isShown
+        onNeededChanged: if (needed && !item) setSource("QVExportSheet.qml", { objectName: "exportSheet", controller: root.app.exportController })
+    }
+    Loader { // the question whether to give up what runs
+        readonly property bool needed: root.app.quitController.isShown
+        onNeededChanged: if (needed && !item) setSource("QVExportSheet.qml", { objectName: "quitSheet", controller: root.app.quitController })
     }
     Loader {
         id: saveDialog

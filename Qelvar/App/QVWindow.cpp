@@ -32,7 +32,15 @@ void registerTypes() {
 
 }  // namespace
 
-QVWindow::QVWindow(QVAppDelegate& app, QSize size) {
+bool QVWindow::event(QEvent* event) {
+    if (event->type() == QEvent::Close && !app_.quitController()->mayQuit()) {
+        event->ignore();
+        return true;
+    }
+    return QQuickView::event(event);
+}
+
+QVWindow::QVWindow(QVAppDelegate& app, QSize size) : app_(app) {
     registerTypes();
     setTitle(QStringLiteral("Qelvar"));
     setIcon(QGuiApplication::windowIcon());
@@ -42,6 +50,7 @@ QVWindow::QVWindow(QVAppDelegate& app, QSize size) {
     resize(size.isValid() ? size : kPhoneSize);
     setInitialProperties({{QStringLiteral("app"), QVariant::fromValue(&app)}});
     connect(&app, &QVAppDelegate::localeChanged, engine(), &QQmlEngine::retranslate);
+    connect(app.quitController(), &QVQuitController::quitRequested, qGuiApp, &QGuiApplication::quit);
     connect(engine(), &QQmlEngine::quit, qGuiApp, &QGuiApplication::quit);
     setSource(QUrl(QStringLiteral("qrc:/Qelvar/QVTabBarController.qml")));
 }

@@ -13,4 +13,11 @@ class QVWindow : public QQuickView {
     QVWindow(QVAppDelegate& app, QSize size);
     /// The screens could be loaded.
     bool isUsable() const { return rootObject() != nullptr; }
+
+ protected:
+    /// Long work under way is not given up without a question. (A signal ends the application without one.)
+    bool event(QEvent* event) override;
+
+ private:
+    QVAppDelegate& app_;
 };

@@ -15,6 +15,7 @@
 namespace {
 
 constexpr int kPollMilliseconds = 100;
+constexpr size_t kSniffedBytes = 1024;
 
 VSError systemError(const std::filesystem::path& path, int error) {
     const VSErrorCode code = error == ENOENT || error == ENOTDIR ? VSErrorCode::NotFound
@@ -67,16 +68,16 @@ class PlainFile final : public QVImportFile {
 };
 
 bool isArchiveMagic(std::string_view beginning) {
-    return beginning == std::string_view("PK\x03\x04", 4) || beginning == std::string_view("PK\x05\x06", 4);
+    return beginning.starts_with(std::string_view("PK\x03\x04", 4));
 }
 
-/// The first four bytes, fewer when the file is shorter.
+/// What tells what the file is; fewer bytes when it is shorter.
 VSResult<std::string> firstBytes(const QVImportFileDescriptor& file, const std::filesystem::path& path,
                                  const std::atomic<bool>* cancel) {
     std::string beginning;
-    while (beginning.size() < 4) {
-        char buffer[4];
-        const auto count = QVReadWaiting(file, path, buffer, 4 - beginning.size(), cancel);
+    char buffer[kSniffedBytes];
+    while (beginning.size() < kSniffedBytes) {
+        const auto count = QVReadWaiting(file, path, buffer, kSniffedBytes - beginning.size(), cancel);
         if (!count) return count.error();
         if (*count == 0) break;
         beginning.append(buffer, *count);
@@ -101,19 +102,21 @@ VSResult<size_t> QVReadWaiting(const QVImportFileDescriptor& file, const std::fi
 }
 
 VSResult<std::unique_ptr<QVImportFile>> QVImportFile::open(const std::filesystem::path& path,
-                                                           const std::atomic<bool>* cancel) {
+                                                           const std::atomic<bool>* cancel,
+                                                           QVRecognisedFile* recognised) {
     // Non-blocking, so that a pipe that nobody writes to can be given up; regular files do not care.
     QVImportFileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK));
     if (file.get() < 0) return systemError(path, errno);
     struct stat status {};
     if (fstat(file.get(), &status) != 0) return systemError(path, errno);
-    if (S_ISDIR(status.st_mode))
-        return VSError{VSErrorCode::Invalid,
-                       path.string() + ": is a folder, not a records document or archive"};
+    const std::string name = path.filename().string();
+    if (S_ISDIR(status.st_mode)) return QVUnfitFileError(path.string(), {QVFileKind::Folder, {}});
     const bool regular = S_ISREG(status.st_mode);
     auto beginning = firstBytes(file, path, cancel);
     if (!beginning) return beginning.error();
-    if (beginning->empty()) return VSError{VSErrorCode::Invalid, path.string() + ": is empty"};
+    const QVRecognisedFile looks = QVRecogniseBytes(*beginning);
+    if (recognised) *recognised = looks;
+    if (!looks.mayHoldRecords()) return QVUnfitFileError(name, looks);
     const uint64_t size = regular ? static_cast<uint64_t>(status.st_size) : 0;
     if (isArchiveMagic(*beginning)) {
         if (!regular)

@@ -7,16 +7,19 @@
 #include <string>
 #include <vector>
 
+#include "Qelvar/Import/QVFileKind.h"
 #include "Vessa/Base/VSError.h"
 
 /// A file to import as the documents in it: one of a plain file or a pipe, any number of an archive. Read
 /// forwards only, by one thread. Nothing is written to disk and no entry's name is ever used as a path.
 class QVImportFile {
  public:
-    /// NotFound; Refused: not readable; Invalid: a folder, an empty file, an archive that cannot be read.
-    /// `cancel` may be null and ends a wait for a pipe.
+    /// NotFound; Refused: not readable; Invalid: a folder, a file that by its first bytes is no document, an
+    /// archive that cannot be read. `cancel` may be null and ends a wait for a pipe; `recognised`, which may
+    /// be null, gets what the first bytes look like.
     static VSResult<std::unique_ptr<QVImportFile>> open(const std::filesystem::path& path,
-                                                        const std::atomic<bool>* cancel);
+                                                        const std::atomic<bool>* cancel,
+                                                        QVRecognisedFile* recognised = nullptr);
     virtual ~QVImportFile() = default;
 
     /// Moves to the next document that may be XML; false: there is none. What is passed over leaves a note.

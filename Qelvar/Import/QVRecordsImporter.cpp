@@ -14,6 +14,7 @@ namespace {
 using std::chrono::milliseconds;
 constexpr auto kProgressInterval = milliseconds(100);
 constexpr VSDuration kSilentPatience = milliseconds(500);  // for another writer, before it is told
+constexpr VSDuration kToldPatience = milliseconds(1000);   // before it is told again
 constexpr VSDuration kPopPatience = milliseconds(100);
 constexpr size_t kListedNotes = 100;
 constexpr auto kEarliestDate = VSDate(std::chrono::sys_days(std::chrono::year(1900) / 1 / 1));
@@ -81,8 +82,7 @@ class Reading {
         }
         for (const auto& text : file.notes()) note(text);
         if (documents == 0)
-            return VSError{VSErrorCode::Invalid,
-                           path.filename().string() + ": the archive holds no records document"};
+            return QVUnfitFileError(path.filename().string(), {QVFileKind::ArchiveWithoutRecords, {}});
         bytesDone_ = before + file.bytesTotal();
         return {};
     }
@@ -96,8 +96,7 @@ class Reading {
         if (*outcome == QVRecordsReader::Outcome::OtherDocument) {
             const std::string what = "its root element is " + reader.otherRoot() + " and not HealthData";
             if (!file.isArchive())
-                return VSError{VSErrorCode::Invalid,
-                               file.documentName() + ": not a records document: " + what};
+                return QVUnfitFileError(file.documentName(), {QVFileKind::OtherXML, reader.otherRoot()});
             builder_.abandonDocument();
             note(file.documentName() + ": " + what + "; passed over");
             return {};
@@ -223,10 +222,10 @@ class Progress {
         const auto now = std::chrono::steady_clock::now();
         if (!always && now - last_ < kProgressInterval) return;
         last_ = now;
-        options_.progress({bytesDone, total_, records, false});
+        options_.progress({bytesDone, total_, records, false, {}});
     }
-    void tellWaiting() const {
-        if (options_.progress) options_.progress({0, total_, 0, true});
+    void tellWaiting(std::optional<VSStoreHolder> holder) const {
+        if (options_.progress) options_.progress({0, total_, 0, true, std::move(holder)});
     }
 
  private:
@@ -242,11 +241,12 @@ VSResult<std::unique_ptr<VSHealthStore::ImportTransaction>> begin(VSHealthStore&
                                                                   const std::atomic<bool>* cancel,
                                                                   Progress& progress) {
     auto transaction = store.beginImport(name, kSilentPatience, cancel);
-    if (!transaction && transaction.error().isHeldByOthers && !isSet(cancel)) {
-        progress.tellWaiting();
-        transaction = store.beginImport(name, VSDuration::max(), cancel);
+    while (!transaction && transaction.error().isHeldByOthers && !isSet(cancel)) {
+        progress.tellWaiting(VSReadStoreHolder(store.folder()));
+        transaction = store.beginImport(name, kToldPatience, cancel);
     }
     if (isSet(cancel)) return cancelled();
+    progress.tell(0, 0, true);  // it does not wait any more
     return transaction;
 }
 

@@ -10,16 +10,19 @@
 #include "Qelvar/Import/QVImportReport.h"
 #include "Vessa/Base/VSError.h"
 #include "Vessa/VSHealthStore.h"
+#include "Vessa/VSStoreHolder.h"
 
 struct QVImportProgress {
-    uint64_t bytesDone = 0;   // of the files as they lie on disk
-    uint64_t bytesTotal = 0;  // 0: not known (a pipe)
-    int64_t records = 0;      // records handed to the store so far
-    bool isWaiting = false;   // for another program that writes to the store
+    uint64_t bytesDone = 0;               // of the files as they lie on disk
+    uint64_t bytesTotal = 0;              // 0: not known (a pipe)
+    int64_t records = 0;                  // records handed to the store so far
+    bool isWaiting = false;               // for another program that writes to the store
+    std::optional<VSStoreHolder> holder;  // while it waits: that program, where it is known
 };
 
 struct QVImportOptions {
-    /// Called on the importing thread, a few times a second at most and once at the end.
+    /// Called on the importing thread, a few times a second at most and once at the end; while it waits, each
+    /// second.
     std::function<void(const QVImportProgress&)> progress;
     /// Set by anyone (also a signal handler) to give up; may be null. REQUIRES: it outlives the import.
     const std::atomic<bool>* cancel = nullptr;

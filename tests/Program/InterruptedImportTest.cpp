@@ -8,6 +8,7 @@
 
 #include "RunProgram.h"
 #include "TestSupport.h"
+#include "Vessa/VSStoreHolder.h"
 
 namespace {
 
@@ -30,7 +31,9 @@ std::string records(int count) {
 }
 
 bool isWaiting(const std::string& line) {
-    return line.find("another program writes to the store") != std::string::npos;
+    return line.find(
+               "another program writes to the store (an import of pipe from the command line, process ") !=
+           std::string::npos;
 }
 
 /// An import into a store in use that reads a pipe, of which the other end is held here: it is in the midst
@@ -70,6 +73,7 @@ class ImportOfAPipe : public testing::Test {
 
     const test::TemporaryFolder folder_;
     const test::Program program_{folder_.path()};
+    const fs::path store_ = folder_.path() / "data" / "qelvar";
     const fs::path pipe_ = folder_.path() / "pipe";
     std::string types_;
     std::unique_ptr<test::RunningProgram> first_;
@@ -80,8 +84,10 @@ class InterruptedImport : public ImportOfAPipe, public testing::WithParamInterfa
 
 TEST_P(InterruptedImport, LeavesNoTrace) {
     const int signal = GetParam();
+    ASSERT_TRUE(VSReadStoreHolder(store_));
     first_->signal(signal);
     const auto outcome = first_->wait();
+    EXPECT_FALSE(VSReadStoreHolder(store_)) << "a note of the dead says nothing";
     if (signal == SIGKILL) {
         EXPECT_EQ(outcome.signal, SIGKILL);
     } else {
@@ -121,12 +127,16 @@ TEST_F(ImportOfAPipe, AnotherOneWaitsAndBothAreComplete) {
 TEST_F(ImportOfAPipe, OneThatWaitsEndsAtOnce) {
     test::RunningProgram second({"import", kData / "every-kind" / "input.xml"}, program_.environment());
     ASSERT_TRUE(second.waitForErrorLine(isWaiting));
+    test::RunningProgram undo({"undo", "1"}, program_.environment());
+    ASSERT_TRUE(undo.waitForErrorLine(isWaiting));
     second.signal(SIGINT);
     const auto outcome = second.wait();  // while the first one still holds the store
     EXPECT_EQ(outcome.status, 130);
     EXPECT_NE(outcome.errors.find("nothing of it is kept"), std::string::npos);
     EXPECT_EQ(finishFirst().status, 0);
-    EXPECT_EQ(test::rowsOf(program_.run({"batches"}).output).size(), 2U);
+    EXPECT_EQ(undo.wait().status, 0);
+    EXPECT_EQ(test::rowsOf(program_.run({"batches"}).output).size(), 1U);
+    EXPECT_EQ(test::contentOf(store_ / VSHolderNote::fileName), "") << "names of files are not kept";
 }
 
 }  // namespace

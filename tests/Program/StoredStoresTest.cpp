@@ -32,6 +32,9 @@ void compareRows(const std::string& expected, const std::string& actual) {
         for (const auto& [column, value] : wanted[row]) {
             const auto field = found[row].find(column);
             ASSERT_NE(field, found[row].end()) << column;
+            // They also added up what is only measured.
+            const auto* type = VSObjectType::typeForIdentifier(wanted[row].at("type"));
+            if (column == "sum" && type && !type->isCumulative() && field->second.empty()) continue;
             EXPECT_TRUE(sameField(value, field->second))
                 << "row " << row + 1 << " " << column << ": " << value << " and not " << field->second;
         }
@@ -52,7 +55,8 @@ void compareStore(const test::Program& program, const fs::path& store, const fs:
         SCOPED_TRACE(name);
         if (name == "statistics")
             compareRows(test::contentOf(entry.path()),
-                        ask({"statistics", "all", "--every", "day", "--by-source"}));
+                        ask({"statistics", "all", "--every", "day", "--by-source", "--options",
+                             "sum,average,minimum,maximum"}));
         else
             EXPECT_EQ(test::contentOf(entry.path()), ask({"samples", name}));
     }

@@ -68,13 +68,21 @@ TEST_F(ExportTest, OffersWhatTheDesktopCanDoAndCleansUp) {
     EXPECT_EQ(controller.state(), State::Preparing);
     controller.verifyExport();
     EXPECT_EQ(controller.state(), State::Preparing) << "one at a time";
+    controller.leave();
+    EXPECT_TRUE(controller.isAside() && controller.isWorking()) << "the window can be used meanwhile";
     QString progress;
     ASSERT_TRUE(test::waitUntil([&] {
         if (controller.fraction() > 0) progress = controller.message();
         return controller.state() == State::Sharing;
     }));
     EXPECT_TRUE(progress.contains("2,000 records") || progress.contains("MB")) << progress.toStdString();
+    EXPECT_TRUE(controller.isAside()) << "what is done does not get in the way";
+    controller.verifyExport();
+    EXPECT_TRUE(controller.isShown());
     EXPECT_EQ(controller.buttonTitles(), (QStringList{"Save As…", "Send by Mail…", "Open Folder", "Done"}));
+    controller.leave();
+    EXPECT_TRUE(controller.isAside()) << "an archive that was not saved is not thrown away by Escape";
+    controller.show();
     controller.pressButton(1);
     EXPECT_EQ(desktop.told, "mail Health data export.zip");
     controller.pressButton(0);
@@ -89,7 +97,7 @@ TEST_F(ExportTest, OffersWhatTheDesktopCanDoAndCleansUp) {
     EXPECT_TRUE(controller.message().startsWith("It could not be saved."));
     desktop.isRich = false;
     EXPECT_EQ(controller.buttonTitles(), (QStringList{"Save As…", "Done"}));
-    controller.leave();
+    controller.pressButton(1);
     EXPECT_EQ(controller.state(), State::Idle);
     EXPECT_TRUE(fs::is_empty(documents_));
 }
@@ -101,7 +109,7 @@ TEST_F(ExportTest, CancelledItSaysNothingMoreFailedItSaysSo) {
         QVExportController controller(std::make_shared<QVControllerManager>(store_), desktop);
         controller.verifyExport();
         controller.pressButton(0);
-        controller.pressButton(0);
+        controller.pressButton(1);
         EXPECT_EQ(controller.title(), "Canceling Export…");
         EXPECT_TRUE(controller.message().isEmpty() && controller.buttonTitles().isEmpty());
         ASSERT_TRUE(waitFor(controller, State::Idle));

@@ -6,11 +6,13 @@
 #include <fstream>
 
 #include "Platform/Localization.h"
+#include "Qelvar/App/QVQuitController.h"
 #include "QtTestSupport.h"
 #include "TestSupport.h"
 
 namespace {
 
+namespace fs = std::filesystem;
 using State = QVImportController::State;
 
 class ImportControllerTest : public testing::Test {
@@ -56,7 +58,7 @@ TEST_F(ImportControllerTest, SaysWhatItReadAddedHadAndRefused) {
     const auto file = document("records.xml", 50, 3);
     controller.importUrls({QUrl::fromLocalFile(QString::fromStdString(file.string()))});
     EXPECT_EQ(controller.state(), State::Running);
-    EXPECT_EQ(controller.buttonTitle(), "Cancel");
+    EXPECT_EQ(controller.buttonTitles(), (QStringList{"Continue in Background", "Cancel"}));
     ASSERT_TRUE(waitForEnd(controller));
     EXPECT_EQ(controller.title(), "Records Imported");
     EXPECT_EQ(controller.rowTitles(), (QStringList{"Records read", "Added", "Already here", "Refused"}));
@@ -66,7 +68,7 @@ TEST_F(ImportControllerTest, SaysWhatItReadAddedHadAndRefused) {
     EXPECT_EQ(controller.fraction(), 1);
     EXPECT_EQ(count(), 47u);
 
-    controller.pressButton();
+    controller.pressButton(0);
     EXPECT_EQ(controller.state(), State::Idle);
     EXPECT_TRUE(controller.rowTitles().isEmpty());
     controller.importFiles({file});
@@ -89,7 +91,7 @@ TEST_F(ImportControllerTest, ManyRefusalsAreCounted) {
 TEST_F(ImportControllerTest, CancelLeavesNoTrace) {
     QVImportController controller(store_);
     controller.importFiles({document("records.xml", 40'000)});
-    controller.pressButton();
+    controller.pressButton(1);
     EXPECT_EQ(controller.state(), State::Cancelling);
     controller.importFiles({document("other.xml", 1)});
     EXPECT_EQ(controller.state(), State::Cancelling) << "one at a time";
@@ -127,21 +129,56 @@ TEST_F(ImportControllerTest, AFileThatIsRefusedSaysWhy) {
     EXPECT_TRUE(controller.message().contains("broken.xml")) << controller.message().toStdString();
     controller.importFiles({folder_.path() / "missing.xml"});
     ASSERT_TRUE(waitForEnd(controller));
-    EXPECT_TRUE(controller.message().contains("missing.xml"));
+    EXPECT_TRUE(controller.fileLines().value(0).contains("missing.xml"));
     EXPECT_EQ(count(), 0u);
 }
 
-TEST_F(ImportControllerTest, OnlyDocumentsAndArchivesAreTaken) {
-    EXPECT_TRUE(QVImportController::acceptsUrl(QUrl("file:///home/me/Export.XML")));
-    EXPECT_TRUE(QVImportController::acceptsUrl(QUrl("file:///home/me/a%20b.zip")));
-    EXPECT_FALSE(QVImportController::acceptsUrl(QUrl("file:///home/me/picture.png")));
-    EXPECT_FALSE(QVImportController::acceptsUrl(QUrl("https://example.org/export.xml")));
+TEST_F(ImportControllerTest, EachFileThatWasDroppedIsMentioned) {
+    const auto table = folder_.path() / "table.xml";  // whatever it is called
+    std::ofstream(table) << "type,start,value\nHeartRate,2020-03-01,72\n";
+    const auto good = document("records.xml", 5);
+    const auto url = [](const fs::path& path) { return QUrl::fromLocalFile(QString::fromStdString(path)); };
     QVImportController controller(store_);
-    controller.importUrls({QUrl("file:///home/me/picture.png")});
-    EXPECT_EQ(controller.state(), State::Finished);
-    EXPECT_FALSE(controller.message().isEmpty());
-    controller.dismiss();
-    EXPECT_EQ(controller.state(), State::Idle);
+    controller.importUrls(
+        {url(good), url(table), url(folder_.path()), QUrl("https://example.org/export.xml")});
+    ASSERT_TRUE(waitForEnd(controller));
+    EXPECT_EQ(controller.title(), "Not All Files Were Imported");
+    EXPECT_EQ(count(), 5u);
+    const QString lines = controller.details().join('\n');
+    for (const char* line : {"records.xml: imported", "table.xml: not imported; it looks like a table (CSV)",
+                             "because it is a folder", "export.xml: not imported, because it is not on this"})
+        EXPECT_TRUE(lines.contains(line)) << lines.toStdString();
+    controller.importUrls({url(table)});
+    ASSERT_TRUE(waitForEnd(controller));
+    EXPECT_EQ(controller.title(), "Import Failed");
+    EXPECT_TRUE(controller.message().contains(".zip")) << "what was expected";
+    EXPECT_EQ(controller.details().size(), 1);
+}
+
+TEST_F(ImportControllerTest, ItSaysForWhomItWaitsAndCanBePutAsideAndCancelledMeanwhile) {
+    auto held = store_->beginImport("others.zip");
+    ASSERT_TRUE(held.ok());
+    QVImportController controller(store_);
+    QVQuitController quit({&controller});
+    EXPECT_TRUE(quit.mayQuit());
+    controller.importFiles({document("records.xml", 5)});
+    ASSERT_TRUE(test::waitUntil([&] { return controller.title() == "Waiting to Import"; }));
+    EXPECT_TRUE(controller.message().contains("others.zip")) << controller.message().toStdString();
+    EXPECT_EQ(controller.fraction(), -1);
+    controller.leave();
+    EXPECT_TRUE(controller.isAside() && !controller.isShown() && controller.isWorking());
+    EXPECT_FALSE(quit.mayQuit());
+    EXPECT_TRUE(quit.isShown());
+    controller.importUrls({QUrl("file:///late.xml")});
+    EXPECT_TRUE(controller.isShown() && controller.message().contains("late.xml"));
+    controller.cancel();
+    ASSERT_TRUE(waitForEnd(controller)) << "while the other still holds the store";
+    EXPECT_FALSE(quit.isShown()) << "nothing is left to give up";
+    controller.importFiles({document("records.xml", 5)});
+    ASSERT_TRUE(test::waitUntil([&] { return controller.title() == "Waiting to Import"; }));
+    *held = nullptr;
+    ASSERT_TRUE(waitForEnd(controller));
+    EXPECT_EQ(count(), 5u);
 }
 
 }  // namespace
