@@ -17,13 +17,14 @@ VSResult<std::vector<VSBatch>> VSHealthStoreConnection::batches() {
 VSResult<VSUndoReport> VSHealthStoreConnection::undoBatch(int64_t batch) {
     if (auto objection = core_->access.objectionToManaging()) return *objection;
     VSUndoReport report;
-    const VSStatus status = core_->writeAndWait([&report, batch, folder = core_->folder](VSStoreWriter& writer) {
-        const VSHolderNote note(folder, VSStoreHolder::Work::Undo, std::to_string(batch));
-        auto undone = VSUndoBatch(writer, batch);
-        if (!undone) return VSStatus(undone.error());
-        report = *undone;
-        return VSStatus();
-    });
+    const VSStatus status =
+        core_->writeAndWait([&report, batch, folder = core_->folder](VSStoreWriter& writer) {
+            const VSHolderNote note(folder, VSStoreHolder::Work::Undo, std::to_string(batch));
+            auto undone = VSUndoBatch(writer, batch);
+            if (!undone) return VSStatus(undone.error());
+            report = *undone;
+            return VSStatus();
+        });
     if (!status) return status.error();
     return report;
 }
