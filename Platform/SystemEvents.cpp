@@ -31,14 +31,12 @@ namespace {
 // What a significant change is a change of.
 struct LocalDay {
     std::string zone;
-    int year = 0, month = 0, day = 0;
+    VSDate start;
     friend bool operator==(const LocalDay&, const LocalDay&) = default;
 
     static LocalDay current() {
-        const VSDate now = VSEnvironment::current()->now();
         const VSCalendar calendar = VSCalendar::current();
-        return {calendar.timeZoneIdentifier(), calendar.component(VSCalendarUnit::Year, now),
-                calendar.component(VSCalendarUnit::Month, now), calendar.component(VSCalendarUnit::Day, now)};
+        return {calendar.timeZoneIdentifier(), calendar.startOfDay(VSEnvironment::current()->now())};
     }
 };
 
@@ -221,7 +219,7 @@ struct SystemEvents::Private {
 
     void watchFiles() {
         const QStringList watched = watcher->files() + watcher->directories();
-        for (const char* name : {"", "localtime", "locale.conf", "default", "default/locale"}) {
+        for (const char* name : {"", "localtime", "timezone", "locale.conf", "default", "default/locale"}) {
             const std::filesystem::path path = *name ? folder / name : folder;
             const QString text = QString::fromStdString(path.string());
             if (!watched.contains(text) && QFile::exists(text)) watcher->addPath(text);

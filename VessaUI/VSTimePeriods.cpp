@@ -136,7 +136,7 @@ VSTimeSpan spanOfSample(const VSSample& sample, VSDuration shift, const VSTimePe
     VSTimeSpan span{sample.startDate(), sample.endDate()};
     if (rules.nights && span.length() > aDay) {
         const VSDate day = VSStartOfNoonDay(span.start + shift, calendar);
-        span.end = calendar.addDays(day, 1) - shift;
+        span.end = VSEndOfNoonDay(day, calendar) - shift;
     }
     span.end = std::min(span.end, rules.now);
     return span;
@@ -191,14 +191,21 @@ VSDate VSStartOfNoonDay(VSDate date, const VSCalendar& calendar) {
     return date < noon ? calendar.yesterdayAtNoon(date) : noon;
 }
 
+VSDate VSEndOfNoonDay(VSDate date, const VSCalendar& calendar) {
+    return calendar.noonOfDay(midnightOfNoonDay(date, calendar));
+}
+
 VSDate VSStartOfNight(const VSSample& sample, const VSCalendar& calendar) {
     return sample.startDate() + RecordedHours(calendar).shift(sample);
 }
 
+VSDate VSLastMomentOfSpan(const VSTimeSpan& span, const VSCalendar& calendar) {
+    const bool endsADay = span.start < span.end && calendar.startOfDay(span.end) == span.end;
+    return endsADay ? std::max(span.start, span.end - std::chrono::seconds(1)) : span.end;
+}
+
 VSDate VSLastMomentOfSample(const VSSample& sample, const VSCalendar& calendar) {
-    const VSDate end = sample.endDate();
-    const bool endsADay = sample.startDate() < end && calendar.startOfDay(end) == end;
-    return endsADay ? end - std::chrono::seconds(1) : end;
+    return VSLastMomentOfSpan({sample.startDate(), sample.endDate()}, calendar);
 }
 
 bool VSContinuesSection(VSDate last, VSDate start, const VSCalendar& calendar) {

@@ -55,6 +55,8 @@ VSDate VSStartOfNight(const VSSample& sample, const VSCalendar& calendar);
 
 /// Noon of the day that the date lies in, or of the day before: the start of its noon-to-noon day.
 VSDate VSStartOfNoonDay(VSDate date, const VSCalendar& calendar);
+/// The start of the next.
+VSDate VSEndOfNoonDay(VSDate date, const VSCalendar& calendar);
 
 struct VSDurationInBucket {
     VSTimeSpan bucket;
@@ -71,8 +73,9 @@ std::vector<VSDurationInBucket> VSCalculateTotalDurations(const std::vector<VSTi
                                                           VSDate end, const VSDateComponents& interval,
                                                           bool noonDays, const VSCalendar& calendar);
 
-/// When what a sample tells was last so, for texts that name the day: its end, but where that is the midnight
-/// that ends its last day, the second before.
+/// When what a span or a sample tells was last so, for texts that name the day: its end, but where that is
+/// the midnight that ends its last day, the second before.
+VSDate VSLastMomentOfSpan(const VSTimeSpan& span, const VSCalendar& calendar);
 VSDate VSLastMomentOfSample(const VSSample& sample, const VSCalendar& calendar);
 
 /// The longest time that can lie between two moments of days that follow each other, of which one may have 25

@@ -169,7 +169,9 @@ QString VSUnitController::nameOfUnit(const VSDataUnit* dataUnit, const VSUnit& u
     if (!choice->nameHasPlural) return platform::localized(choice->nameKey);
     if (!value) return platform::localizedPlural(choice->nameKey, manyOfThem);
     // The form of the number as it is written: 0.996 steps read "1 step".
-    const double shown = roundedToDigits(*value, choice->precision);
+    double shown = roundedToDigits(*value, choice->precision);
+    // Less than a floor is written "<1 floor".
+    if (shown == 0 && *value > 0) shown = std::pow(10, -choice->precision);
     const bool whole = shown == std::floor(shown) && std::abs(shown) < 1e9;
     return platform::localizedPlural(choice->nameKey, whole ? static_cast<int>(shown) : manyOfThem);
 }

@@ -5,10 +5,11 @@
 
 std::optional<std::vector<QVAxisLabel>> QVHourAxisDescriptor::generateAxisLabels() const {
     VSDate middle = VSMidDate(*minValue(), *maxValue());
-    // A day that ends a moment before midnight, or that lost an hour, has its middle before noon, and a night
-    // of 23 hours before midnight: name noon and midnight all the same.
-    if (VSCalendar::current().component(VSCalendarUnit::Hour, middle) % 12 == 11)
-        middle = middle + std::chrono::hours(1);
+    // A day that ends a moment before midnight, or that lost or got an hour or two, has its middle beside
+    // noon, and such a night beside midnight: name noon and midnight all the same.
+    const int hour = VSCalendar::current().component(VSCalendarUnit::Hour, middle) % 12;
+    if (hour == 11) middle = middle + std::chrono::hours(1);
+    if (hour == 1) middle = middle - std::chrono::hours(1);
 
     const QVDateFormatter formatter = QVHourOfDayFormatter();
     std::vector<QVAxisLabel> labels;

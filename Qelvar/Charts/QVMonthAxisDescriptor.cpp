@@ -8,9 +8,13 @@
 std::optional<std::vector<QVAxisLabel>> QVMonthAxisDescriptor::generateAxisLabels() const {
     const VSCalendar calendar = VSCalendar::current();
     std::vector<VSDate> dates;
-    for (VSDate date = calendar.yesterdayAtNoon(*maxValue()); date > *minValue();
-         date = calendar.addDays(date, -dayOffset_))
-        dates.push_back(date);
+    const VSDate last = calendar.yesterdayAtNoon(*maxValue()), lastDay = calendar.startOfDay(last);
+    VSDate noon = last;
+    for (int days = dayOffset_; noon > *minValue(); days += dayOffset_) {
+        // A day that the zone left out is the one after it.
+        if (dates.empty() || noon < dates.back()) dates.push_back(noon);
+        noon = calendar.noonOfDay(calendar.addDays(lastDay, -days));
+    }
     std::reverse(dates.begin(), dates.end());
 
     const QVDateFormatter dayFormatter = QVDateFormatter::withPattern("d");

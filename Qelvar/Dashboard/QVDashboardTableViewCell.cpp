@@ -115,8 +115,8 @@ QVDashboardTableViewCell::QVDashboardTableViewCell(QQuickItem* parent)
     chart_.setDividerInset(kDividerInset);
     chartBackground_->setBoundFormatter([this](double value, const VSNumberFormatter& numberFormatter) {
         if (!chartItem_) return QString();
-        return qv_dashboardChartBoundStringFromValue(chartItem_->dataUnitGroup(), value, numberFormatter,
-                                                     *chartItem_->unitController());
+        return qv_dashboardChartBoundStringFromValue(chartItem_->dataUnitGroup(), chartItem_->timeScope(),
+                                                     value, numberFormatter, *chartItem_->unitController());
     });
     chart_.setChartBackgroundView(chartBackground_);
     chart_.onNeedsRepaint = [this] { contentLooksDifferent(); };

@@ -160,11 +160,12 @@ void QVCumulativeDataProvider::updateMostRecentStatistics(const VSQuantitySample
     const VSCalendar calendar = VSCalendar::current();
     const VSDate from = calendar.startOfDay(mostRecent.startDate());
     const VSDate to = calendar.addDays(from, 1);
+    // What the sample added after midnight is in the total of the next day.
+    const VSDate date = dateOfCurrentValue({mostRecent.startDate(), std::min(mostRecent.endDate(), to)});
     const Captured captured{intake(), dataUnit(), preferredUnit(), timeScope()};
     execute(std::make_shared<VSStatisticsQuery>(
         dataUnit()->dataType(), VSQuery::predicateForSamples(from, to, VSQueryOptionNone),
-        VSStatisticsOptionCumulativeSum,
-        [captured, ticket, date = mostRecent.endDate()](const VSResult<VSStatistics>& answer) {
+        VSStatisticsOptionCumulativeSum, [captured, ticket, date](const VSResult<VSStatistics>& answer) {
             const auto total = answer ? totalOf(*answer, captured) : std::nullopt;
             if (total) {
                 captured.intake.updateCurrentValue(captured.dataUnit->adjustedValueForDaemonValue(*total),

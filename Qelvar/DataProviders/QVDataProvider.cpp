@@ -74,6 +74,12 @@ std::optional<VSDateComponents> QVDataProvider::intervalComponentsForTimeScope(Q
     return interval;
 }
 
+VSDate QVDataProvider::dateOfCurrentValue(const VSTimeSpan& span) {
+    const VSDate last = VSLastMomentOfSpan(span, VSCalendar::current());
+    const VSDate now = VSEnvironment::current()->now();
+    return span.start <= now ? std::min(last, now) : last;
+}
+
 QString QVDataProvider::secondaryTextForValue(Value value) const {
     return value ? QVStringFromNumberInDisplayRange(*value, dataUnit_, *unitController_, false)
                  : QVNoDataString();
@@ -81,7 +87,9 @@ QString QVDataProvider::secondaryTextForValue(Value value) const {
 
 platform::StyledText QVDataProvider::secondaryValueText() const {
     const QString text = secondaryTextForValue(hasLoadedSecondaryValues() ? averageValue() : std::nullopt);
-    return platform::StyledText(platform::localized("DAILY_AVG %@", {text}));
+    // A day alone has no daily average: what is told beside it is that of the week.
+    const char* key = timeScope_ == QVTimeScope::Day ? "SEVEN_DAY_AVG %@" : "DAILY_AVG %@";
+    return platform::StyledText(platform::localized(key, {text}));
 }
 
 void QVDataProvider::restartQueries() {

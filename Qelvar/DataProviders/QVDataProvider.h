@@ -17,6 +17,7 @@
 #include "Qelvar/Models/Data/QVChartPoint.h"
 #include "Qelvar/Models/Data/QVTimeScope.h"
 #include "Vessa/VSHealthStore.h"
+#include "VessaUI/VSTimePeriods.h"
 #include "VessaUI/VSUnitController.h"
 
 /// How far a question to the store has come.
@@ -111,7 +112,8 @@ class QVDataProvider : public std::enable_shared_from_this<QVDataProvider> {
     /// Sets the visible span and scope. Nothing is asked until restartQueries. REQUIRES: a time scope.
     void setStartDate(std::optional<VSDate> startDate, std::optional<VSDate> endDate, QVTimeScope timeScope);
 
-    /// What stands under the chart: "daily average" and the average, or the text for no data.
+    /// What stands under the chart: "daily average" (in the day scope "7-day average", since it is not of the
+    /// day that is shown) and the average, or the text for no data.
     virtual platform::StyledText secondaryValueText() const;
 
     /// Asks (again) for what the visible span needs. Subclasses call the base first.
@@ -171,6 +173,9 @@ class QVDataProvider : public std::enable_shared_from_this<QVDataProvider> {
     std::optional<VSDateComponents> intervalComponentsForTimeScope(QVTimeScope timeScope) const;
     /// The preferred unit, for a quantity type.
     VSUnit preferredUnit() const { return unitController_->unitForDataUnit(dataUnit_); }
+    /// The date of a current value that such a span tells: its last moment, but what has begun is so until
+    /// now and not until a moment that is to come.
+    static VSDate dateOfCurrentValue(const VSTimeSpan& span);
     /// The text of a value in a secondary text (not held in the display range), or that for no data.
     QString secondaryTextForValue(Value value) const;
 

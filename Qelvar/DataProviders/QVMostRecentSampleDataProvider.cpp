@@ -32,7 +32,8 @@ void QVMostRecentSampleDataProvider::updateMostRecentObject(const Error& error) 
                 const VSQuantitySample& sample = **answer;
                 const double value =
                     dataUnit->adjustedValueForDaemonValue(sample.quantity().doubleValueForUnit(unit));
-                intake.updateCurrentValue(value, sample.endDate(), std::nullopt, unit, ticket);
+                intake.updateCurrentValue(value, dateOfCurrentValue({sample.startDate(), sample.endDate()}),
+                                          std::nullopt, unit, ticket);
                 return;
             }
             if (!answer) intake.logError(logs.lookUp, answer.error());

@@ -3,7 +3,7 @@
 #include "Qelvar/DataProviders/QVDataProvider.h"
 
 /// What the providers of single readings share: the current value is the most recent sample itself, dated at
-/// its end.
+/// its last moment.
 class QVMostRecentSampleDataProvider : public QVDataProvider {
  public:
     using QVDataProvider::QVDataProvider;

@@ -8,7 +8,6 @@
 #include "Qelvar/DataProviders/QVHealthStoreExtensions.h"
 #include "Qelvar/Formatters/QVDateFormatters.h"
 #include "Qelvar/Formatters/QVNumberFormatters.h"
-#include "Vessa/Base/VSEnvironment.h"
 #include "VessaUI/VSTimePeriods.h"
 
 namespace {
@@ -86,11 +85,8 @@ void QVSamplesExistDataProvider::updateMostRecentObject(const Error& error) {
         *healthStore(), dataUnit()->sampleType(), std::nullopt,
         [intake = intake(), ticket](const VSResult<std::shared_ptr<const VSCategorySample>>& answer) {
             if (answer && *answer) {
-                VSDate last = VSLastMomentOfSample(**answer, VSCalendar::current());
-                // Today as a whole is so until now, and not until a moment that is to come.
-                const VSDate now = VSEnvironment::current()->now();
-                if ((*answer)->startDate() <= now) last = std::min(last, now);
-                intake.updateCurrentValue((*answer)->value(), last, std::nullopt, {}, ticket);
+                const VSDate date = dateOfCurrentValue({(*answer)->startDate(), (*answer)->endDate()});
+                intake.updateCurrentValue((*answer)->value(), date, std::nullopt, {}, ticket);
                 return;
             }
             if (!answer) intake.logError("Error fetching most recent sample", answer.error());

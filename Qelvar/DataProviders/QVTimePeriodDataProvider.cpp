@@ -80,7 +80,7 @@ std::map<VSDate, double> totalsByDay(const Spans& spans, const VSTimePeriodRules
     return result;
 }
 
-/// The time of the spans in [start, end), in hours, and when the last of it ended.
+/// The time of the spans in [start, end), in hours, and the last moment of it.
 std::pair<double, VSDate> totalOf(const Spans& spans, VSDate start, VSDate end) {
     VSDuration total{0};
     VSDate last = start;
@@ -90,7 +90,7 @@ std::pair<double, VSDate> totalOf(const Spans& spans, VSDate start, VSDate end) 
         total += part.length();
         last = std::max(last, part.end);
     }
-    return {VSSecondsFromDuration(total) / 3600, last};
+    return {VSSecondsFromDuration(total) / 3600, VSLastMomentOfSpan({start, last}, VSCalendar::current())};
 }
 
 }  // namespace
@@ -112,7 +112,9 @@ QVDataProvider::Value QVTimePeriodDataProvider::totalForDate(VSDate date) const 
     return entry == dateTotals_.end() ? std::nullopt : Value(entry->second);
 }
 
-void QVTimePeriodDataProvider::takeDateTotals(std::map<VSDate, double> totals) {
+void QVTimePeriodDataProvider::takeDateTotals(std::map<VSDate, double> totals, Ticket ticket) {
+    if (ticket < dateTotalsTicket_) return;
+    dateTotalsTicket_ = ticket;
     dateTotals_ = std::move(totals);
     dates_.clear();
     for (const auto& [date, hours] : dateTotals_) dates_.push_back(date);
@@ -184,7 +186,7 @@ void QVTimePeriodDataProvider::restartHistoricalDataQuery() {
         const VSDate noon = calendar.noonOfDay(VSEnvironment::current()->now());
         if (range.start < noon) range.end = std::min(range.end, noon);
     }
-    beginQuery(Answer::Historical, timeScope());
+    dateTotalsTicket_ = beginQuery(Answer::Historical, timeScope());
     beginQuery(Answer::Secondary, timeScope());
     auto handler = onMainQueue(this, [range](QVTimePeriodDataProvider& self, const Error& error) {
         self.updateHistoricalData(range, error);
@@ -213,17 +215,23 @@ void QVTimePeriodDataProvider::updateHistoricalData(const Range& range, const Er
             self.updateDailyAverage(scope, ticket);
         });
     const auto takeTotals =
-        onMainQueue(this, [](QVTimePeriodDataProvider& self, const std::map<VSDate, double>& totals) {
-            self.takeDateTotals(totals);
+        onMainQueue(this, [ticket](QVTimePeriodDataProvider& self, const std::map<VSDate, double>& totals) {
+            self.takeDateTotals(totals, ticket);
         });
+    const auto countedInTotals =
+        dataUnit()->chartingPredicateForTimeScope(QVTimeScopeIndex(QVTimeScope::Week));
     fetchSamples(
-        range, [captured, range, averageDays, takeTotals, dayPoints = dayPoints(), all = processAllSamples_](
-                   const VSResult<Samples>& answer, const VSTimePeriodRules& rules) {
+        range, [captured, range, averageDays, takeTotals, countedInTotals, dayPoints = dayPoints(),
+                all = processAllSamples_](const VSResult<Samples>& answer, const VSTimePeriodRules& rules) {
             const Intake& intake = captured.intake;
             if (answer && range.timeScope != QVTimeScope::Day)
                 return reportBuckets(spansOf(*answer, rules), rules, captured);
             // Before the points, so that who is told of points finds the totals that belong to them.
-            if (answer && all) takeTotals(totalsByDay(spansOf(*answer, rules), rules, captured));
+            if (answer && all) {
+                VSTimePeriodRules ofTotals = rules;
+                ofTotals.counted = countedInTotals;
+                takeTotals(totalsByDay(spansOf(*answer, ofTotals), ofTotals, captured));
+            }
             Points points;
             if (answer) points = dayPoints(*answer, rules, range);
             const bool empty = points.empty();
@@ -235,12 +243,9 @@ void QVTimePeriodDataProvider::updateHistoricalData(const Range& range, const Er
 }
 
 void QVTimePeriodDataProvider::updateDailyAverage(QVTimeScope timeScope, Ticket ticket) {
-    const auto week = QVTimeScopeSpan(QVTimeScope::Week, VSEnvironment::current()->now(), false);
-    Range range{week->start, week->end, QVTimeScope::Week};
-    if (chartingRules().shouldStartDayAtNoon()) {
-        range.start = VSCalendar::current().yesterdayAtNoon(range.start);
-        range.end = VSCalendar::current().yesterdayAtNoon(range.end);
-    }
+    const auto week = QVTimeScopeSpan(QVTimeScope::Week, VSEnvironment::current()->now(),
+                                      chartingRules().shouldStartDayAtNoon());
+    const Range range{week->start, week->end, QVTimeScope::Week};
     fetchSamples(range, [intake = intake(), range, timeScope, ticket](const VSResult<Samples>& answer,
                                                                       const VSTimePeriodRules& rules) {
         if (!answer) return intake.logError("Error fetching samples for average calculation", answer.error());
@@ -319,7 +324,10 @@ void QVTimePeriodDataProvider::lookAtLatestDay(const std::shared_ptr<Search>& se
     const VSDate start = *search->days.rbegin();
     search->days.erase(start);
     search->emptyDays.insert(start);
-    const Range day{start, VSCalendar::current().addDays(start, 1), QVTimeScope::Week};
+    const VSCalendar calendar = VSCalendar::current();
+    const VSDate next =
+        chartingRules().shouldStartDayAtNoon() ? VSEndOfNoonDay(start, calendar) : calendar.addDays(start, 1);
+    const Range day{start, next, QVTimeScope::Week};
     const auto lookBefore =
         onMainQueue(this, [search](QVTimePeriodDataProvider& self) { self.lookAtLatestDay(search); });
     fetchSamples(day, [intake = intake(), day, lookBefore, ticket = search->ticket](

@@ -24,7 +24,8 @@ class QVTimePeriodDataProvider : public QVDataProvider {
     void stopQueries() override;
     const char* className() const override { return "QVTimePeriodDataProvider"; }
 
-    /// Whether day-scope refreshes also compute the totals of all visible days. Set before restartQueries.
+    /// Whether day-scope refreshes also compute the totals of all visible days, over the samples that count
+    /// in the longer scopes. Set before restartQueries.
     bool processAllSamples() const { return processAllSamples_; }
     void setProcessAllSamples(bool process) { processAllSamples_ = process; }
     /// The starts of the days that have a total, ascending.
@@ -41,6 +42,8 @@ class QVTimePeriodDataProvider : public QVDataProvider {
     using DayPoints = Points (*)(const std::vector<VSSamplePtr>& samples, const VSTimePeriodRules& rules,
                                  const Range& range);
     virtual DayPoints dayPoints() const;
+    /// Totals with an earlier ticket than those kept, or than the running query, come too late.
+    void takeDateTotals(std::map<VSDate, double> totals, Ticket ticket);
 
  private:
     void restartCurrentValueQuery();
@@ -59,13 +62,13 @@ class QVTimePeriodDataProvider : public QVDataProvider {
         std::function<void(const VSResult<std::vector<VSSamplePtr>>&, const VSTimePeriodRules&)>;
     void fetchSamples(const Range& range, const SamplesHandler& handler);
     bool shouldUseEndDateForTimeScope(QVTimeScope timeScope) const;
-    void takeDateTotals(std::map<VSDate, double> totals);
 
     QVRunningQuery historicalDataQuery_;
     QVRunningQuery currentValueQuery_;
     bool processAllSamples_ = false;
     std::map<VSDate, double> dateTotals_;  // hours by the start of the day
     std::vector<VSDate> dates_;
+    Ticket dateTotalsTicket_ = 0;
 };
 
 /// For spans of several kinds (stood and idle hours): the day scope shows the spans of each category value at

@@ -82,12 +82,30 @@ bool qv_interactiveChartsDataSourceDependsOnTimeScope(const VSDataUnitGroup* gro
     return id == VSGroupID::SleepAnalysis || id == VSGroupID::Workouts || id == VSGroupID::StandHours;
 }
 
-QString qv_dashboardChartBoundStringFromValue(const VSDataUnitGroup* group, double value,
-                                              const VSNumberFormatter& defaultNumberFormatter,
+namespace {
+
+/// Says of which time a bar is the total; null where that is a day, or where it is no total.
+const char* keyOfPeriod(const VSDataUnitGroup* group, QVTimeScope timeScope) {
+    const bool addsUp = group->anyDataUnit()->dataType()->isCumulative() ||
+                        qv_interactiveChartsDataSourceDependsOnTimeScope(group);
+    if (!addsUp) return nullptr;
+    const VSDateComponents bar =
+        group->chartingRules().intervalComponentsForTimeScope(QVTimeScopeIndex(timeScope));
+    if (bar == VSDateComponents{.hours = 1}) return "PER_HOUR %@";
+    if (bar == VSDateComponents{.months = 1}) return "PER_MONTH %@";
+    return nullptr;
+}
+
+}  // namespace
+
+QString qv_dashboardChartBoundStringFromValue(const VSDataUnitGroup* group, QVTimeScope timeScope,
+                                              double value, const VSNumberFormatter& defaultNumberFormatter,
                                               const VSUnitController& unitController) {
     const VSDataUnit* dataUnit = group->anyDataUnit();
     const auto own =
         qv_numberFormatterForUnit(dataUnit->dataType(), unitController.unitForDataUnit(dataUnit));
-    return QVStringFromNumberInDisplayRange(value, dataUnit, unitController, true,
-                                            own ? own.get() : &defaultNumberFormatter);
+    const QString text = QVStringFromNumberInDisplayRange(value, dataUnit, unitController, true,
+                                                          own ? own.get() : &defaultNumberFormatter);
+    const char* period = keyOfPeriod(group, timeScope);
+    return period && value != 0 ? platform::localized(period, {text}) : text;
 }

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "Qelvar/Formatters/QVNumberFormatters.h"
+#include "Qelvar/Models/Data/QVTimeScope.h"
 #include "VessaUI/VSDataUnitGroup.h"
 
 /// Labels of a display type's enumerated values, in the user's language; empty for types without. Any thread.
@@ -21,7 +22,8 @@ int qv_stackedChartSectionsCount(const VSDataUnitGroup* group);
 /// Whether the landscape chart asks for other data in each time scope: durations are summed over its spans.
 bool qv_interactiveChartsDataSourceDependsOnTimeScope(const VSDataUnitGroup* group);
 /// The text beside a bound of a dashboard chart, in the user's unit, held in the display range. The default
-/// formatter serves where the data type has none of its own.
-QString qv_dashboardChartBoundStringFromValue(const VSDataUnitGroup* group, double value,
-                                              const VSNumberFormatter& defaultNumberFormatter,
+/// formatter serves where the data type has none of its own. Where the bars of what adds up are not of a day,
+/// as the figure above them is, the text says of what: "800,000/mo".
+QString qv_dashboardChartBoundStringFromValue(const VSDataUnitGroup* group, QVTimeScope timeScope,
+                                              double value, const VSNumberFormatter& defaultNumberFormatter,
                                               const VSUnitController& unitController);

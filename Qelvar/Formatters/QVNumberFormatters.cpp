@@ -140,6 +140,9 @@ QString QVStringFromNumberInDisplayRange(double number, const VSDataUnit* dataUn
         return localized("GREATER_THAN_%@", {text(*range->maximum)});
     if (range && range->minimum && number < *range->minimum)
         return localized("LESS_THAN_%@", {text(*range->minimum)});
+    const auto* decimal = dynamic_cast<const QVDecimalNumberFormatter*>(numberFormatter);
+    if (decimal && number > 0 && dataUnit->dataType()->isCumulative() && text(number) == text(0))
+        return localized("LESS_THAN_%@", {text(std::pow(10, -decimal->maximumFractionDigits()))});
     return text(number);
 }
 

@@ -71,7 +71,8 @@ std::shared_ptr<const VSNumberFormatter> qv_numberFormatterForUnit(const VSDataU
                                                                    const VSUnit& unit);
 
 /// The formatted number; with `clampToDisplayRange`, "more than" the maximum or "less than" the minimum of
-/// the unit's display range outside it. A null formatter means the data unit's own for the user's unit. Empty
+/// the unit's display range outside it. An amount that is there and would read 0 is "less than" the smallest
+/// that can be written. A null formatter means the data unit's own for the user's unit. Empty
 /// when the formatter has no text.
 QString QVStringFromNumberInDisplayRange(double number, const VSDataUnit* dataUnit,
                                          const VSUnitController& unitController, bool clampToDisplayRange,

@@ -26,21 +26,38 @@ LocalTime localTime(const VSZoneTable& zone, VSDate date) {
     return {civilFromDays(days), local - days * kDay};
 }
 
-VSDate instant(const VSZoneTable& zone, const CivilDay& day, int64_t timeOfDay = 0) {
-    return VSDate::fromMicroseconds(zone.instantOfLocal(daysFromCivil(day) * kDay + timeOfDay));
+VSDate startOfDay(const VSZoneTable& zone, const CivilDay& day) {
+    return VSDate::fromMicroseconds(zone.startOfDay(daysFromCivil(day)));
+}
+
+CivilDay dayOf(const VSZoneTable& zone, VSDate date) {
+    return civilFromDays(zone.dayOf(date.microseconds()));
+}
+
+int64_t dayBefore(const VSZoneTable& zone, VSDate date) {
+    return zone.dayOf(zone.startOfDay(zone.dayOf(date.microseconds())) - 1);
+}
+
+VSDate noon(const VSZoneTable& zone, int64_t day) {
+    return VSDate::fromMicroseconds(zone.instantOfLocal(day * kDay + kDay / 2));
+}
+
+/// A start of a day stays one: the clock may show one o'clock then, but on the day that is meant it will not.
+VSDate addToDay(const VSZoneTable& zone, VSDate date, int64_t months, int64_t days) {
+    const CivilDay day = dayOf(zone, date);
+    if (startOfDay(zone, day) == date)
+        return VSDate::fromMicroseconds(zone.startOfDay(daysFromCivil(addMonthsToDay(day, months)) + days));
+    const LocalTime local = localTime(zone, date);
+    const int64_t dayNumber = daysFromCivil(addMonthsToDay(local.day, months)) + days;
+    return VSDate::fromMicroseconds(zone.instantOfLocal(dayNumber * kDay + local.timeOfDay));
 }
 
 /// Adds factor times the components. 64 bits, since a factor counts the buckets since an anchor long ago.
 VSDate addTimes(const VSZoneTable& zone, VSDate date, const VSDateComponents& components, int64_t factor) {
     const int64_t months = (int64_t{components.years} * 12 + components.months) * factor;
     const int64_t days = components.days * factor;
-    if (months != 0 || days != 0) {
-        // An addition of nothing must not reach this: it would take the second of two equal local times to
-        // the first.
-        const LocalTime local = localTime(zone, date);
-        const int64_t dayNumber = daysFromCivil(addMonthsToDay(local.day, months)) + days;
-        date = VSDate::fromMicroseconds(zone.instantOfLocal(dayNumber * kDay + local.timeOfDay));
-    }
+    // An addition of nothing would take the second of two equal local times to the first.
+    if (months != 0 || days != 0) date = addToDay(zone, date, months, days);
     const int64_t seconds =
         int64_t{components.hours} * 3600 + int64_t{components.minutes} * 60 + components.seconds;
     return date + VSDuration(seconds * factor * kSecond);
@@ -93,18 +110,17 @@ VSCalendar::VSCalendar(std::string timeZone, std::string locale)
 
 VSDate VSCalendar::startOfDay(VSDate date) const {
     const auto zone = VSZoneTable::forZone(timeZone_);
-    return instant(*zone, localTime(*zone, date).day);
+    return ::startOfDay(*zone, dayOf(*zone, date));
 }
 
 VSDate VSCalendar::yesterdayAtNoon(VSDate date) const {
     const auto zone = VSZoneTable::forZone(timeZone_);
-    const int64_t today = daysFromCivil(localTime(*zone, date).day);
-    return VSDate::fromMicroseconds(zone->instantOfLocal((today - 1) * kDay + kDay / 2));
+    return noon(*zone, dayBefore(*zone, date));
 }
 
 VSDate VSCalendar::noonOfDay(VSDate date) const {
     const auto zone = VSZoneTable::forZone(timeZone_);
-    return instant(*zone, localTime(*zone, date).day, kDay / 2);
+    return noon(*zone, zone->dayOf(date.microseconds()));
 }
 
 VSDate VSCalendar::add(VSDate date, const VSDateComponents& components) const {
@@ -121,16 +137,16 @@ VSDate VSCalendar::addMonths(VSDate date, int months) const {
 
 VSDate VSCalendar::startOfMonth(VSDate date) const {
     const auto zone = VSZoneTable::forZone(timeZone_);
-    CivilDay day = localTime(*zone, date).day;
+    CivilDay day = dayOf(*zone, date);
     day.day = 1;
-    return instant(*zone, day);
+    return ::startOfDay(*zone, day);
 }
 
 VSDate VSCalendar::middleOfMonth(VSDate date) const {
     const auto zone = VSZoneTable::forZone(timeZone_);
-    CivilDay day = localTime(*zone, date).day;
+    CivilDay day = dayOf(*zone, date);
     day.day = 1;
-    return VSMidDate(instant(*zone, day), instant(*zone, addMonthsToDay(day, 1)));
+    return VSMidDate(::startOfDay(*zone, day), ::startOfDay(*zone, addMonthsToDay(day, 1)));
 }
 
 VSDate VSCalendar::startOfHour(VSDate date) const {
@@ -169,7 +185,10 @@ std::optional<VSDate> VSCalendar::date(int year, int month, int day, int hour, i
     if (hour < 0 || hour > 23 || minute < 0 || minute > 59 || second < 0 || second > 59) return std::nullopt;
     if (year < -kYearLimit || year > kYearLimit) return std::nullopt;
     const auto zone = VSZoneTable::forZone(timeZone_);
-    return instant(*zone, {year, month, day}, hour * kHour + minute * kMinute + second * kSecond);
+    const CivilDay civil{year, month, day};
+    const int64_t timeOfDay = hour * kHour + minute * kMinute + second * kSecond;
+    if (timeOfDay == 0) return ::startOfDay(*zone, civil);
+    return VSDate::fromMicroseconds(zone->instantOfLocal(daysFromCivil(civil) * kDay + timeOfDay));
 }
 
 int VSCalendar::wholeYearsBetween(VSDate from, VSDate to) const {
@@ -182,7 +201,7 @@ int VSCalendar::wholeYearsBetween(VSDate from, VSDate to) const {
 
 bool VSCalendar::isSameDay(VSDate a, VSDate b) const {
     const auto zone = VSZoneTable::forZone(timeZone_);
-    return localTime(*zone, a).day == localTime(*zone, b).day;
+    return zone->dayOf(a.microseconds()) == zone->dayOf(b.microseconds());
 }
 
 bool VSCalendar::isToday(VSDate date) const {
@@ -191,8 +210,7 @@ bool VSCalendar::isToday(VSDate date) const {
 
 bool VSCalendar::isYesterday(VSDate date) const {
     const auto zone = VSZoneTable::forZone(timeZone_);
-    const int64_t today = daysFromCivil(localTime(*zone, VSEnvironment::current()->now()).day);
-    return daysFromCivil(localTime(*zone, date).day) == today - 1;
+    return zone->dayOf(date.microseconds()) == dayBefore(*zone, VSEnvironment::current()->now());
 }
 
 std::vector<int> VSCalendar::weekendDays() const {

@@ -29,7 +29,7 @@ enum class VSCalendarUnit { Era, Year, Month, Day, Hour, Minute, Second, Weekday
 /// it are kept per thread. Any thread.
 ///
 /// Where a local time does not exist (clocks going forward) the first moment after the gap is meant; where it
-/// exists twice, the first of the two.
+/// exists twice, the first of the two. Days have no gaps and no overlaps: VSZoneTable says where they start.
 class VSCalendar {
  public:
     /// In the zone and locale of VSEnvironment::current().
@@ -37,10 +37,10 @@ class VSCalendar {
     VSCalendar(std::string timeZone, std::string locale);
 
     VSDate startOfDay(VSDate date) const;
-    /// Noon of the calendar day before the date's day.
+    /// Noon of the day before the date's day; days that the zone left out are not counted.
     VSDate yesterdayAtNoon(VSDate date) const;
     VSDate noonOfDay(VSDate date) const;
-    /// Adds calendar components: a day is a calendar day, whatever its length; the time of day is kept.
+    /// Adds calendar days, whatever their length, and keeps the time of day; the start of a day stays one.
     VSDate add(VSDate date, const VSDateComponents& components) const;
     VSDate addDays(VSDate date, int days) const;
     VSDate addMonths(VSDate date, int months) const;

@@ -7,15 +7,15 @@
 #include <map>
 #include <mutex>
 
+#include "Vessa/Base/VSCivil.h"
 #include "Vessa/Base/VSLog.h"
 
 namespace {
 
 // The Gregorian calendar, its weekdays included, repeats after 400 years: whatever rule is in force in the
 // last 400 years of the table holds for all time after it.
-constexpr int64_t kSecond = 1'000'000;
-constexpr int64_t kPeriod = int64_t{146'097} * 86'400 * kSecond;
-constexpr int64_t kEndOfTable = int64_t{16'725'225'600} * kSecond;  // 2500-01-01 00:00:00 UTC
+constexpr int64_t kPeriod = civil::kDaysOfEra * civil::kDay;
+constexpr int64_t kEndOfTable = int64_t{16'725'225'600} * civil::kSecond;  // 2500-01-01 00:00:00 UTC
 
 int64_t intoTable(int64_t time) {
     if (time < kEndOfTable) return time;
@@ -91,15 +91,32 @@ int64_t VSZoneTable::lastChangeAt(int64_t time) const {
     return change == INT64_MIN ? change : change + (time - inside);
 }
 
+/// The first period of constant offset whose wall clock ends after the local time holds it, or lies behind
+/// the gap that holds it. The ends ascend, for no change takes back more than the period before it lasted.
+const VSZoneTable::Change* VSZoneTable::periodOfLocal(int64_t local) const {
+    return &*std::partition_point(changes_.begin(), changes_.end(), [&](const Change& change) {
+        const auto* next = &change + 1;
+        return next != changes_.data() + changes_.size() && next->time + change.offset <= local;
+    });
+}
+
 int64_t VSZoneTable::instantOfLocal(int64_t local) const {
     const int64_t inside = intoTable(local);
-    const int64_t shift = local - inside;
-    // The first period of constant offset whose wall clock ends after the local time holds it, or lies behind
-    // the gap that holds it. The ends ascend, for no change takes back more than the period before it lasted.
-    const auto period = std::partition_point(changes_.begin(), changes_.end(), [&](const Change& change) {
-        const auto* next = &change + 1;
-        return next != changes_.data() + changes_.size() && next->time + change.offset <= inside;
-    });
-    const int64_t instant = inside - period->offset;
-    return std::max(instant, period->time) + shift;
+    const Change* period = periodOfLocal(inside);
+    return std::max(inside - period->offset, period->time) + (local - inside);
+}
+
+int64_t VSZoneTable::startOfDay(int64_t day) const {
+    const int64_t midnight = day * civil::kDay;
+    const int64_t inside = intoTable(midnight);
+    const Change* period = periodOfLocal(inside);
+    for (const Change* next = period + 1;
+         next != changes_.data() + changes_.size() && next->time + next->offset < inside; ++next)
+        period = next;
+    return std::max(inside - period->offset, period->time) + (midnight - inside);
+}
+
+int64_t VSZoneTable::dayOf(int64_t time) const {
+    const int64_t shown = civil::floorDivide(time + offsetAt(time), civil::kDay);
+    return startOfDay(shown) <= time ? shown : shown - 1;
 }

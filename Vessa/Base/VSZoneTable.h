@@ -18,6 +18,12 @@ class VSZoneTable {
     /// The instant of a local time (microseconds since 1970 as the clock on the wall shows them): in a gap
     /// the first moment after it, in an overlap the first of the two.
     int64_t instantOfLocal(int64_t local) const;
+    /// The day that the moment belongs to (days since 1970): the last that has begun.
+    int64_t dayOf(int64_t time) const;
+    /// The first moment after which the clock shows no earlier day than this one: behind the gap where the
+    /// clock goes forward over midnight, and at the second midnight where it goes back to the day before. A
+    /// day that the zone left out starts with the next.
+    int64_t startOfDay(int64_t day) const;
     /// The last change at or before the time, or INT64_MIN.
     int64_t lastChangeAt(int64_t time) const;
 
@@ -28,6 +34,7 @@ class VSZoneTable {
     };
 
     void readChanges(const std::string& identifier);
+    const Change* periodOfLocal(int64_t local) const;
 
     std::vector<Change> changes_;  // ascending; the first is at INT64_MIN
 };

@@ -7,9 +7,12 @@
 #include <cstdlib>
 #include <fstream>
 
+#include "HostBus.h"
+#include "Platform/DesktopSettings.h"
 #include "Platform/Localization.h"
 #include "QtTestSupport.h"
 #include "TestSupport.h"
+#include "Vessa/Base/VSSystemSettings.h"
 
 namespace {
 
@@ -28,6 +31,7 @@ class SystemEventsTest : public testing::Test {
         test::waitUntil([&] { return timer.hasExpired(milliseconds); });
     }
 
+    test::HostBus& bus_ = test::HostBus::shared();
     QObject context_;
     int changes_ = 0;
 };
@@ -66,28 +70,21 @@ TEST_F(SystemEventsTest, ZoneChangeOnTheSameDayIsAnEvent) {
 
 TEST_F(SystemEventsTest, WhatTheBusTellsIsCheckedAgainstTheClock) {
     test::FixedEnvironment environment("2020-03-28T12:00", "Europe/Copenhagen");
-    auto* events = &SystemEvents::shared();
-    events->start();
-    // By the names that the bus is given.
-    const auto resume = [&](bool goingToSleep) {
-        return QMetaObject::invokeMethod(events, "busPrepareForSleep", Q_ARG(bool, goingToSleep));
-    };
-    const auto timeDateChange = [&] {
-        return QMetaObject::invokeMethod(events, "busTimeDateChanged",
-                                         Q_ARG(QString, "org.freedesktop.timedate1"), Q_ARG(QVariantMap, {}),
-                                         Q_ARG(QStringList, {}));
-    };
-    EXPECT_TRUE(resume(false));
-    EXPECT_TRUE(timeDateChange());
+    SystemEvents::shared().start();
+    bus_.prepareForSleep(false);
+    bus_.timeDateChanged({{"NTP", true}});
+    ASSERT_TRUE(bus_.flush());
     EXPECT_EQ(changes_, 0);
     environment->setNow(test::date("2020-03-29T08:00"));
-    resume(true);
+    bus_.prepareForSleep(true);
+    ASSERT_TRUE(bus_.flush());
     EXPECT_EQ(changes_, 0);
-    resume(false);
-    EXPECT_EQ(changes_, 1);
+    bus_.prepareForSleep(false);
+    ASSERT_TRUE(test::waitUntil([&] { return changes_ > 0; }));
     environment->setTimeZone("America/New_York");
-    timeDateChange();
-    timeDateChange();
+    bus_.timeDateChanged({{"Timezone", "America/New_York"}});
+    bus_.timeDateChanged({{"Timezone", "America/New_York"}});
+    ASSERT_TRUE(bus_.flush());
     EXPECT_EQ(changes_, 2);
 }
 
@@ -104,20 +101,35 @@ TEST_F(SystemEventsTest, LocaleChangeLoadsTheTextsFirst) {
     EXPECT_EQ(seen, "Day");
 }
 
+/// The system's, with the host's settings in another folder.
+class HostEnvironment : public VSEnvironment {
+ public:
+    explicit HostEnvironment(std::filesystem::path etc) : etc_(std::move(etc)) {}
+    VSDate now() const override { return system_.now(); }
+    std::string timeZoneIdentifier() const override { return VSTimeZoneFromSystem(std::getenv("TZ"), etc_); }
+    std::string localeIdentifier() const override { return system_.localeIdentifier(); }
+
+ private:
+    const VSSystemEnvironment system_;
+    const std::filesystem::path etc_;
+};
+
 /// The host's settings in a folder, and the process's variables as they come from there or not.
-class HostLocaleTest : public testing::Test {
+class HostSettingsTest : public testing::Test {
  protected:
-    HostLocaleTest() {
-        for (const char* name : {"LC_ALL", "LC_TIME", "LANG"}) {
+    HostSettingsTest() {
+        for (const char* name : {"LC_ALL", "LC_TIME", "LANG", "TZ"}) {
             const char* value = getenv(name);
             before_.emplace_back(name, value ? value : "");
             unsetenv(name);
         }
-        previous_ = VSEnvironment::install(std::make_shared<VSSystemEnvironment>());
+        previous_ = VSEnvironment::current();
         QObject::connect(&SystemEvents::shared(), &SystemEvents::localeDidChange, &context_,
                          [this] { ++changes_; });
+        QObject::connect(&SystemEvents::shared(), &SystemEvents::significantTimeChange, &context_,
+                         [this] { zones_.push_back(VSEnvironment::current()->timeZoneIdentifier()); });
     }
-    ~HostLocaleTest() override {
+    ~HostSettingsTest() override {
         SystemEvents::shared().start();  // the real host's again
         VSSystemEnvironment::setHostPreferences(std::nullopt, std::nullopt);
         VSEnvironment::install(previous_);
@@ -132,6 +144,7 @@ class HostLocaleTest : public testing::Test {
         // Each start is of another process.
         std::filesystem::rename(etc_, etc_.string() + std::to_string(++starts_));
         etc_ = etc_.string() + std::to_string(starts_);
+        VSEnvironment::install(std::make_shared<HostEnvironment>(etc_));
         SystemEvents::shared().start(etc_);
         changes_ = 0;
     }
@@ -142,15 +155,11 @@ class HostLocaleTest : public testing::Test {
         std::ofstream(path) << text;
         if (!inPlace) std::filesystem::rename(path, etc_ / name);
     }
-    static void tellOverBus(const QStringList& settings) {
-        QMetaObject::invokeMethod(
-            &SystemEvents::shared(), "busLocaleChanged", Q_ARG(QString, "org.freedesktop.locale1"),
-            Q_ARG(QVariantMap, (QVariantMap{{"Locale", settings}})), Q_ARG(QStringList, {}));
-    }
-    static void tellClock(const QString& format) {
-        QMetaObject::invokeMethod(&SystemEvents::shared(), "busSettingChanged",
-                                  Q_ARG(QString, "org.gnome.desktop.interface"),
-                                  Q_ARG(QString, "clock-format"), Q_ARG(QDBusVariant, QDBusVariant(format)));
+    /// As timedatectl does.
+    void linkZone(const std::string& zone) {
+        const auto link = folder_.path() / "beside";
+        std::filesystem::create_symlink("/usr/share/zoneinfo/" + zone, link);
+        std::filesystem::rename(link, etc_ / "localtime");
     }
     static std::string locale() { return VSEnvironment::current()->localeIdentifier(); }
 
@@ -159,12 +168,15 @@ class HostLocaleTest : public testing::Test {
     std::shared_ptr<const VSEnvironment> previous_;
     std::vector<std::pair<const char*, std::string>> before_;
     QObject context_;
+    test::HostBus& bus_ = test::HostBus::shared();
     int changes_ = 0, starts_ = 0;
+    std::vector<std::string> zones_;  // at each significant change of the time
 };
 
-TEST_F(HostLocaleTest, IsFollowedByAProcessThatWasGivenNoneOfItsOwn) {
+TEST_F(HostSettingsTest, IsFollowedByAProcessThatWasGivenNoneOfItsOwn) {
     begin("en_US.UTF-8", "en_US.utf8");
-    tellOverBus({"LANG=en_US.UTF-8"});
+    bus_.localeChanged({"LANG=en_US.UTF-8"});
+    ASSERT_TRUE(bus_.flush());
     EXPECT_EQ(changes_, 0);
     write("locale.conf", "LANG=de_DE.UTF-8\n");
     ASSERT_TRUE(test::waitUntil([this] { return changes_ > 0; }));
@@ -173,7 +185,8 @@ TEST_F(HostLocaleTest, IsFollowedByAProcessThatWasGivenNoneOfItsOwn) {
     write("locale.conf", "LANG=de_DE.UTF-8\nLC_TIME='ar_EG.UTF-8'\n", true);
     ASSERT_TRUE(test::waitUntil([this] { return changes_ > 1; }));
     EXPECT_EQ(locale(), "ar_EG");
-    tellOverBus({"LANG=hi_IN.UTF-8", "LC_NUMERIC=de_DE.UTF-8"});
+    bus_.localeChanged({"LANG=hi_IN.UTF-8", "LC_NUMERIC=de_DE.UTF-8"});
+    ASSERT_TRUE(bus_.flush());
     EXPECT_EQ(locale(), "hi_IN");
     std::filesystem::remove(etc_ / "locale.conf");
     write("default/locale", "export LANG=sv_SE.UTF-8\n");
@@ -181,21 +194,27 @@ TEST_F(HostLocaleTest, IsFollowedByAProcessThatWasGivenNoneOfItsOwn) {
 
     begin("en_US.UTF-8", "fr_FR.UTF-8");
     write("locale.conf", "LANG=de_DE.UTF-8\n");
-    tellOverBus({"LANG=ar_EG.UTF-8"});
+    bus_.localeChanged({"LANG=ar_EG.UTF-8"});
+    ASSERT_TRUE(bus_.flush());
     EXPECT_EQ(locale(), "fr_FR") << "somebody gave the process a locale of its own";
     EXPECT_EQ(changes_, 0);
 }
 
-TEST_F(HostLocaleTest, TheDesktopsClockGoesBeforeTheLocales) {
+TEST_F(HostSettingsTest, TheDesktopsClockGoesBeforeTheLocales) {
     begin("en_US.UTF-8", "en_US.UTF-8");
+    const auto tellClock = [this](const char* format) {
+        bus_.setClockFormat(format);
+        ASSERT_TRUE(bus_.flush());
+    };
     const auto uses24HourClock = [] { return VSEnvironment::current()->uses24HourClock(); };
     tellClock("12h");
-    EXPECT_EQ(changes_, 0) << "as the locale has it";
-    EXPECT_EQ(locale(), "en_US");
+    EXPECT_EQ(locale(), "en_US") << "as the locale has it";
+    changes_ = 0;
     tellClock("24h");
     EXPECT_EQ(changes_, 1);
     EXPECT_TRUE(uses24HourClock());
-    tellOverBus({"LANG=de_DE.UTF-8"});
+    bus_.localeChanged({"LANG=de_DE.UTF-8"});
+    ASSERT_TRUE(bus_.flush());
     EXPECT_EQ(locale(), "de_DE");
     tellClock("12h");
     EXPECT_FALSE(uses24HourClock());
@@ -203,4 +222,56 @@ TEST_F(HostLocaleTest, TheDesktopsClockGoesBeforeTheLocales) {
     EXPECT_TRUE(uses24HourClock());
 }
 
+class SettingReceiver : public QObject {
+    Q_OBJECT
+ public:
+    QVariantList values;
+ public slots:
+    void told(const QString&, const QString&, const QDBusVariant& value) {
+        values.append(platform::unpackedSetting(value.variant()));
+    }
+};
+
+TEST_F(HostSettingsTest, TheDesktopIsAskedOnceAndThenTells) {
+    bus_.setClockFormat("24h");
+    ASSERT_TRUE(bus_.flush());
+    SettingReceiver receiver;
+    platform::listenToDesktopSetting(&receiver, "told", "org.gnome.desktop.interface", "clock-format");
+    ASSERT_TRUE(test::waitUntil([&] { return !receiver.values.isEmpty(); }));
+    bus_.setClockFormat("12h");
+    ASSERT_TRUE(bus_.flush());
+    EXPECT_EQ(receiver.values, (QVariantList{"24h", "12h"}));
+}
+
+TEST_F(HostSettingsTest, AnotherZoneIsANewDay) {
+    begin("en_US.UTF-8", "en_US.UTF-8");
+    linkZone("Europe/Copenhagen");
+    const auto expectZone = [this](const char* zone) {
+        EXPECT_TRUE(test::waitUntil([this] { return !zones_.empty(); }));
+        EXPECT_EQ(zones_, std::vector<std::string>{zone});
+        zones_.clear();
+    };
+    expectZone("Europe/Copenhagen");
+    linkZone("Asia/Kathmandu");
+    expectZone("Asia/Kathmandu");
+    linkZone("Asia/Katmandu");  // another name, and so another zone for all that anybody knows
+    expectZone("Asia/Katmandu");
+    std::filesystem::remove(etc_ / "localtime");
+    write("timezone", "America/Santiago\n");
+    ASSERT_TRUE(test::waitUntil([this] { return !zones_.empty() && zones_.back() == "America/Santiago"; }));
+    zones_.clear();
+    write("timezone", "Pacific/Apia\n", true);
+    ASSERT_TRUE(test::waitUntil([this] { return !zones_.empty() && zones_.back() == "Pacific/Apia"; }));
+
+    // Where no file is watched, the bus alone tells.
+    const test::TemporaryFolder elsewhere;
+    SystemEvents::shared().start(elsewhere.path());
+    zones_.clear();
+    linkZone("Africa/Cairo");
+    bus_.timeDateChanged({{"Timezone", "Africa/Cairo"}});
+    expectZone("Africa/Cairo");
+}
+
 }  // namespace
+
+#include "SystemEventsTests.moc"

@@ -12,25 +12,14 @@ QVDateCache::~QVDateCache() {
     QObject::disconnect(significantTimeChange_);
 }
 
-QVDateCache::Dates& QVDateCache::dates(QVTimeScope timeScope, bool noon) {
-    return dates_.at(static_cast<size_t>(timeScope)).at(noon ? 1 : 0);
-}
-
-VSDate QVDateCache::start(QVTimeScope timeScope, bool noon) {
-    Dates& cached = dates(timeScope, noon);
-    if (!cached.start)
-        cached.start = QVTimeScopeSpan(timeScope, VSEnvironment::current()->now(), noon)->start;
-    return *cached.start;
-}
-
-VSDate QVDateCache::end(QVTimeScope timeScope, bool noon) {
-    Dates& cached = dates(timeScope, noon);
-    if (!cached.end) cached.end = QVTimeScopeSpanEnd(timeScope, start(timeScope, noon));
-    return *cached.end;
+const QVDateSpan& QVDateCache::span(QVTimeScope timeScope, bool noon) {
+    auto& cached = spans_.at(static_cast<size_t>(timeScope)).at(noon ? 1 : 0);
+    if (!cached) cached = QVTimeScopeSpan(timeScope, VSEnvironment::current()->now(), noon);
+    return *cached;
 }
 
 void QVDateCache::significantTimeDidChange() {
-    dates_ = {};
+    spans_ = {};
     observers_.tell([this](QVDateCacheObserver& observer) { observer.dateCacheDidUpdate(*this); });
 }
 

@@ -26,14 +26,14 @@ class QVDateCache {
     QVDateCache(const QVDateCache&) = delete;
     QVDateCache& operator=(const QVDateCache&) = delete;
 
-    VSDate startOfDay(bool noon) { return start(QVTimeScope::Day, noon); }
-    VSDate endOfDay(bool noon) { return end(QVTimeScope::Day, noon); }
-    VSDate startOfWeek(bool noon) { return start(QVTimeScope::Week, noon); }
-    VSDate endOfWeek(bool noon) { return end(QVTimeScope::Week, noon); }
-    VSDate startOfMonth(bool noon) { return start(QVTimeScope::Month, noon); }
-    VSDate endOfMonth(bool noon) { return end(QVTimeScope::Month, noon); }
-    VSDate startOfYear(bool noon) { return start(QVTimeScope::Year, noon); }
-    VSDate endOfYear(bool noon) { return end(QVTimeScope::Year, noon); }
+    VSDate startOfDay(bool noon) { return span(QVTimeScope::Day, noon).start; }
+    VSDate endOfDay(bool noon) { return span(QVTimeScope::Day, noon).end; }
+    VSDate startOfWeek(bool noon) { return span(QVTimeScope::Week, noon).start; }
+    VSDate endOfWeek(bool noon) { return span(QVTimeScope::Week, noon).end; }
+    VSDate startOfMonth(bool noon) { return span(QVTimeScope::Month, noon).start; }
+    VSDate endOfMonth(bool noon) { return span(QVTimeScope::Month, noon).end; }
+    VSDate startOfYear(bool noon) { return span(QVTimeScope::Year, noon).start; }
+    VSDate endOfYear(bool noon) { return span(QVTimeScope::Year, noon).end; }
 
     VSDate startOfDayMidnight() { return startOfDay(false); }
     VSDate endOfDayMidnight() { return endOfDay(false); }
@@ -56,15 +56,10 @@ class QVDateCache {
     void removeObserver(const QVDateCacheObserver* observer) { observers_.remove(observer); }
 
  private:
-    struct Dates {
-        std::optional<VSDate> start, end;
-    };
-    Dates& dates(QVTimeScope timeScope, bool noon);
-    VSDate start(QVTimeScope timeScope, bool noon);
-    VSDate end(QVTimeScope timeScope, bool noon);
+    const QVDateSpan& span(QVTimeScope timeScope, bool noon);
     void significantTimeDidChange();
 
-    std::array<std::array<Dates, 2>, QVTimeScopeCount> dates_{};
+    std::array<std::array<std::optional<QVDateSpan>, 2>, QVTimeScopeCount> spans_{};
     platform::ObserverSet<QVDateCacheObserver> observers_;
     QMetaObject::Connection significantTimeChange_;
 };

@@ -12,29 +12,19 @@ constexpr bool isTimeScope(QVTimeScope timeScope) {
     return timeScope >= QVTimeScope::Hour && timeScope <= QVTimeScope::Year;
 }
 
-// What is added to the start of a span to get its end; zero components: there is no span.
-VSDateComponents spanLength(QVTimeScope timeScope) {
-    switch (timeScope) {
-        case QVTimeScope::Day:
-            return {.days = 1};
-        case QVTimeScope::Week:
-            return {.days = 7};
-        case QVTimeScope::Month:
-            return {.days = 31};
-        case QVTimeScope::Year:
-            return {.years = 1, .seconds = -1};
-        case QVTimeScope::Hour:
-            break;
-    }
-    return {};
+QVDateSpan spanOfDays(const VSCalendar& calendar, VSDate anchor, int days, bool noon) {
+    const VSDate today = calendar.startOfDay(anchor);
+    const QVDateSpan span{calendar.addDays(today, 1 - days), calendar.addDays(today, 1)};
+    return noon ? QVDateSpan{calendar.yesterdayAtNoon(span.start), calendar.yesterdayAtNoon(span.end)} : span;
 }
 
-// The first of the month eleven months before the anchor's. Formed from the month's number, so that noon is
-// noon whatever happens to the clocks on that day.
-VSDate startOfYearSpan(const VSCalendar& calendar, VSDate anchor, bool noon) {
+// From the first of the month eleven months before the anchor's.
+QVDateSpan spanOfYear(const VSCalendar& calendar, VSDate anchor, bool noon) {
     const VSDate month = calendar.startOfMonth(anchor);
-    const VSDate first = noon ? calendar.noonOfDay(month) : month;
-    return calendar.add(first, {.years = -1, .months = 1});
+    const VSDate start = calendar.addMonths(month, -11), end = calendar.addMonths(month, 1);
+    constexpr auto aSecond = std::chrono::seconds(1);
+    return noon ? QVDateSpan{calendar.noonOfDay(start), calendar.noonOfDay(end) - aSecond}
+                : QVDateSpan{start, end - aSecond};
 }
 
 }  // namespace
@@ -65,33 +55,18 @@ QVTimeScope QVTimeScopeForDateZoom(VSDateZoom zoom) {
     return QVTimeScope::Hour;
 }
 
-std::optional<VSDate> QVTimeScopeSpanEnd(QVTimeScope timeScope, VSDate start) {
-    const VSDateComponents length = spanLength(timeScope);
-    if (length.isZero()) return std::nullopt;
-    return VSCalendar::current().add(start, length);
-}
-
 std::optional<QVDateSpan> QVTimeScopeSpan(QVTimeScope timeScope, VSDate anchor, bool noon) {
     const VSCalendar calendar = VSCalendar::current();
-    const auto startOfDay = [&] {
-        return noon ? calendar.yesterdayAtNoon(anchor) : calendar.startOfDay(anchor);
-    };
-    VSDate start;
     switch (timeScope) {
         case QVTimeScope::Day:
-            start = startOfDay();
-            break;
+            return spanOfDays(calendar, anchor, 1, noon);
         case QVTimeScope::Week:
-            start = calendar.addDays(startOfDay(), -6);
-            break;
+            return spanOfDays(calendar, anchor, 7, noon);
         case QVTimeScope::Month:
-            start = calendar.addDays(startOfDay(), -30);
-            break;
+            return spanOfDays(calendar, anchor, 31, noon);
         case QVTimeScope::Year:
-            start = startOfYearSpan(calendar, anchor, noon);
-            break;
+            return spanOfYear(calendar, anchor, noon);
         default:
             return std::nullopt;
     }
-    return QVDateSpan{start, *QVTimeScopeSpanEnd(timeScope, start)};
 }

@@ -32,8 +32,7 @@ struct QVDateSpan {
 };
 
 /// The span that ends with the anchor's day (or month, for the year), in the user's calendar and zone as they
-/// are now. With `noon` its days begin at noon, half a day earlier. The end belongs to the next span, but for
-/// the year, whose end is its last second. None for hour and for what is no time scope.
+/// are now. Each border is the start of its day, whatever the clocks do at midnight. With `noon` its days
+/// begin at noon, half a day earlier. The end belongs to the next span, but for the year, whose end is its
+/// last second. None for hour and for what is no time scope.
 std::optional<QVDateSpan> QVTimeScopeSpan(QVTimeScope timeScope, VSDate anchor, bool noon);
-/// The end of the span that begins at `start`; none as above.
-std::optional<VSDate> QVTimeScopeSpanEnd(QVTimeScope timeScope, VSDate start);

@@ -1,3 +1,5 @@
+#include <rapidcheck.h>
+
 #include "ProviderTestSupport.h"
 #include "Qelvar/DataProviders/QVCountDataProvider.h"
 #include "Qelvar/DataProviders/QVSamplesExistDataProvider.h"
@@ -58,14 +60,59 @@ TEST_F(EventTest, StoodAndIdleHoursStayApart) {
           category(VSCode::ZentroStandHour, 1, "2020-03-14T10:00", "2020-03-14T11:00"),
           category(VSCode::ZentroStandHour, 0, "2020-03-14T11:00", "2020-03-14T12:00")});
     auto provider = this->provider<QVStackedCategoryValueDataProvider>(VSGroupID::StandHours);
+    provider->setProcessAllSamples(true);
     show(*provider, QVTimeScope::Day);
     ASSERT_TRUE(waitUntil([&] { return provider->historicalData().size() >= 4; }));
     const XY points = xy(*provider);
+    EXPECT_EQ(provider->dates(), (std::vector<VSDate>{date("2020-03-14")}));
+    EXPECT_EQ(provider->totalForDate(date("2020-03-14")), 2) << "what was stood";
     for (const auto& [x, y] : points) EXPECT_TRUE(y == 0 || y == 1);
     EXPECT_NE(std::find(points.begin(), points.end(), std::pair(date("2020-03-14T10:00"), 0.0)),
               points.end());
     EXPECT_NE(std::find(points.begin(), points.end(), std::pair(date("2020-03-14T11:00"), 0.0)),
               points.end());
+}
+
+/// Gives its protected intake to tests.
+class OpenTimePeriods : public QVTimePeriodDataProvider {
+ public:
+    using QVTimePeriodDataProvider::nextTicket;
+    using QVTimePeriodDataProvider::QVTimePeriodDataProvider;
+    using QVTimePeriodDataProvider::takeDateTotals;
+};
+
+TEST_F(EventTest, TheLastHourOfADayIsDatedWithinIt) {
+    save({category(VSCode::ZentroStandHour, 0, "2020-03-13T23:00", "2020-03-14T00:00")});
+    auto provider = this->provider<QVStackedCategoryValueDataProvider>(VSGroupID::StandHours);
+    show(*provider, QVTimeScope::Week);
+    ASSERT_TRUE(waitUntil([&] { return provider->currentValue() == 1; }));
+    EXPECT_EQ(provider->lastUpdatedDate(), date("2020-03-13T23:59:59"));
+}
+
+TEST_F(EventTest, InWhateverOrderAnswersArriveTheNewestQuestionsStays) {
+    EXPECT_TRUE(rc::check([this] {
+        auto provider = this->provider<OpenTimePeriods>(VSGroupID::StandHours);
+        provider->setStartDate(date("2020-03-14"), date("2020-03-15"), QVTimeScope::Day);
+        std::vector<QVDataProvider::Ticket> arriving;
+        for (int i = *rc::gen::inRange(2, 6); i > 0; --i) arriving.push_back(provider->nextTicket());
+        const auto last = static_cast<double>(arriving.back());
+        for (size_t i = arriving.size() - 1; i > 0; --i)
+            std::swap(arriving[i], arriving[*rc::gen::inRange<size_t>(0, i + 1)]);
+        for (const auto ticket : arriving) {
+            const auto value = static_cast<double>(ticket);
+            provider->takeDateTotals({{date("2020-03-14"), value}}, ticket);
+            const auto intake = provider->intake();
+            intake.updateHistoricalData({QVChartPointNumeric::chartPoint(date("2020-03-14"), value)},
+                                        QVTimeScope::Day, std::nullopt, {}, ticket);
+            intake.updateAverage(value, {}, {}, QVTimeScope::Day, std::nullopt, {}, ticket);
+            intake.updateCurrentValue(value, date("2020-03-14"), std::nullopt, {}, ticket);
+        }
+        drainMainQueue();
+        RC_ASSERT(provider->totalForDate(date("2020-03-14")) == last);
+        RC_ASSERT(yValues(*provider) == (std::vector<std::optional<double>>{last}));
+        RC_ASSERT(provider->averageValue() == last);
+        RC_ASSERT(provider->currentValue() == last);
+    }));
 }
 
 TEST_F(EventTest, StoodHoursAndWorkoutsInEveryScope) {

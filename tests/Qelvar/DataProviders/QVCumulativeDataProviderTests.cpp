@@ -2,6 +2,7 @@
 
 #include <random>
 
+#include "DaysOfICU.h"
 #include "ProviderTestSupport.h"
 
 using namespace test;
@@ -157,12 +158,53 @@ TEST_F(CumulativeTest, AScopeThatIsLeftKeepsItsPointsAndItsAverageFresh) {
     ASSERT_TRUE(waitUntil([&] { return yValues(*provider)[11] == 60; }));
 }
 
-TEST_F(CumulativeTest, AgreesWithTheDefinitionOnRandomHistories) {
-    // March 2020: the clocks of Copenhagen change on the 29th.
-    environment->setNow(date("2020-03-31T20:00"));
+TEST_F(CumulativeTest, TheWeekBeginsAtTheStartOfItsDayAlsoWhenTheClocksSkipMidnightToday) {
+    environment->setTimeZone("America/Santiago");
+    environment->setNow(date("2025-09-07T12:00"));  // began at 01:00
+    save({steps(1000, "2025-09-01T00:15", "2025-09-01T00:15"),
+          steps(10, "2025-09-01T15:00", "2025-09-01T15:05"),
+          steps(100, "2025-09-03T10:00", "2025-09-03T10:30")});
+    auto provider = makeSteps();
+    show(*provider, QVTimeScope::Week);
+    ASSERT_TRUE(waitUntilLoaded(*provider));
+    EXPECT_EQ(provider->secondaryValueText().plainText(), "Daily Average: 555");
+    const std::optional<double> none;
+    EXPECT_EQ(yValues(*provider),
+              (std::vector<std::optional<double>>{1010, none, 100, none, none, none, none}));
+    EXPECT_EQ(provider->historicalData()[2]->xValue(), date("2025-09-03T12:00"));
+}
+
+TEST_F(CumulativeTest, TheCurrentValueIsDatedWithinItsOwnDay) {
+    save({steps(300, "2020-03-13T10:00", "2020-03-13T10:10"),
+          steps(60, "2020-03-13T23:30", "2020-03-14T00:30")});
+    auto provider = makeSteps();
+    show(*provider, QVTimeScope::Week);
+    ASSERT_TRUE(waitUntil([&] { return provider->hasLoadedCurrentValue(); }));
+    EXPECT_EQ(provider->currentValue(), 330);
+    EXPECT_EQ(provider->lastUpdatedDate(), date("2020-03-13T23:59:59"));
+    // A total of the whole of today is known until now.
+    save({steps(500, "2020-03-14T00:00", "2020-03-15T00:00")});
+    ASSERT_TRUE(waitUntil([&] { return provider->currentValue() == 530; }));
+    EXPECT_EQ(provider->lastUpdatedDate(), environment->now());
+}
+
+class CumulativeInOddZones : public CumulativeTest,
+                             public testing::WithParamInterface<std::pair<const char*, const char*>> {};
+
+// Evenings after days on which the clocks changed, some at midnight.
+INSTANTIATE_TEST_SUITE_P(Zones, CumulativeInOddZones,
+                         testing::Values(std::pair("Europe/Copenhagen", "2020-03-31T20:00"),
+                                         std::pair("America/Santiago", "2025-09-07T20:00"),
+                                         std::pair("America/Havana", "2019-11-03T20:00"),
+                                         std::pair("Pacific/Apia", "2012-01-05T20:00"),
+                                         std::pair("Australia/Lord_Howe", "2019-10-08T20:00")));
+
+TEST_P(CumulativeInOddZones, AgreesWithTheDefinitionOnRandomHistories) {
+    environment->setTimeZone(GetParam().first);
+    environment->setNow(date(GetParam().second));
     std::mt19937 random(20200331);
     std::vector<VSSamplePtr> samples;
-    const VSDate first = date("2020-02-20");
+    const VSDate first = environment->now() - std::chrono::hours(40 * 24);
     for (int i = 0; i < 400; ++i) {
         const VSDate start = first + std::chrono::minutes(random() % (40 * 24 * 60));
         const VSDate end = start + std::chrono::minutes(random() % 300);
@@ -171,7 +213,9 @@ TEST_F(CumulativeTest, AgreesWithTheDefinitionOnRandomHistories) {
     }
     save(samples);
     const VSCalendar calendar = VSCalendar::current();
+    const DaysOfICU icu(GetParam().first);
     const std::pair<QVTimeScope, VSDateComponents> scopes[] = {{QVTimeScope::Day, {.hours = 1}},
+                                                               {QVTimeScope::Week, {.days = 1}},
                                                                {QVTimeScope::Month, {.days = 1}},
                                                                {QVTimeScope::Year, {.months = 1}}};
     for (const auto& [scope, interval] : scopes) {
@@ -193,9 +237,10 @@ TEST_F(CumulativeTest, AgreesWithTheDefinitionOnRandomHistories) {
         const auto span = scope == QVTimeScope::Day
                               ? QVTimeScopeSpan(QVTimeScope::Week, VSEnvironment::current()->now(), false)
                               : QVTimeScopeSpan(scope, VSEnvironment::current()->now(), false);
-        for (VSDate day = span->start; day < span->end; day = calendar.addDays(day, 1)) {
+        for (VSDate day = span->start, next; day < span->end; day = next) {
             bool any = false;
-            sum += oracleTotal(samples, day, calendar.addDays(day, 1), &any);
+            next = icu.startOfDay(day + std::chrono::hours(30));
+            sum += oracleTotal(samples, day, next, &any);
             days += any;
         }
         EXPECT_NEAR(*provider->averageValue(), sum / days, 1e-6 * sum / days);

@@ -21,7 +21,6 @@ class SilentProvider final : public QVDataProvider {
     const char* className() const override { return "SilentProvider"; }
     using QVDataProvider::Answer;
     using QVDataProvider::beginQuery;
-    using QVDataProvider::nextTicket;
     int restarts = 0;
 };
 
@@ -159,13 +158,6 @@ TEST_F(DataProviderTest, ErrorsClearThePointsAndAreLogged) {
 }
 
 TEST_F(DataProviderTest, AnswersNeverGoBackInTime) {
-    const auto early = weight->nextTicket();
-    const auto late = weight->nextTicket();
-    weight->intake().updateCurrentValue(72, date("2020-03-10"), {}, {}, late);
-    weight->intake().updateCurrentValue(71, date("2020-03-09"), {}, {}, early);
-    drainMainQueue();
-    EXPECT_EQ(weight->currentValue(), 72);
-
     // A query that was replaced may still be answering; for another scope it is not replaced.
     const auto replaced = weight->beginQuery(SilentProvider::Answer::Historical, QVTimeScope::Week);
     weight->beginQuery(SilentProvider::Answer::Historical, QVTimeScope::Week);

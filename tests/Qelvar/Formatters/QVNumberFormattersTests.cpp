@@ -117,15 +117,35 @@ TEST_F(QVNumberFormattersTest, EveryDisplayRangeHoldsItsBoundsAndCutsWhatIsBeyon
 
 TEST_F(QVNumberFormattersTest, ChartBoundsUseTheDefaultFormatterUnlessTheTypeHasItsOwn) {
     const auto four = QVNumberFormatterWithFractionDigits(4);
-    const auto bound = [&](int id, double value) {
-        return qv_dashboardChartBoundStringFromValue(group(id), value, *four, *units_).toStdString();
+    const auto bound = [&](int id, double value, QVTimeScope timeScope = QVTimeScope::Week) {
+        return qv_dashboardChartBoundStringFromValue(group(id), timeScope, value, *four, *units_)
+            .toStdString();
     };
+    EXPECT_EQ(bound(VSGroupID::Steps, 800'000, QVTimeScope::Year), "800,000/mo");
+    EXPECT_EQ(bound(VSGroupID::Steps, 0, QVTimeScope::Year), "0");
+    EXPECT_EQ(bound(VSGroupID::Steps, 1500, QVTimeScope::Day), "1,500/hr");
+    EXPECT_EQ(bound(VSGroupID::Workouts, 40, QVTimeScope::Year), "40 hr/mo");
+    EXPECT_EQ(bound(VSGroupID::HeartRate, 90, QVTimeScope::Year), "90") << "no total";
     EXPECT_EQ(bound(VSGroupID::Steps, 1234.5678), "1,234.5678");
     EXPECT_EQ(bound(VSGroupID::SleepAnalysis, 7.5), "7 hr 30 min");
     const auto range = units_->displayRangeForDataUnit(group(VSGroupID::HeartRate)->anyDataUnit());
     ASSERT_TRUE(range && range->maximum);
     EXPECT_EQ(bound(VSGroupID::HeartRate, *range->maximum + 1),
               ">" + four->stringFromNumber(*range->maximum).toStdString());
+}
+
+TEST_F(QVNumberFormattersTest, AnAmountThatIsThereIsNeverNone) {
+    const auto text = [&](int id, double value) {
+        const VSDataUnit* unit = group(id)->anyDataUnit();
+        return (QVStringFromNumberInDisplayRange(value, unit, *units_, true) + " " +
+                units_->displayNameForDataUnit(unit, value))
+            .toStdString();
+    };
+    EXPECT_EQ(text(VSGroupID::FlightsClimbed, 0), "0 floors");
+    EXPECT_EQ(text(VSGroupID::FlightsClimbed, 0.08), "<1 floor");
+    EXPECT_EQ(text(VSGroupID::FlightsClimbed, 0.5), "<1 floor");
+    EXPECT_EQ(text(VSGroupID::FlightsClimbed, 0.92), "1 floor");
+    EXPECT_EQ(text(VSGroupID::WalkingRunningDistance, 0.001), "<0.01 mi");
 }
 
 TEST_F(QVNumberFormattersTest, EnumeratedLabels) {
