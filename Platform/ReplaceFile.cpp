@@ -41,7 +41,8 @@ class File {
 };
 
 bool writeNewFile(const fs::path& path, std::string_view text, bool durable) {
-    const File file(path, O_WRONLY | O_CREAT | O_TRUNC, 0600);
+    unlink(path.c_str());  // what a killed process of the same number had, or a link that leads elsewhere
+    const File file(path, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW, 0600);
     return file.ok() && file.writeAll(text) && (!durable || file.sync());
 }
 

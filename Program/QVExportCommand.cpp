@@ -1,3 +1,4 @@
+#include <signal.h>
 #include <unistd.h>
 
 #include <chrono>
@@ -16,12 +17,6 @@ namespace {
 
 namespace fs = std::filesystem;
 constexpr auto kProgressInterval = std::chrono::milliseconds(100);
-
-/// The folder beside the target in which the files are while they are made: on the same disk, so that the
-/// archive takes its name at once and as a whole.
-fs::path workFolder(const fs::path& target) {
-    return target.parent_path() / ("." + target.filename().string() + ".export");
-}
 
 VSResult<QVExportUnits> preferredUnits(VSHealthStore& store) {
     auto answer = std::make_shared<std::promise<VSResult<std::optional<VSValue>>>>();
@@ -90,52 +85,73 @@ VSStatus printCounts(const QVExportManager& manager) {
     return output.finish();
 }
 
+/// The place that --to names, as far as nothing else than an archive of this program would be lost there.
+VSResult<QVExportTarget> targetOf(const QVCommandContext& context, const fs::path& given) {
+    auto target = QVExportTarget::open(given, context.storeFolder);
+    if (!target) return target;
+    if (context.arguments.has("replace")) target->allowReplacing();
+    if (target->holdsSomethingElse() && !context.arguments.has("replace"))
+        return VSError{VSErrorCode::Refused,
+                       target->path().string() +
+                           " is there already and is no export of this program; --replace writes over it"};
+    return target;
+}
+
+/// Makes the archive in a folder beside the target, on the same disk, so that it takes its name at once and
+/// as a whole.
+VSStatus exportTo(QVExportTarget& target, const std::shared_ptr<VSHealthStore>& store,
+                  const QVExportUnits& units, bool rows) {
+    const auto folder = target.makeWorkFolder();
+    if (!folder) return folder.error();
+    QVExportManager manager({store, (*folder)->path(), {}, [&units] { return units; }, *folder});
+    const auto archive = [&] {
+        const ProgressLine line(rows);
+        return exportAll(manager, line);
+    }();
+    if (!archive) return archive.error();
+    if (VSStatus status = target.take(**folder, archive->filename().string()); !status) return status;
+    return printCounts(manager);
+}
+
 QVExitStatus run(const QVCommandContext& context) {
     if (!context.arguments.words().empty()) return QVFailUsage("export", "export takes no words");
     const auto given = context.arguments.value("to");
     if (!given || given->empty()) return QVFailUsage("export", "--to FILE.zip must say where to");
     QVCatchInterruptions(QVSecondInterruption::IsIgnored);
-    const auto target = QVExportTargetFile(*given);
+    signal(SIGPIPE, SIG_IGN);  // whoever reads the progress may go; the archive is still wanted
+    auto target = targetOf(context, *given);
     if (!target) return QVFail(target.error());
     const auto store = QVOpenStoreForReading(context.storeFolder);
     if (!store) return QVFail(store.error());
     const auto units = preferredUnits(**store);
     if (!units) return QVFail(units.error());
-
-    const fs::path folder = workFolder(*target);
-    QVExportManager manager({*store, folder, {}, [&units] { return *units; }});
-    const auto archive = [&] {
-        const ProgressLine line(context.arguments.has("progress"));
-        return exportAll(manager, line);
-    }();
-    VSStatus status = archive ? QVMoveExportArchive(*archive, *target) : VSStatus(archive.error());
-    manager.cleanupExportFiles();
-    if (status || !status.error().isHeldByOthers) rmdir(folder.c_str());
-    if (status) status = printCounts(manager);
+    const VSStatus status = exportTo(*target, *store, *units, context.arguments.has("progress"));
     if (status) return QVExitStatus::Success;
     if (status.error().code != VSErrorCode::Cancelled) return QVFail(status.error());
     QVPrintError(status.error().message);
     return static_cast<QVExitStatus>(QVInterruptedExitStatus());
 }
 
-constexpr QVCommandOption kOptions[] = {{"to", true}, {"progress", false}};
+constexpr QVCommandOption kOptions[] = {{"to", true}, {"replace", false}, {"progress", false}};
 
 }  // namespace
 
 const QVCommand QVExportCommand{"export", "write all records into an archive",
-                                R"(Usage: qelvar export --to FILE.zip [--progress]
+                                R"(Usage: qelvar export --to FILE.zip [--replace] [--progress]
 
 Writes everything that the store holds at one moment into an archive of two documents: export.xml, the records, which
 `qelvar import` reads, and export_cda.xml, a clinical document with the vital signs and results. Values are in the
 units that the application shows. The store may be used meanwhile; what is saved meanwhile is not in it.
 
 The archive appears under its name, in the place of an older one, only when it is complete; only its owner may read
-it. An export that fails or is interrupted (Ctrl+C) leaves nothing; of one that was killed the next to the same file
-removes what is left (the folder .FILE.zip.export beside it).
+it. Another file than an empty one or such an archive is replaced only with --replace; a store never is, and nothing
+is written into its folder. An export that fails or is interrupted (Ctrl+C) leaves nothing; of one that was killed the
+next export into the same folder removes what is left (a folder .qelvar-export-... beside the target).
 
 Standard output: type, records; a row for each type and a row "total".
 
   --to FILE.zip   where to
+  --replace       also in the place of a file that is no export of this program
   --progress      write progress as rows to standard error (type, records, records_total, bytes_packed, bytes_total);
                   without it a line of progress is shown when standard error is a terminal
 )",

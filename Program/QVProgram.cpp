@@ -1,5 +1,7 @@
 #include "Program/QVProgram.h"
 
+#include <unistd.h>
+
 #include <algorithm>
 #include <charconv>
 #include <cstdio>
@@ -8,7 +10,9 @@
 #include "Platform/Appearance.h"
 #include "Platform/TextScale.h"
 #include "Qelvar/App/QVApplication.h"
+#include "Qelvar/App/QVPictureFolder.h"
 #include "Vessa/Base/VSEnvironment.h"
+#include "Vessa/VSStoreGuard.h"
 
 namespace {
 
@@ -53,9 +57,10 @@ TYPE is an identifier with or without its prefix: HeartRate, VSQuantityTypeIdent
 Output is tab-separated with a header line; times are ISO 8601 with their offset, numbers read back as the same
 numbers. In a field \t, \n, \r and \\ stand for tab, line ends and backslash. Errors go to standard error.
 
-Exit status: 0 done; 1 failed (input or output, other trouble of the system); 2 wrong command line; 3 not found (file, type, store);
-4 invalid (a document or value that cannot be accepted); 5 refused (not permitted, or a store of a newer version);
-6 the store is locked or cannot be reached now; 7 the store is damaged; 8 the disk is full; 130 interrupted (143 by SIGTERM).
+Exit status: 0 done; 1 failed (input or output, a disk for reading only, other trouble of the system); 2 wrong command line;
+3 not found (file, folder, type, store); 4 invalid (a document, value or name that cannot be accepted); 5 refused (not permitted,
+a target in a store, a file that would be lost, or a store of a newer version); 6 the store is locked or cannot be reached now;
+7 the store is damaged; 8 the disk is full; 130 interrupted (143 by SIGTERM).
 )";
 
 void printHelp() {
@@ -93,6 +98,22 @@ std::filesystem::path storeFolder(const std::optional<std::string>& given, bool 
     return given ? std::filesystem::path(*given) : QVStoreFolder(demo);
 }
 
+/// No store is made in another's folder, and what is printed must not go into a store's file, as `1<>FILE`
+/// and
+/// `>>FILE` would have it. (Reading one would take SQLite's locks on it when it is closed.)
+VSStatus checkPlaces(const std::filesystem::path& store) {
+    const VSStoreGuard guard(store);
+    if (VSStatus status = guard.checkOpenFile(STDERR_FILENO, "standard error"); !status) return status;
+    if (VSStatus status = guard.checkOpenFile(STDIN_FILENO, "standard input"); !status) return status;
+    if (VSStatus status = guard.checkOpenFile(STDOUT_FILENO, "standard output"); !status) return status;
+    return VSStoreGuard::checkNewStore(store);
+}
+
+/// The refusal, too, must not be printed into a store.
+QVExitStatus refusePlaces(const VSError& error, const std::filesystem::path& store) {
+    return VSStoreGuard(store).checkOpenFile(STDERR_FILENO, {}) ? QVFail(error) : QVExitStatusForError(error);
+}
+
 QVExitStatus runCommand(const QVCommand& command, const QVCommandArguments& program) {
     std::vector<QVCommandOption> options(std::begin(kCommonOptions), std::end(kCommonOptions));
     options.insert(options.end(), command.options.begin(), command.options.end());
@@ -105,8 +126,9 @@ QVExitStatus runCommand(const QVCommand& command, const QVCommandArguments& prog
     }
     if (const VSStatus status = installClock(commonValue("now", program, *arguments)); !status)
         return QVFailUsage(command.name, status.error().message);
-    return command.run(
-        {*arguments, storeFolder(commonValue("store", program, *arguments), program.has("demo"))});
+    const auto store = storeFolder(commonValue("store", program, *arguments), program.has("demo"));
+    if (const VSStatus status = checkPlaces(store); !status) return refusePlaces(status.error(), store);
+    return command.run({*arguments, store});
 }
 
 /// "375x667"; none when it is not of this form.
@@ -151,6 +173,13 @@ QVExitStatus runApplication(char* program, const QVCommandArguments& arguments) 
     if (const VSStatus status = installClock(arguments.value("now")); !status)
         return QVFailUsage({}, status.error().message);
     options.store = storeFolder(arguments.value("store"), options.demo);
+    if (const VSStatus status = checkPlaces(options.store); !status)
+        return refusePlaces(status.error(), options.store);
+    if (options.screenshots) {
+        // Before the store is opened, which may make one.
+        const auto folder = QVPictureFolder::open(*options.screenshots, options.store);
+        if (!folder) return QVFail(folder.error());
+    }
     char* argv[] = {program, nullptr};
     return static_cast<QVExitStatus>(QVRunApplication(1, argv, options));
 }

@@ -30,7 +30,7 @@ const QVCommand QVSalvageCommand{"salvage", "make a sound store of what can be r
                                  R"(Usage: qelvar salvage --to DIR [--store DIR]
 
 Reads what can be read of the store, also of one that cannot be opened any more, and makes a sound store of it
-in the folder DIR, which must not hold one yet. The damaged store is not changed. No other program may have it
+in the folder DIR, which must not hold one yet nor be in another's folder. The damaged store is not changed. No other program may have it
 open. There must be room for the store twice.
 Standard output: store (the new folder), samples (that are in it), lost (how many could not be read; empty when
 that cannot be told). Each loss is a line on standard error.

@@ -65,6 +65,34 @@ bool isWithoutRoom(int reason) {
     return reason == EDQUOT || reason == EFBIG || reason == ENOSPC;
 }
 
+VSErrorCode codeOfSystem(int reason) {
+    if (isWithoutRoom(reason)) return VSErrorCode::DiskFull;
+    switch (reason) {
+        case ENOENT:
+            return VSErrorCode::NotFound;
+        case EACCES:
+        case EPERM:
+            return VSErrorCode::Refused;
+        case EISDIR:
+        case ELOOP:
+        case ENAMETOOLONG:
+        case ENOTDIR:
+            return VSErrorCode::Invalid;
+        case EAGAIN:
+        case EBUSY:
+        case EMFILE:
+        case ENFILE:
+        case ENOLCK:
+        case ENOMEM:
+        case ESTALE:
+        case ETIMEDOUT:
+        case ETXTBSY:
+            return VSErrorCode::NotAccessible;
+        default:  // a file system that can only be read (EROFS), a broken disk (EIO) ...
+            return VSErrorCode::Failed;
+    }
+}
+
 bool isHeld(int code) {
     return (code & 0xff) == SQLITE_BUSY || (code & 0xff) == SQLITE_LOCKED || (code & 0xff) == SQLITE_PROTOCOL;
 }
@@ -89,8 +117,7 @@ bool isFullDisk(int code, int reason) {
 }  // namespace
 
 VSError VSErrorFromSystem(int reason, const std::string& what) {
-    return {isWithoutRoom(reason) ? VSErrorCode::DiskFull : VSErrorCode::NotAccessible,
-            what + ": " + std::strerror(reason)};
+    return {codeOfSystem(reason), what + ": " + std::strerror(reason)};
 }
 
 VSError VSErrorFromDatabaseCode(int code, const std::string& detail) {

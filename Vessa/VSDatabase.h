@@ -144,8 +144,8 @@ class VSTransaction {
     bool open_ = true;
 };
 
-/// The error of a failed call of the system: DiskFull where there is no room (also by a quota or a limit of
-/// the file's size), else NotAccessible. `reason` is its errno.
+/// The error of a failed call of the system: DiskFull, NotFound, Refused (no permission), Invalid (the name),
+/// NotAccessible (later it may work) or Failed (any other: only for reading, broken). `reason`: its errno.
 VSError VSErrorFromSystem(int reason, const std::string& what);
 /// The error of an SQLite result code.
 VSError VSErrorFromDatabaseCode(int code, const std::string& detail);

@@ -17,8 +17,10 @@
 #include "Vessa/VSRollup.h"
 #include "Vessa/VSSalvageCopy.h"
 #include "Vessa/VSSalvageReader.h"
+#include "Vessa/VSStoreGuard.h"
 #include "Vessa/VSStoreMatcher.h"
 #include "Vessa/VSStoreSchema.h"
+#include "Vessa/VSWorkFolder.h"
 
 namespace {
 
@@ -28,25 +30,34 @@ using Table = VSSalvageTable;
 constexpr VSDuration patience = std::chrono::seconds(10);
 constexpr const char* recoveredName = "Recovered";
 
+constexpr const char* workName = "salvage.unfinished";
+
+template <typename T>
+T valueOf(VSResult<T> result) {
+    if (!result) throw VSDatabaseFailure(result.error());
+    return std::move(*result);
+}
+
 /// The folder in which a salvage works; goes with everything in it.
 class WorkFolder {
  public:
-    explicit WorkFolder(const fs::path& path) : path_(path) {
-        std::error_code error;
-        fs::remove_all(path_, error);  // what a killed salvage left
-        if (::mkdir(path_.c_str(), 0700) != 0)
-            throw VSDatabaseFailure(VSErrorFromSystem(errno, path_.string() + " cannot be made"));
+    /// `target`: the folder in which it is made, open.
+    WorkFolder(int target, const fs::path& path)
+        : target_(target), folder_(valueOf(VSWorkFolder::open(workName, target, path / workName))) {
+        folder_.removeAll();  // what a killed salvage left
     }
     ~WorkFolder() {
-        std::error_code error;
-        fs::remove_all(path_, error);
+        folder_.removeAll();
+        ::unlinkat(target_, workName, AT_REMOVEDIR);
     }
     WorkFolder(const WorkFolder&) = delete;
     WorkFolder& operator=(const WorkFolder&) = delete;
-    const fs::path& path() const { return path_; }
+    const fs::path& path() const { return folder_.path(); }
+    int descriptor() const { return folder_.descriptor(); }
 
  private:
-    const fs::path path_;
+    const int target_;
+    const VSWorkFolder folder_;
 };
 
 void bindField(VSStatement& statement, int index, const VSPageField& field) {
@@ -486,21 +497,6 @@ class Salvage {
     int64_t withoutDevice_ = 0;
 };
 
-/// True: it was made now.
-bool makeTarget(const fs::path& folder) {
-    std::error_code error;
-    for (const char* suffix : {"", "-wal", "-journal"}) {
-        if (fs::exists((folder / VSStoreSchema::fileName).string() + suffix, error))
-            throw VSDatabaseFailure(
-                {VSErrorCode::Refused, folder.string() + " holds a store; name an empty or new folder"});
-    }
-    if (fs::is_directory(folder, error)) return false;
-    if (folder.has_parent_path()) fs::create_directories(folder.parent_path(), error);
-    if (::mkdir(folder.c_str(), 0700) != 0)
-        throw VSDatabaseFailure(VSErrorFromSystem(errno, folder.string() + " cannot be made"));
-    return true;
-}
-
 /// Another program's database, or a newer store: as far as a head that may be damaged can say.
 void refuseStrangers(const fs::path& copy, const fs::path& file, const VSSalvageReader& reader) {
     int64_t identity = 0, version = 0;
@@ -524,9 +520,26 @@ void refuseStrangers(const fs::path& copy, const fs::path& file, const VSSalvage
     throw VSDatabaseFailure({VSErrorCode::Corrupt, "nothing of a store can be found in " + file.string()});
 }
 
-VSSalvageReport salvageInto(const fs::path& folder, const fs::path& file) {
+/// Gives the new store its place, which nobody else may have taken meanwhile.
+void putInPlace(int from, int target, const fs::path& folder) {
+    const std::string made = std::string("made/") + VSStoreSchema::fileName;
+    const auto rename = [&](unsigned flags) {
+        return ::renameat2(from, made.c_str(), target, VSStoreSchema::fileName, flags) == 0;
+    };
+    bool isPlaced = rename(RENAME_NOREPLACE);
+    // Not every file system can make sure of that.
+    struct stat status {};
+    if (!isPlaced && (errno == EINVAL || errno == ENOSYS) &&
+        ::fstatat(target, VSStoreSchema::fileName, &status, AT_SYMLINK_NOFOLLOW) != 0)
+        isPlaced = rename(0);
+    if (!isPlaced) throw VSDatabaseFailure(VSErrorFromSystem(errno, folder.string()));
+    ::fsync(target);
+}
+
+/// `target` is the folder, open.
+VSSalvageReport salvageInto(int target, const fs::path& folder, const fs::path& file) {
     std::error_code error;
-    const WorkFolder work(folder / "salvage.unfinished");
+    const WorkFolder work(target, folder);
     const fs::path copy = work.path() / "damaged.sqlite", layout = work.path() / "layout",
                    made = work.path() / "made";
     VSCopyForSalvage(file, copy);
@@ -547,13 +560,7 @@ VSSalvageReport salvageInto(const fs::path& folder, const fs::path& file) {
         throw VSDatabaseFailure(
             {fs::space(folder, error).available < (16 << 20) ? VSErrorCode::DiskFull : VSErrorCode::Failed,
              folder.string() + ": the new store could not be completed"});
-    fs::rename(made / VSStoreSchema::fileName, folder / VSStoreSchema::fileName, error);
-    if (error) throw VSDatabaseFailure(VSErrorFromSystem(error.value(), folder.string()));
-    const int descriptor = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (descriptor >= 0) {
-        ::fsync(descriptor);
-        ::close(descriptor);
-    }
+    putInPlace(work.descriptor(), target, folder);
     return report;
 }
 
@@ -564,11 +571,13 @@ VSSalvageReport VSSalvageStore(const fs::path& damaged, const fs::path& folder) 
     std::error_code error;
     if (!fs::exists(file, error) && !fs::exists(file.string() + "-wal", error))
         throw VSDatabaseFailure({VSErrorCode::NotAccessible, "there is no store in " + damaged.string()});
-    const bool isNew = makeTarget(folder);
+    bool isNew = false;
+    const auto place = valueOf(VSResolvedPath(folder));
+    const auto target = valueOf(VSStoreGuard(damaged).makeFolder(place, 0700, &isNew));
     try {
-        return salvageInto(folder, file);
+        return salvageInto(target.get(), place, file);
     } catch (const VSDatabaseFailure&) {
-        if (isNew) ::rmdir(folder.c_str());
+        if (isNew) ::rmdir(place.c_str());
         throw;
     }
 }

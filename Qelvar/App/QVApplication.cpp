@@ -127,6 +127,14 @@ void finishDemoData(QVAppDelegate& app) {
         QCoreApplication::processEvents(QEventLoop::AllEvents | QEventLoop::WaitForMoreEvents, 50);
 }
 
+bool takePictures(QQuickView& window, QVAppDelegate& app, const QVApplicationOptions& options) {
+    auto folder =
+        QVPictureFolder::open(*options.screenshots, app.controllerManager()->healthStore()->folder());
+    if (folder) return QVScreenshots(window, app, std::move(*folder)).takeAll();
+    std::fprintf(stderr, "qelvar: %s\n", folder.error().message.c_str());
+    return false;
+}
+
 int runWindow(QGuiApplication& application, QVAppDelegate& app, const QVApplicationOptions& options) {
     app.willFinishLaunching();
     QVStartupTrace::note("controllers");
@@ -142,7 +150,7 @@ int runWindow(QGuiApplication& application, QVAppDelegate& app, const QVApplicat
     app.didFinishLaunching();
     window.show();
     QVStartupTrace::watch(window);
-    if (options.screenshots) return QVScreenshots(window, app, *options.screenshots).takeAll() ? 0 : 1;
+    if (options.screenshots) return takePictures(window, app, options) ? 0 : 1;
 
     QObject::connect(&application, &QGuiApplication::applicationStateChanged, &app,
                      [&app](Qt::ApplicationState state) {
@@ -166,7 +174,8 @@ std::filesystem::path stateFile(const std::filesystem::path& folder, const QVApp
 
 /// Says in a window what keeps the application from starting, for those who did not start it from a terminal;
 /// or in a picture.
-void showStartFailure(const QString& message, const QVApplicationOptions& options) {
+void showStartFailure(const QString& message, const QVApplicationOptions& options,
+                      const std::filesystem::path& store) {
     const auto window = messageWindow(options, platform::localized("START_FAILED_TITLE"), message,
                                       platform::localized("CLOSE"));
     QObject::connect(window->engine(), &QQmlEngine::quit, &QGuiApplication::quit);
@@ -174,9 +183,10 @@ void showStartFailure(const QString& message, const QVApplicationOptions& option
         QGuiApplication::exec();
         return;
     }
-    std::error_code ignored;
-    std::filesystem::create_directories(*options.screenshots, ignored);
-    window->grabWindow().save(QString::fromStdString((*options.screenshots / "start-failure.png").string()));
+    const auto folder = QVPictureFolder::open(*options.screenshots, store);
+    const VSStatus saved =
+        folder ? folder->save(window->grabWindow(), "start-failure.png") : VSStatus(folder.error());
+    if (!saved) std::fprintf(stderr, "qelvar: %s\n", saved.error().message.c_str());
 }
 
 }  // namespace
@@ -218,7 +228,7 @@ int QVRunApplication(int argc, char** argv, const QVApplicationOptions& options)
         std::string message = store.error().message;
         if (store.error().code == VSErrorCode::Corrupt)
             message += "\n\n`qelvar salvage` in a terminal may save what can be read.";
-        showStartFailure(QString::fromStdString(message), options);
+        showStartFailure(QString::fromStdString(message), options, folder);
         return 1;
     }
     QVStartupTrace::note("store open");

@@ -44,6 +44,32 @@ QString reasonText(const VSError& error) {
     return {};
 }
 
+/// Why the archive could not be saved, with what to do about it; null: the error itself says it. It waits.
+const char* saveFailureKey(const VSError& error, const fs::path& target, const fs::path& store) {
+    switch (error.code) {
+        case VSErrorCode::NotFound:
+            return "EXPORT_NO_FOLDER";
+        case VSErrorCode::Invalid:
+            return "EXPORT_BAD_NAME";
+        case VSErrorCode::Failed:
+            return "EXPORT_NOT_WRITABLE";
+        case VSErrorCode::Refused:
+            return QVExportTarget::isInStore(target, store) ? "EXPORT_IN_STORE" : "EXPORT_NOT_PERMITTED";
+        default:
+            return nullptr;
+    }
+}
+
+/// Whether the name says that the file is a zip archive.
+bool isNamedAsArchive(const fs::path& file) {
+    return QFile::decodeName(file.extension().c_str()).compare(QLatin1String(".zip"), Qt::CaseInsensitive) ==
+           0;
+}
+
+QString fileNameText(const fs::path& file) {
+    return QFile::decodeName(file.filename().c_str());
+}
+
 fs::path fileIn(const QUrl& folder, const QString& name) {
     return fs::path(QFile::encodeName(folder.toLocalFile()).toStdString()) /
            QFile::encodeName(name).toStdString();
@@ -106,6 +132,8 @@ QString QVExportController::title() const {
         case State::Sharing:
         case State::Saving:
             return localized("EXPORT_SHARE_TITLE");
+        case State::Asking:
+            return localized("EXPORT_SAVE_TITLE");
         default:
             return localized("EXPORT_TITLE");
     }
@@ -121,6 +149,9 @@ QString QVExportController::message() const {
             return sharingText();
         case State::Saving:
             return localized("EXPORT_SAVING");
+        case State::Asking:
+            return localized(question_ == Consent::Replacing ? "EXPORT_ASK_REPLACE" : "EXPORT_ASK_NAME",
+                             {fileNameText(chosenFile_)});
         case State::Failed: {
             const QString reason = error_ ? reasonText(*error_) : QString();
             return localized("EXPORT_NO_DATA") + (reason.isEmpty() ? QString() : QLatin1Char('\n') + reason);
@@ -144,11 +175,7 @@ QString QVExportController::stepText() const {
 }
 
 QString QVExportController::sharingText() const {
-    if (error_) {
-        const QString reason = reasonText(*error_);
-        return localized("EXPORT_SAVE_FAILED",
-                         {reason.isEmpty() ? QString::fromStdString(error_->message) : reason});
-    }
+    if (error_) return localized("EXPORT_SAVE_FAILED", {saveFailure_});
     if (savedFile_) return localized("EXPORT_SAVED", {QFile::decodeName(savedFile_->c_str())});
     return localized("EXPORT_SHARE_MESSAGE");
 }
@@ -174,6 +201,8 @@ std::vector<QVExportController::Button> QVExportController::buttons() {
             return {{"TRANSFER_PUT_ASIDE", [this] { putAside(); }}, {"CANCEL", [this] { cancel(); }}};
         case State::Failed:
             return {{"OK", [this] { close(); }}};
+        case State::Asking:
+            return questionButtons();
         case State::Sharing:
             break;
         default:
@@ -197,6 +226,16 @@ std::vector<QVExportController::Button> QVExportController::buttons() {
     return buttons;
 }
 
+std::vector<QVExportController::Button> QVExportController::questionButtons() {
+    const Button cancel{"CANCEL", [this] { leave(); }};
+    const auto file = chosenFile_;
+    if (question_ == Consent::Replacing)
+        return {cancel, {"EXPORT_REPLACE", [this, file] { save(file, true); }}};
+    return {{"EXPORT_ADD_ZIP", [this, file] { save(fs::path(file).concat(".zip"), false); }},
+            {"EXPORT_KEEP_NAME", [this, file] { save(file, false); }},
+            cancel};
+}
+
 QStringList QVExportController::buttonTitles() const {
     QStringList titles;
     for (const Button& button : const_cast<QVExportController*>(this)->buttons())
@@ -218,6 +257,7 @@ void QVExportController::pressButton(int index) {
 }
 
 void QVExportController::leave() {
+    if (state_ == State::Asking) return setState(State::Sharing);
     const bool wouldBeLost = state_ == State::Sharing && !savedFile_;
     if (isWorking() || state_ == State::Canceling || wouldBeLost)
         putAside();
@@ -265,7 +305,7 @@ void QVExportController::chooseSaveFile() {
     const auto answered = [this, alive = std::weak_ptr<bool>(alive_)](platform::ShareServices::Choice choice,
                                                                       const fs::path& file) {
         if (alive.expired() || state_ != State::Sharing) return;
-        if (choice == platform::ShareServices::Choice::Chosen) save(file);
+        if (choice == platform::ShareServices::Choice::Chosen) choose(file);
         if (choice == platform::ShareServices::Choice::Unavailable) emit saveDialogRequested();
     };
     shareServices_.chooseSaveFile(saveTitle(), suggestedName(), answered);
@@ -277,27 +317,52 @@ bool QVExportController::fileExists(const QUrl& folder, const QString& name) {
 }
 
 void QVExportController::saveIn(const QUrl& folder, const QString& name) {
-    if (state_ == State::Sharing && !name.isEmpty()) save(fileIn(folder, name));
+    if (state_ == State::Sharing && !name.isEmpty()) choose(fileIn(folder, name));
 }
 
-void QVExportController::save(const fs::path& target) {
+void QVExportController::choose(const fs::path& target) {
     error_.reset();
     savedFile_.reset();
+    if (isNamedAsArchive(target))
+        save(target, false);
+    else
+        ask(Consent::OtherName, target);
+}
+
+void QVExportController::ask(Consent question, const fs::path& target) {
+    question_ = question;
+    chosenFile_ = target;
+    setState(State::Asking);
+    platform::announce(message());
+}
+
+void QVExportController::save(const fs::path& target, bool mayReplace) {
+    chosenFile_ = target;
     cancelSaving_ = std::make_shared<std::atomic<bool>>(false);
     setState(State::Saving);
-    worker_->async([this, target, cancel = cancelSaving_,
+    worker_->async([this, target, mayReplace, cancel = cancelSaving_,
+                    store = controllerManager_->healthStore()->folder(),
                     archive = source_->itemForActivityType(QVExportSource::Activity::Save)] {
-        const auto file = QVExportTargetFile(target);
-        const VSStatus status = file ? QVCopyExportArchive(archive, *file, *cancel) : VSStatus(file.error());
-        onMain([this, target, status] { saved(target, status); });
+        auto file = QVExportTarget::open(target, store);
+        if (file && file->holdsSomethingElse() && !mayReplace && !*cancel)
+            return onMain([this, target] { ask(Consent::Replacing, target); });
+        if (file && mayReplace) file->allowReplacing();
+        const VSStatus status = file ? file->takeCopy(archive, *cancel) : VSStatus(file.error());
+        const char* const key = status ? nullptr : saveFailureKey(status.error(), target, store);
+        onMain([this, target, status, key] { saved(target, status, key); });
     });
 }
 
-void QVExportController::saved(const fs::path& target, const VSStatus& status) {
-    if (status)
+void QVExportController::saved(const fs::path& target, const VSStatus& status, const char* failureKey) {
+    if (status) {
         savedFile_ = target;
-    else if (status.error().code != VSErrorCode::Cancelled)
+    } else if (status.error().code != VSErrorCode::Cancelled) {
         error_ = status.error();
+        const QString reason = reasonText(*error_);
+        saveFailure_ = !reason.isEmpty() ? reason
+                       : failureKey      ? localized(failureKey)
+                                         : QString::fromStdString(error_->message);
+    }
     setState(State::Sharing);
     platform::announce(isAside() ? title() + QLatin1Char('\n') + message() : message());
 }

@@ -24,7 +24,7 @@ class QVExportController : public QVTransferController {
     Q_PROPERTY(QString saveTitle READ saveTitle NOTIFY changed)
     Q_PROPERTY(QString suggestedName READ suggestedName NOTIFY changed)
  public:
-    enum class State { Idle, Verifying, Preparing, Canceling, Sharing, Saving, Failed };
+    enum class State { Idle, Verifying, Preparing, Canceling, Sharing, Asking, Saving, Failed };
     Q_ENUM(State)
 
     explicit QVExportController(std::shared_ptr<QVControllerManager> controllerManager,
@@ -71,8 +71,15 @@ class QVExportController : public QVTransferController {
     void close();
     void ended(const VSResult<std::filesystem::path>& archive);
     void chooseSaveFile();
-    void save(const std::filesystem::path& target);
-    void saved(const std::filesystem::path& target, const VSStatus& status);
+    /// What is not to be done unasked when the archive is saved.
+    enum class Consent { None, OtherName, Replacing };
+    /// Asks where a consent is missing, else saves.
+    void choose(const std::filesystem::path& target);
+    void ask(Consent question, const std::filesystem::path& target);
+    void save(const std::filesystem::path& target, bool mayReplace);
+    /// `failureKey`: of the text that says why not; null: the error says it.
+    void saved(const std::filesystem::path& target, const VSStatus& status, const char* failureKey);
+    std::vector<Button> questionButtons();
     void cleanUpExport();
     QString stepText() const;
     QString sharingText() const;
@@ -85,7 +92,10 @@ class QVExportController : public QVTransferController {
     bool userCancelled_ = false;
     std::optional<QVExportSource> source_;            // while an archive is shared
     std::optional<std::filesystem::path> savedFile_;  // where it was saved last
+    Consent question_ = Consent::None;                // while something is asked
+    std::filesystem::path chosenFile_;                // about which it is asked
     std::optional<VSError> error_;                    // of the export, or of the last saving
+    QString saveFailure_;                             // why, when it is of the saving
     std::unique_ptr<platform::BackgroundTask> backgroundTask_;
     QTimer progressTimer_;
     std::shared_ptr<std::atomic<bool>> cancelSaving_;

@@ -29,16 +29,10 @@ QList<QVDashboardTableViewCell*> QVCardsInScene(QQuickItem* root) {
     return cards;
 }
 
-QVScreenshots::QVScreenshots(QQuickView& window, QVAppDelegate& app, std::filesystem::path folder)
+QVScreenshots::QVScreenshots(QQuickView& window, QVAppDelegate& app, QVPictureFolder folder)
     : window_(window), app_(app), folder_(std::move(folder)) {}
 
 bool QVScreenshots::takeAll() {
-    std::error_code error;
-    std::filesystem::create_directories(folder_, error);
-    if (error) {
-        std::fprintf(stderr, "qelvar: %s: %s\n", folder_.c_str(), error.message().c_str());
-        return false;
-    }
     if (!takeDashboard()) return false;
     const char* const names[] = {"", "health-data", "sources", "medical-id"};
     for (int index = 1; index < app_.tabBarController()->count(); ++index)
@@ -114,9 +108,7 @@ bool QVScreenshots::waitForCards() {
 }
 
 bool QVScreenshots::take(const QString& name) {
-    const QImage picture = window_.grabWindow();
-    const std::filesystem::path file = folder_ / (name + QStringLiteral(".png")).toStdString();
-    if (!picture.isNull() && picture.save(QString::fromStdString(file.string()))) return true;
-    std::fprintf(stderr, "qelvar: %s could not be written\n", file.c_str());
-    return false;
+    const VSStatus saved = folder_.save(window_.grabWindow(), (name + QStringLiteral(".png")).toStdString());
+    if (!saved) std::fprintf(stderr, "qelvar: %s\n", saved.error().message.c_str());
+    return saved.ok();
 }

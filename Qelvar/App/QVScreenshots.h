@@ -1,10 +1,10 @@
 #pragma once
 
 #include <QQuickView>
-#include <filesystem>
 #include <functional>
 
 #include "Qelvar/App/QVAppDelegate.h"
+#include "Qelvar/App/QVPictureFolder.h"
 
 /// Draws the window in every tab and time scope into PNG files: "dashboard-week.png",
 /// "dashboard-week-full.png" (as high as all its cards), "dashboard-empty.png", "display-type.png",
@@ -12,7 +12,7 @@
 /// data and stands still. Main thread only.
 class QVScreenshots {
  public:
-    QVScreenshots(QQuickView& window, QVAppDelegate& app, std::filesystem::path folder);
+    QVScreenshots(QQuickView& window, QVAppDelegate& app, QVPictureFolder folder);
     /// Runs the event loop while it waits. False, with the reason on standard error, when a file cannot be
     /// written or something has not come to rest within a minute.
     bool takeAll();
@@ -26,7 +26,7 @@ class QVScreenshots {
 
     QQuickView& window_;
     QVAppDelegate& app_;
-    const std::filesystem::path folder_;
+    const QVPictureFolder folder_;
 };
 
 /// The cards in the scene beneath an item.

@@ -51,7 +51,7 @@ QVClinicalSection QVClinicalSectionForType(const VSObjectType* type) {
     return row ? row->section : QVClinicalSection::None;
 }
 
-QVClinicalDocument::QVClinicalDocument(const std::filesystem::path& file, int secondsFromGMT)
+QVClinicalDocument::QVClinicalDocument(const QVExportFile& file, int secondsFromGMT)
     : writer_(file), dates_(secondsFromGMT) {}
 
 void QVClinicalDocument::start(const char* name, Attributes attributes) {

@@ -20,8 +20,8 @@ QVClinicalSection QVClinicalSectionForType(const VSObjectType* type);
 /// observation for each sample of some quantity types. Used by one thread at a time; errors are the writer's.
 class QVClinicalDocument {
  public:
-    /// Writes into the file, which is there already.
-    QVClinicalDocument(const std::filesystem::path& file, int secondsFromGMT);
+    /// Writes into the file, which is empty.
+    QVClinicalDocument(const QVExportFile& file, int secondsFromGMT);
 
     /// The declaration and the beginning of the root.
     void open();

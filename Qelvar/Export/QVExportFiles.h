@@ -1,11 +1,13 @@
 #pragma once
 
 #include <filesystem>
+#include <memory>
 #include <optional>
 #include <string>
 
-#include "Qelvar/Import/QVImportFileDescriptor.h"
+#include "Qelvar/Export/QVXMLWriter.h"
 #include "Vessa/Base/VSError.h"
+#include "Vessa/VSWorkFolder.h"
 
 /// The base names of the documents and of the archive, in the person's language.
 struct QVExportNames {
@@ -30,31 +32,36 @@ struct QVExportPaths {
 };
 
 /// The files of an export while they exist. They are for their owner's eyes only (0700, 0600) and go with
-/// this object; a lock on the folder, which ends with the process however it ends, keeps a second export out,
-/// and what a killed one has left is removed by the next. Used by one thread at a time.
+/// this object; the work folder's lock, which ends with the process however it ends, keeps a second export
+/// out, and what a killed one has left is removed by the next. They are written through descriptors, whatever
+/// happens to their names meanwhile. Used by one thread at a time.
 class QVExportFiles {
  public:
-    /// Makes the folders and the three files, empty. NotAccessible with isHeldByOthers: another export has
-    /// the folder; else as the system says.
-    static VSResult<QVExportFiles> create(const QVExportPaths& paths);
-    /// Removes what a killed export has left; nothing where there is none, or one is under way.
+    /// Makes the three files, empty, in the folder that was made for them or (null) in documentsPath, which
+    /// is made too. NotAccessible with isHeldByOthers: another export has the folder; else as the system
+    /// says.
+    static VSResult<QVExportFiles> create(const QVExportPaths& paths,
+                                          std::shared_ptr<const VSWorkFolder> folder = nullptr);
+    /// Removes what a killed export has left in documentsPath; nothing where there is none, or one is under
+    /// way.
     static void removeLeftovers(const QVExportPaths& paths);
 
-    QVExportFiles(QVExportFiles&& other) noexcept;
+    QVExportFiles(QVExportFiles&& other) noexcept = default;
     QVExportFiles& operator=(QVExportFiles&&) = delete;
     ~QVExportFiles() { remove(); }
 
-    /// Removes the documents and the archive; errors are ignored.
-    void remove();
-    /// The same without the archive.
-    void removeDocuments();
+    QVExportFile recordsDocument() const { return {paths_.filePath, records_.get()}; }
+    QVExportFile clinicalDocument() const { return {paths_.CDAFilePath, clinical_.get()}; }
+    QVExportFile exportFolder() const { return {paths_.exportPath, export_.get()}; }
+    QVExportFile archive() const { return {paths_.archivePath, archive_.get()}; }
 
  private:
-    QVExportFiles(QVExportPaths paths, QVImportFileDescriptor lock)
-        : paths_(std::move(paths)), lock_(std::move(lock)) {}
-    static VSResult<QVImportFileDescriptor> lock(const std::filesystem::path& folder);
+    QVExportFiles(QVExportPaths paths, std::shared_ptr<const VSWorkFolder> folder)
+        : paths_(std::move(paths)), folder_(std::move(folder)) {}
     VSStatus make();
+    void remove() const;
 
-    std::optional<QVExportPaths> paths_;  // none: they are another object's
-    QVImportFileDescriptor lock_;
+    QVExportPaths paths_;
+    std::shared_ptr<const VSWorkFolder> folder_;  // null: they are another object's
+    VSFileDescriptor export_, records_, clinical_, archive_;
 };

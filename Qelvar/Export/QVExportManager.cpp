@@ -1,5 +1,7 @@
 #include "Qelvar/Export/QVExportManager.h"
 
+#include <sys/stat.h>
+
 #include <algorithm>
 #include <array>
 
@@ -122,7 +124,7 @@ VSResult<std::filesystem::path> QVExportManager::exportAll() {
 
 VSStatus QVExportManager::createFiles() {
     cleanupExportFiles();
-    auto files = QVExportFiles::create(paths_);
+    auto files = QVExportFiles::create(paths_, setting_.folder);
     if (!files) {
         if (files.error().isHeldByOthers) return files.error();
         VSLog(VSLogLevel::Error,
@@ -151,11 +153,11 @@ VSStatus QVExportManager::takeSnapshot() {
 void QVExportManager::openDocuments() {
     const auto environment = VSEnvironment::current();
     const int offset = VSCalendar::current().secondsFromGMT(environment->now());
-    writer_ = std::make_unique<QVRecordsDocument>(paths_.filePath, offset, units_);
+    writer_ = std::make_unique<QVRecordsDocument>(files_->recordsDocument(), offset, units_);
     // Without what the person prefers beside the locale, such as a clock of 24 hours.
     const std::string locale = environment->localeIdentifier();
     writer_->open(locale.substr(0, locale.find('@')));
-    writerCDA_ = std::make_unique<QVClinicalDocument>(paths_.CDAFilePath, offset);
+    writerCDA_ = std::make_unique<QVClinicalDocument>(files_->clinicalDocument(), offset);
     writerCDA_->open();
 }
 
@@ -228,10 +230,12 @@ void QVExportManager::completeAndCloseStreamingXML() {
 }
 
 VSStatus QVExportManager::archiveExportDirectory() {
-    std::error_code error;
-    bytesTotal_ = std::filesystem::file_size(paths_.filePath, error) +
-                  std::filesystem::file_size(paths_.CDAFilePath, error);
-    return QVArchiveExportDirectory(paths_.exportPath, paths_.archivePath, [this](uint64_t bytes) {
+    uint64_t total = 0;
+    struct stat status {};
+    for (const QVExportFile& file : {files_->recordsDocument(), files_->clinicalDocument()})
+        if (fstat(file.descriptor, &status) == 0) total += static_cast<uint64_t>(status.st_size);
+    bytesTotal_ = total;
+    return QVArchiveExportDirectory(files_->exportFolder(), files_->archive(), [this](uint64_t bytes) {
         bytesPacked_ = bytes;
         return !exportFailed_;
     });

@@ -24,6 +24,8 @@ struct QVExportSetting {
     QVExportNames names;
     /// The person's units. Asked at the start of each export, by the thread that starts it; may be empty.
     std::function<QVExportUnits()> preferredUnits;
+    /// That of documentsPath, where it was made for this export; null: the export makes and keeps it.
+    std::shared_ptr<const VSWorkFolder> folder = nullptr;
 };
 
 struct QVExportProgress {

@@ -33,8 +33,7 @@ const std::string& QVDeviceTexts::textOf(const VSSample& sample) {
     return text_;
 }
 
-QVRecordsDocument::QVRecordsDocument(const std::filesystem::path& file, int secondsFromGMT,
-                                     const QVExportUnits& units)
+QVRecordsDocument::QVRecordsDocument(const QVExportFile& file, int secondsFromGMT, const QVExportUnits& units)
     : secondsFromGMT_(secondsFromGMT), writer_(file), dates_(secondsFromGMT), units_(units) {}
 
 void QVRecordsDocument::open(const std::string& locale) {

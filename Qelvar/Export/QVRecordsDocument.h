@@ -27,8 +27,8 @@ class QVDeviceTexts {
 /// at a time; errors are the writer's.
 class QVRecordsDocument {
  public:
-    /// Writes into the file, which is there already.
-    QVRecordsDocument(const std::filesystem::path& file, int secondsFromGMT, const QVExportUnits& units);
+    /// Writes into the file, which is empty.
+    QVRecordsDocument(const QVExportFile& file, int secondsFromGMT, const QVExportUnits& units);
 
     /// The declaration and the beginning of the root.
     void open(const std::string& locale);

@@ -20,9 +20,8 @@ const xmlChar* xml(const char* text) {
 /// Where the writer's bytes go: a file whose errors are not lost, as they would be with a buffered stream.
 class QVXMLWriter::File {
  public:
-    explicit File(std::filesystem::path path)
-        : path_(std::move(path)),
-          descriptor_(open(path_.c_str(), O_WRONLY | O_TRUNC | O_CLOEXEC | O_NOFOLLOW)) {
+    explicit File(const QVExportFile& file)
+        : path_(file.path), descriptor_(fcntl(file.descriptor, F_DUPFD_CLOEXEC, 3)) {
         if (descriptor_ < 0) reason_ = errno;
         buffer_.reserve(kSize);
     }
@@ -62,7 +61,7 @@ class QVXMLWriter::File {
     std::vector<char> buffer_;
 };
 
-QVXMLWriter::QVXMLWriter(const std::filesystem::path& file) : file_(std::make_unique<File>(file)) {
+QVXMLWriter::QVXMLWriter(const QVExportFile& file) : file_(std::make_unique<File>(file)) {
     const auto write = [](void* context, const char* bytes, int size) {
         static_cast<File*>(context)->write(bytes, static_cast<size_t>(size));
         return size;  // the file knows of its errors; libxml2 would print them

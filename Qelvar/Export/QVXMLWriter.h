@@ -10,13 +10,19 @@
 
 #include "Vessa/Base/VSError.h"
 
+/// A file that is written: open for that by whoever made it, and its name for messages.
+struct QVExportFile {
+    std::filesystem::path path;
+    int descriptor = -1;
+};
+
 /// A document written through libxml2's text writer into a file, indented by one blank. After a failure
 /// nothing more is written and status() tells it. Texts are UTF-8; characters that XML does not have become
 /// U+FFFD. Used by one thread at a time.
 class QVXMLWriter {
  public:
-    /// Writes over the file, which is there already.
-    explicit QVXMLWriter(const std::filesystem::path& file);
+    /// Writes into the file, which is empty; it may be closed meanwhile.
+    explicit QVXMLWriter(const QVExportFile& file);
     ~QVXMLWriter();
     QVXMLWriter(const QVXMLWriter&) = delete;
     QVXMLWriter& operator=(const QVXMLWriter&) = delete;

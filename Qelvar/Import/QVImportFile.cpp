@@ -11,6 +11,7 @@
 
 #include "Qelvar/Import/QVImportArchive.h"
 #include "Qelvar/Import/QVImportFileDescriptor.h"
+#include "Vessa/VSStoreGuard.h"
 
 namespace {
 
@@ -104,6 +105,10 @@ VSResult<size_t> QVReadWaiting(const QVImportFileDescriptor& file, const std::fi
 VSResult<std::unique_ptr<QVImportFile>> QVImportFile::open(const std::filesystem::path& path,
                                                            const std::atomic<bool>* cancel,
                                                            QVRecognisedFile* recognised) {
+    // The store that takes the records, most likely. To open and close its files here would take SQLite's
+    // locks.
+    if (VSIsOpenStoreFile(path))
+        return VSError{VSErrorCode::Refused, path.string() + ": is a file of the store that is open"};
     // Non-blocking, so that a pipe that nobody writes to can be given up; regular files do not care.
     QVImportFileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK));
     if (file.get() < 0) return systemError(path, errno);

@@ -85,6 +85,13 @@ Outcome RunningProgram::wait() {
     return outcome;
 }
 
+int Program::runInShell(const std::string& arguments) const {
+    std::string line = "env -i";
+    for (const auto& [name, value] : environment()) line += " '" + name + "=" + value + "'";
+    const int status = std::system((line + " '" QELVAR_BINARY "' " + arguments).c_str());
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
 std::map<std::string, std::string> Program::environment() const {
     std::map<std::string, std::string> result{{"TZ", "Europe/Copenhagen"},
                                               {"LC_ALL", "C.UTF-8"},

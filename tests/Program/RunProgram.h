@@ -59,6 +59,8 @@ class Program {
     Outcome run(const std::vector<std::string>& arguments) const {
         return RunningProgram(arguments, environment()).wait();
     }
+    /// The exit status with a command line that a shell reads.
+    int runInShell(const std::string& arguments) const;
     std::map<std::string, std::string> environment() const;
 
  private:

@@ -30,6 +30,8 @@ TEST(SalvageCommand, MakesASoundStoreOfADamagedOneAndLeavesThatAlone) {
     }
     EXPECT_EQ(program.run({"salvage"}).status, 2);
     EXPECT_EQ(program.run({"salvage", "--to", store}).status, 5);
+    EXPECT_EQ(program.run({"salvage", "--to", store / "inside" / "it"}).status, 5);
+    EXPECT_FALSE(std::filesystem::exists(store / "inside"));
     EXPECT_EQ(program.run({"salvage", "--to", saved, "--store", folder.path() / "nowhere"}).status, 3);
     const auto outcome = program.run({"salvage", "--to", saved});
     EXPECT_EQ(outcome.status, 0) << outcome.errors;

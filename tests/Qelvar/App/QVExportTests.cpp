@@ -3,6 +3,7 @@
 #include "Platform/SystemEvents.h"
 #include "Platform/TextScale.h"
 #include "Qelvar/App/QVExportController.h"
+#include "Qelvar/App/QVPictureFolder.h"
 #include "WindowTest.h"
 
 namespace {
@@ -128,6 +129,53 @@ TEST_F(ExportTest, CancelledItSaysNothingMoreFailedItSaysSo) {
     EXPECT_EQ(controller.buttonTitles(), QStringList{"OK"});
     controller.pressButton(0);
     EXPECT_EQ(controller.state(), State::Idle);
+}
+
+TEST_F(ExportTest, AsksBeforeAnythingIsLostAndKeepsOutOfTheStore) {
+    saveReadings(10);
+    Desktop desktop;
+    QVExportController controller(std::make_shared<QVControllerManager>(store_), desktop);
+    controller.verifyExport();
+    controller.pressButton(0);
+    ASSERT_TRUE(waitFor(controller, State::Sharing));
+    desktop.file = folder_.path() / "foo.txt";
+    std::ofstream(desktop.file) << "precious";
+    controller.pressButton(0);
+    EXPECT_EQ(controller.buttonTitles(), (QStringList{"Add “.zip”", "Keep This Name", "Cancel"}));
+    controller.pressButton(1);
+    ASSERT_TRUE(waitFor(controller, State::Asking)) << "for the file is there";
+    EXPECT_EQ(controller.buttonTitles(), (QStringList{"Cancel", "Replace"}));
+    controller.pressButton(0);
+    ASSERT_EQ(controller.state(), State::Sharing);
+    EXPECT_EQ(fs::file_size(desktop.file), 8U);
+    controller.pressButton(0);
+    controller.pressButton(0);
+    ASSERT_TRUE(waitFor(controller, State::Sharing));
+    EXPECT_TRUE(fs::exists(folder_.path() / "foo.txt.zip"));
+    desktop.file = documents_ / "mine.zip";
+    controller.pressButton(0);
+    ASSERT_TRUE(waitFor(controller, State::Sharing));
+    EXPECT_TRUE(controller.message().contains("keeps records in this place"))
+        << controller.message().toStdString();
+    EXPECT_FALSE(fs::exists(desktop.file));
+}
+
+TEST_F(ExportTest, PicturesAreNotDrawnIntoAStore) {
+    const fs::path folder = folder_.path() / "pictures", store = folder_.path() / "store";
+    QImage picture(1, 1, QImage::Format_RGB32);
+    EXPECT_FALSE(QVPictureFolder::open(documents_ / "new", store).ok());
+    const auto pictures = QVPictureFolder::open(folder, store);
+    ASSERT_TRUE(pictures.ok());
+    EXPECT_TRUE(pictures->save(picture, "day.png").ok());
+    EXPECT_TRUE(pictures->save(picture, "day.png").ok()) << "in the place of the older one";
+    fs::create_symlink(store / "vessa.sqlite", folder / "week.png");
+    fs::create_hard_link(store / "vessa.sqlite", folder / "month.png");
+    for (const char* name : {"week.png", "month.png"}) {
+        const VSStatus status = pictures->save(picture, name);
+        ASSERT_FALSE(status.ok());
+        EXPECT_EQ(status.error().code, VSErrorCode::Refused);
+    }
+    EXPECT_EQ(std::distance(fs::directory_iterator(folder), {}), 3);
 }
 
 /// From the tab to the saved file with the keyboard alone, in a window where all of it fits.
