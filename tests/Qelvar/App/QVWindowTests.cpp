@@ -216,7 +216,8 @@ TEST_F(WindowTest, PicturesAreTakenOfEveryTabAndScope) {
     open({group(VSGroupID::Steps), group(VSGroupID::HeartRate), group(VSGroupID::FlightsClimbed),
           group(VSGroupID::ActiveEnergy)});
     const auto folder = folder_.path() / "pictures";
-    ASSERT_TRUE(QVScreenshots(*window_, *app_, folder).takeAll());
+    const auto pictures = [&] { return std::move(*QVPictureFolder::open(folder, store_->folder())); };
+    ASSERT_TRUE(QVScreenshots(*window_, *app_, pictures()).takeAll());
     for (const char* name : {"dashboard-day", "dashboard-week", "dashboard-month", "dashboard-year",
                              "display-type", "health-data", "sources", "medical-id"})
         EXPECT_TRUE(std::filesystem::exists(folder / (std::string(name) + ".png"))) << name;
@@ -225,7 +226,7 @@ TEST_F(WindowTest, PicturesAreTakenOfEveryTabAndScope) {
     EXPECT_GT(full.height(), 4 * 187 + 100) << "all cards";
     app_->controllerManager()->dashboardDataUnitGroupsController().setDataUnitGroupsForDashboard({});
     app_->tabBarController()->setSelectedIndex(0);
-    ASSERT_TRUE(QVScreenshots(*window_, *app_, folder).takeAll());
+    ASSERT_TRUE(QVScreenshots(*window_, *app_, pictures()).takeAll());
     EXPECT_TRUE(std::filesystem::exists(folder / "dashboard-empty.png"));
 }
 
