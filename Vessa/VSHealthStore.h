@@ -36,6 +36,14 @@ struct VSCheckReport {
     int64_t samples = 0;
 };
 
+/// How a top-level record of a document belongs to others of it. The numbers are the document's own, from 1.
+struct VSImportRelations {
+    int64_t number = 0;             // that others name it by; 0: none does
+    std::vector<int64_t> workouts;  // that it belongs to, wherever they stand in the document
+    /// Of a correlation: which records its members are, in their order; 0: any equal one that is no other's.
+    std::vector<int64_t> members;
+};
+
 /// What was saved out of a damaged store.
 struct VSSalvageReport {
     int64_t samples = 0;  // that are in the new store
@@ -113,8 +121,8 @@ class VSHealthStore {
     virtual void executeQuery(std::shared_ptr<VSQuery> query) = 0;
     virtual void stopQuery(const std::shared_ptr<VSQuery>& query) = 0;
 
-    // Writing: all or nothing. Invalid: an object that breaks its type's rules (the message says which and
-    // why).
+    // Writing: all or nothing. Invalid: an object that breaks its type's rules or is beyond the limits
+    // (VSLimits.h; the message says which and why).
     /// Gives each object its number; the objects given stay as they are. A correlation brings those of its
     /// members that are not in the store yet. Without a creation date it is now.
     virtual void saveObjects(std::vector<VSSamplePtr> objects, Completion completion) = 0;
@@ -142,8 +150,9 @@ class VSHealthStore {
     virtual VSResult<int> biologicalSex() = 0;        // 0 not set
     virtual VSResult<int> bloodType() = 0;            // 0 not set
     virtual VSResult<int> fitzpatrickSkinType() = 0;  // 0 not set
+    // Invalid: no such day; not one of the characteristic's values.
     virtual void setDateOfBirth(std::optional<VSBirthDate> date, Completion completion) = 0;
-    /// REQUIRES: an enumerated characteristic and one of its values.
+    /// REQUIRES: an enumerated characteristic.
     virtual void setCharacteristic(const VSObjectType* type, int value, Completion completion) = 0;
 
     // Medical ID. The owner's only.
@@ -152,7 +161,7 @@ class VSHealthStore {
     /// None: there is no Medical ID.
     virtual void fetchMedicalIDData(
         std::function<void(const VSResult<std::optional<VSMedicalIDData>>&)> completion) = 0;
-    /// Makes or replaces it.
+    /// Makes or replaces it. Invalid: beyond the limits (VSLimits.h).
     virtual void updateMedicalIDData(VSMedicalIDData data, Completion completion) = 0;
     /// Also when there is none.
     virtual void deleteMedicalIDData(Completion completion) = 0;
@@ -240,12 +249,19 @@ class VSHealthStore {
         /// A top-level record of a document. Identical records of the document are told apart by number: the
         /// n-th of them is AlreadyPresent when the store held n of them before. An absent creation date or
         /// time-zone offset equals any. The members of a correlation join with equal top-level records,
-        /// before or after it.
-        virtual VSResult<Outcome> add(const VSSample& sample) = 0;
+        /// before or after it. Where a row of the store agrees in every bit it is preferred.
+        virtual VSResult<Outcome> add(const VSSample& sample, const VSImportRelations& relations) = 0;
+        VSResult<Outcome> add(const VSSample& sample) { return add(sample, {}); }
+        /// Relates what was added to its workouts; numbers begin anew. Objects that both were in the store
+        /// before stay related as they were.
+        virtual VSStatus endDocument() = 0;
         /// Sets the characteristics that are not set yet; returns how many were set.
         virtual VSResult<int> setCharacteristicsIfUnset(std::optional<VSBirthDate> birthDate,
                                                         int biologicalSex, int bloodType, int skinType) = 0;
-        /// Commits and tells everyone, in all processes.
+        /// Sets the Medical ID as a whole when there is none or an empty one; whether it did. Invalid: beyond
+        /// the limits.
+        virtual VSResult<bool> setMedicalIDIfUnset(const VSMedicalIDData& data) = 0;
+        /// Ends the document, commits and tells everyone, in all processes.
         virtual VSStatus commit() = 0;
     };
     /// Waits for the writer, at most `patience`; NotAccessible when another process holds it longer, and
@@ -259,8 +275,8 @@ class VSHealthStore {
     virtual VSResult<std::vector<VSBatch>> batches() = 0;
     /// Takes an import back: what it added and no other import had as well is deleted (anchored queries get
     /// it as deleted objects), and so is what only it still held of an import that was taken back before.
-    /// What was not imported is never touched. The characteristics that it set, that still have its value and
-    /// that no other import told are unset. NotFound: there is no such batch.
+    /// What was not imported is never touched. The characteristics and the Medical ID that it set, that still
+    /// have its value and that no other import told are unset. NotFound: there is no such batch.
     virtual VSResult<VSUndoReport> undoBatch(int64_t batch) = 0;
 
     /// Waits. What is deleted is overwritten in the database file at once; this cuts the log, which may hold

@@ -4,6 +4,7 @@
 #include <set>
 
 #include "Vessa/Base/VSEnvironment.h"
+#include "Vessa/VSLimits.h"
 #include "Vessa/VSStoreCheck.h"
 #include "Vessa/VSStoreHolder.h"
 #include "Vessa/VSStoreSchema.h"
@@ -25,7 +26,7 @@ VSMemberKey keyOf(const VSSample& sample, int64_t id) {
 /// What speaks against a sample that is to be saved, with those of its members that are in the store.
 std::optional<VSError> objectionToSaving(VSStoreWriter& writer, const VSStoreAccess& access,
                                          const VSSample& sample) {
-    if (auto objection = VSStoreWriter::objection(sample)) return objection;
+    if (auto objection = VSObjectionToSample(sample)) return objection;
     if (auto objection = access.objectionToSaving(writer.database(), sample)) return objection;
     if (const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample)) {
         for (const VSSamplePtr& member : correlation->objects()) {
@@ -82,7 +83,9 @@ VSStatus relate(VSStoreWriter& writer, const VSStoreAccess& access, const std::v
         if (!id) id = writer.insert(*sample, now);
         const VSMemberKey key = keyOf(*sample, id);
         if (auto objection = objectionToChanging(writer, access, key)) return *objection;
-        writer.addToWorkout(parent, key);
+        if (!writer.addToWorkout(parent, key))
+            return VSError{VSErrorCode::Invalid, "a sample belongs to more than " +
+                                                     std::to_string(VSLimits::mostWorkouts) + " workouts"};
     }
     writer.touch(workout.sampleType());
     return {};

@@ -87,6 +87,7 @@ class VSHealthStoreConnection final : public VSHealthStore {
     /// A change that only the owner of the store may make.
     void writeAsOwner(VSStoreCore::Change change, Completion completion);
     VSResult<int> characteristic(VSTypeCode code);
-    void writeCharacteristic(const VSObjectType* type, std::optional<int64_t> value, Completion completion);
+    void writeCharacteristic(const VSObjectType* type, std::optional<int64_t> value,
+                             const std::optional<VSError>& objectionToValue, Completion completion);
     const std::shared_ptr<VSStoreCore> core_;
 };

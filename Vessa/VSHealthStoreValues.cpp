@@ -1,5 +1,7 @@
 #include "Vessa/VSHealthStoreConnection.h"
 
+#include "Vessa/VSLimits.h"
+#include "Vessa/VSStoreBatches.h"
 #include "Vessa/VSStoreCharacteristics.h"
 
 namespace {
@@ -37,13 +39,18 @@ VSResult<std::optional<VSBirthDate>> VSHealthStoreConnection::dateOfBirth() {
 }
 
 void VSHealthStoreConnection::setDateOfBirth(std::optional<VSBirthDate> date, Completion completion) {
-    std::optional<int64_t> value;
-    if (date) value = VSStoredBirthDate(*date);
-    writeCharacteristic(VSObjectType::dataTypeWithCode(VSCode::DateOfBirth), value, std::move(completion));
+    writeCharacteristic(VSObjectType::dataTypeWithCode(VSCode::DateOfBirth),
+                        date ? std::optional(VSStoredBirthDate(*date)) : std::nullopt,
+                        date ? VSObjectionToBirthDate(*date) : std::nullopt, std::move(completion));
 }
 
 void VSHealthStoreConnection::setCharacteristic(const VSObjectType* type, int value, Completion completion) {
-    writeCharacteristic(type, value ? std::optional<int64_t>(value) : std::nullopt, std::move(completion));
+    std::optional<VSError> objection;
+    if (value && !type->identifierForValue(value))
+        objection =
+            VSError{VSErrorCode::Invalid, type->identifier() + ": has no value " + std::to_string(value)};
+    writeCharacteristic(type, value ? std::optional<int64_t>(value) : std::nullopt, objection,
+                        std::move(completion));
 }
 
 void VSHealthStoreConnection::fetchMedicalIDData(
@@ -59,7 +66,9 @@ void VSHealthStoreConnection::fetchMedicalIDData(
 void VSHealthStoreConnection::updateMedicalIDData(VSMedicalIDData data, Completion completion) {
     writeAsOwner(
         [data = std::move(data)](VSStoreWriter& writer) {
+            if (auto objection = VSObjectionToMedicalID(data)) return VSStatus(*objection);
             VSWriteMedicalID(writer.database(), data);
+            VSForgetBatchMedicalID(writer.database());
             return VSStatus();
         },
         std::move(completion));
@@ -115,9 +124,11 @@ VSResult<int> VSHealthStoreConnection::characteristic(VSTypeCode code) {
 }
 
 void VSHealthStoreConnection::writeCharacteristic(const VSObjectType* type, std::optional<int64_t> value,
+                                                  const std::optional<VSError>& objectionToValue,
                                                   Completion completion) {
     core_->write(
-        [&access = core_->access, type, value](VSStoreWriter& writer) {
+        [&access = core_->access, type, value, objectionToValue](VSStoreWriter& writer) {
+            if (objectionToValue) return VSStatus(*objectionToValue);
             if (auto objection = access.objectionToSharing(writer.database(), type))
                 return VSStatus(*objection);
             VSWriteCharacteristic(writer, type, value);
@@ -135,6 +146,7 @@ void VSHealthStoreConnection::deleteMedicalIDData(Completion completion) {
     writeAsOwner(
         [](VSStoreWriter& writer) {
             writer.database().use("DELETE FROM medical_id").run();
+            VSForgetBatchMedicalID(writer.database());
             return VSStatus();
         },
         std::move(completion));

@@ -4,12 +4,15 @@
 
 #include "Vessa/Base/VSEnvironment.h"
 #include "Vessa/Base/VSLog.h"
+#include "Vessa/VSLimits.h"
 #include "Vessa/VSStoreCharacteristics.h"
 #include "Vessa/VSStoreSchema.h"
 
 namespace {
 constexpr size_t typeCodes = 128;
 /// Opening waits for a migration at most; what writes to a store holds up nobody who opens it.
+/// Records that others name. A document with more of them has made them up.
+constexpr size_t mostNumbered = 1'000'000;
 constexpr VSDuration patienceToOpen = std::chrono::seconds(10);
 
 size_t codeOf(const VSSample& sample) {
@@ -89,16 +92,28 @@ VSError VSImportTransaction::ended() const {
     return failure_.value_or(VSError{VSErrorCode::Invalid, "the import has ended"});
 }
 
-VSResult<VSHealthStore::ImportTransaction::Outcome> VSImportTransaction::add(const VSSample& sample) {
+template <typename Block>
+auto VSImportTransaction::attempt(Block block) -> VSResult<decltype(block())> {
     if (!transaction_ || failure_) return ended();
-    if (auto objection = VSStoreWriter::objection(sample)) return *objection;
     try {
-        const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample);
-        return correlation ? addCorrelation(*correlation) : addRecord(sample);
+        return block();
     } catch (const VSDatabaseFailure& failure) {
         failure_ = failure.error();
         return *failure_;
     }
+}
+
+VSResult<VSHealthStore::ImportTransaction::Outcome> VSImportTransaction::add(
+    const VSSample& sample, const VSImportRelations& relations) {
+    if (transaction_ && !failure_) {
+        if (auto objection = VSObjectionToSample(sample)) return *objection;
+    }
+    return attempt([&] {
+        const auto* correlation = dynamic_cast<const VSCorrelation*>(&sample);
+        const Added added = correlation ? addCorrelation(*correlation, relations.members) : addRecord(sample);
+        if (relations.number || !relations.workouts.empty()) relate(sample, added.id, relations);
+        return added.outcome;
+    });
 }
 
 /// Whether a row that this record may join can exist: else no search is needed.
@@ -114,22 +129,23 @@ int64_t VSImportTransaction::insert(const VSSample& sample) {
     return id;
 }
 
-VSImportTransaction::Outcome VSImportTransaction::addRecord(const VSSample& sample) {
+VSImportTransaction::Added VSImportTransaction::addRecord(const VSSample& sample) {
     if (mayBePresent(sample, TopLevel)) {
         const int64_t found = writer_.matcher().findAmongMany(
             sample, TopLevel, [this](int64_t id) { return !uses_.has(id, TopLevel); });
         if (found) {
             uses_.set(found, TopLevel);
-            return found <= lastBefore_ ? Outcome::AlreadyPresent : Outcome::Added;
+            return {found, found <= lastBefore_ ? Outcome::AlreadyPresent : Outcome::Added};
         }
     }
     const int64_t id = insert(sample);
     uses_.set(id, TopLevel);
     hasNewTopLevel_[codeOf(sample)] = true;
-    return Outcome::Added;
+    return {id, Outcome::Added};
 }
 
-VSImportTransaction::Outcome VSImportTransaction::addCorrelation(const VSCorrelation& correlation) {
+VSImportTransaction::Added VSImportTransaction::addCorrelation(const VSCorrelation& correlation,
+                                                               const std::vector<int64_t>& memberNumbers) {
     const int64_t found = !hadSamples_[codeOf(correlation)]
                               ? 0
                               : writer_.matcher().findAmongMany(correlation, TopLevel, [this](int64_t id) {
@@ -138,18 +154,25 @@ VSImportTransaction::Outcome VSImportTransaction::addCorrelation(const VSCorrela
     if (found) {
         uses_.set(found, TopLevel);
         for (const VSMemberKey& member : writer_.matcher().members(found)) uses_.set(member.id, Member);
-        return Outcome::AlreadyPresent;
+        return {found, Outcome::AlreadyPresent};
     }
     std::vector<VSMemberKey> members;
-    for (const VSSamplePtr& object : correlation.objects()) members.push_back(addMember(*object));
+    for (const VSSamplePtr& object : correlation.objects()) {
+        const size_t index = members.size();
+        members.push_back(addMember(*object, index < memberNumbers.size() ? memberNumbers[index] : 0));
+    }
     const int64_t id = insert(correlation);
     uses_.set(id, TopLevel);
     for (size_t index = 0; index < members.size(); ++index)
         writer_.insertMember(id, static_cast<int>(index), members[index]);
-    return Outcome::Added;
+    return {id, Outcome::Added};
 }
 
-VSMemberKey VSImportTransaction::addMember(const VSSample& member) {
+VSMemberKey VSImportTransaction::addMember(const VSSample& member, int64_t number) {
+    const auto named = number ? numbered_.find(number) : numbered_.end();
+    if (named != numbered_.end() && named->second.type == member.sampleType() &&
+        writer_.matcher().isSame(member, named->second))
+        return named->second;
     int64_t id = 0;
     if (mayBePresent(member, Member))
         id = writer_.matcher().findAmongMany(member, Member,
@@ -162,10 +185,45 @@ VSMemberKey VSImportTransaction::addMember(const VSSample& member) {
     return {member.sampleType(), member.startDate().microseconds(), id};
 }
 
+/// Relations wait in `members` under the workout's number below zero, whatever their count: the workouts
+/// stand at the end of a document.
+void VSImportTransaction::relate(const VSSample& sample, int64_t id, const VSImportRelations& relations) {
+    const VSMemberKey key{sample.sampleType(), sample.startDate().microseconds(), id};
+    uses_.set(id, Member);  // a member of a correlation that means this one says so
+    if (relations.number && numbered_.size() < mostNumbered) numbered_.try_emplace(relations.number, key);
+    for (const int64_t workout : relations.workouts) {
+        if (workout > 0 && pendingRelations_ < INT32_MAX)
+            writer_.insertMember(-workout, pendingRelations_++, key);
+    }
+}
+
+void VSImportTransaction::relateToWorkouts() {
+    std::vector<std::pair<int64_t, int64_t>> workouts;  // number, id
+    for (const auto& [number, key] : numbered_) {
+        if (key.type == VSObjectType::workoutType()) workouts.emplace_back(number, key.id);
+    }
+    std::sort(workouts.begin(), workouts.end());
+    for (const auto& [number, id] : workouts) {
+        for (const VSMemberKey& member : writer_.matcher().members(-number)) {
+            if (id > lastBefore_ || member.id > lastBefore_) writer_.addToWorkout(id, member);
+        }
+    }
+    writer_.database().use("DELETE FROM members WHERE parent < 0").run();
+    pendingRelations_ = 0;
+}
+
+VSStatus VSImportTransaction::endDocument() {
+    const auto done = attempt([&] {
+        if (pendingRelations_) relateToWorkouts();
+        numbered_.clear();
+        return true;
+    });
+    return done ? VSStatus() : VSStatus(done.error());
+}
+
 VSResult<int> VSImportTransaction::setCharacteristicsIfUnset(std::optional<VSBirthDate> birthDate,
                                                              int biologicalSex, int bloodType, int skinType) {
-    if (!transaction_ || failure_) return ended();
-    try {
+    return attempt([&] {
         int set = 0;
         const auto setUnset = [&](VSTypeCode code, int64_t value) {
             const auto* type = VSObjectType::dataTypeWithCode(code);
@@ -184,14 +242,27 @@ VSResult<int> VSImportTransaction::setCharacteristicsIfUnset(std::optional<VSBir
         setUnset(VSCode::FitzpatrickSkinType, skinType);
         changedCharacteristics_ = changedCharacteristics_ || set;
         return set;
-    } catch (const VSDatabaseFailure& failure) {
-        failure_ = failure.error();
-        return *failure_;
-    }
+    });
+}
+
+VSResult<bool> VSImportTransaction::setMedicalIDIfUnset(const VSMedicalIDData& data) {
+    if (auto objection = VSObjectionToMedicalID(data)) return *objection;
+    return attempt([&] {
+        const auto current = VSReadMedicalID(*database_);
+        const bool isUnset = !current || *current == VSMedicalIDData();
+        if (isUnset && current != data) {
+            VSWriteMedicalID(*database_, data);
+            changedCharacteristics_ = true;
+        }
+        if (isUnset || *current == data)
+            characteristics_.try_emplace(VSBatchMedicalIDCode,
+                                         VSBatchCharacteristic{VSBatchMedicalIDValue(data), isUnset});
+        return isUnset && current != data;
+    });
 }
 
 VSStatus VSImportTransaction::commit() {
-    if (!transaction_ || failure_) return ended();
+    if (VSStatus status = endDocument(); !status) return status;
     try {
         const VSNewBatch batch{name_,
                                date_,

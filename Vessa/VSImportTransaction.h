@@ -2,6 +2,7 @@
 
 #include <map>
 #include <memory>
+#include <unordered_map>
 #include <vector>
 
 #include "Vessa/VSHealthStore.h"
@@ -18,9 +19,12 @@ class VSImportTransaction final : public VSHealthStore::ImportTransaction {
         const std::atomic<bool>* giveUp);
     ~VSImportTransaction() override;
 
-    VSResult<Outcome> add(const VSSample& sample) override;
+    using VSHealthStore::ImportTransaction::add;
+    VSResult<Outcome> add(const VSSample& sample, const VSImportRelations& relations) override;
+    VSStatus endDocument() override;
     VSResult<int> setCharacteristicsIfUnset(std::optional<VSBirthDate> birthDate, int biologicalSex,
                                             int bloodType, int skinType) override;
+    VSResult<bool> setMedicalIDIfUnset(const VSMedicalIDData& data) override;
     VSStatus commit() override;
 
  private:
@@ -40,9 +44,18 @@ class VSImportTransaction final : public VSHealthStore::ImportTransaction {
         std::vector<uint8_t> bits_;  // two bits a number, four numbers a byte
     };
 
-    Outcome addRecord(const VSSample& sample);
-    Outcome addCorrelation(const VSCorrelation& correlation);
-    VSMemberKey addMember(const VSSample& member);
+    struct Added {
+        int64_t id = 0;
+        Outcome outcome = Outcome::Added;
+    };
+    Added addRecord(const VSSample& sample);
+    Added addCorrelation(const VSCorrelation& correlation, const std::vector<int64_t>& memberNumbers);
+    VSMemberKey addMember(const VSSample& member, int64_t number);
+    void relate(const VSSample& sample, int64_t id, const VSImportRelations& relations);
+    void relateToWorkouts();
+    /// Does block() unless the import has ended, and ends it with its failure.
+    template <typename Block>
+    auto attempt(Block block) -> VSResult<decltype(block())>;
     int64_t insert(const VSSample& sample);
     bool mayBePresent(const VSSample& sample, Use use) const;
     VSError ended() const;
@@ -58,6 +71,9 @@ class VSImportTransaction final : public VSHealthStore::ImportTransaction {
     std::vector<bool> hasNewTopLevel_, hasNewMembers_;  // by type: this import added such rows
     Uses uses_;
     int64_t added_ = 0;
+    /// Of the document: the records that others name, by their numbers.
+    std::unordered_map<int64_t, VSMemberKey> numbered_;
+    int pendingRelations_ = 0;
     std::map<int, VSBatchCharacteristic> characteristics_;  // by type code
     bool changedCharacteristics_ = false;
     std::optional<VSError> failure_;    // after the first one nothing goes on

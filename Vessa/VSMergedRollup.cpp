@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "Vessa/VSLimits.h"
 #include "Vessa/VSObjectType.h"
 #include "Vessa/VSStoreProvenances.h"
 #include "Vessa/VSStoreSchema.h"
@@ -241,6 +242,6 @@ void VSMergedRollups::remakeAll() {
         day = its;
         made.set(static_cast<int>(quarter - day * VSQuartersPerDay), share);
     });
-    sweep(VSStoreSchema::earliestDate.microseconds(), VSStoreSchema::latestDate.microseconds() + 1, merging);
+    sweep(VSLimits::earliestDate.microseconds(), VSLimits::latestDate.microseconds() + 1, merging);
     write();
 }

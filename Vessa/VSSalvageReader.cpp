@@ -4,6 +4,7 @@
 #include <cmath>
 #include <map>
 
+#include "Vessa/VSLimits.h"
 #include "Vessa/VSObjectType.h"
 #include "Vessa/VSStoreSchema.h"
 
@@ -52,8 +53,8 @@ const Shape& shapeOf(Table table) {
 }
 
 bool isDate(const VSPageField& field) {
-    return field.isInteger() && field.integer >= VSStoreSchema::earliestDate.microseconds() &&
-           field.integer <= VSStoreSchema::latestDate.microseconds();
+    return field.isInteger() && field.integer >= VSLimits::earliestDate.microseconds() &&
+           field.integer <= VSLimits::latestDate.microseconds();
 }
 
 bool fitsColumn(char letter, const VSPageField& field) {
@@ -99,7 +100,7 @@ bool fitsShape(Table table, const VSPageRow& row) {
     if (table == Table::Samples) {
         const int64_t start = row.fields[1].integer, duration = row.fields[3].integer;
         return VSObjectType::dataTypeWithCode(static_cast<int>(row.fields[0].integer))->isSampleType() &&
-               duration <= VSStoreSchema::latestDate.microseconds() - start;
+               duration <= VSLimits::latestDate.microseconds() - start;
     }
     // What is deleted came before its deletion. It also tells this table from `types`.
     if (table == Table::Deleted) return row.fields[2].integer < row.number;

@@ -36,10 +36,25 @@ VSNumberRanges rangesOf(VSStatement rows) {
     return VSNumberRanges::of(std::move(ranges));
 }
 
+/// A characteristic, or what stands for the Medical ID. None: not set.
+std::optional<int64_t> currentValue(VSDatabase& database, int code) {
+    if (code != VSBatchMedicalIDCode)
+        return VSReadCharacteristic(database, VSObjectType::dataTypeWithCode(code));
+    const auto data = VSReadMedicalID(database);
+    return data ? std::optional(VSBatchMedicalIDValue(*data)) : std::nullopt;
+}
+
+void unset(VSStoreWriter& writer, int code) {
+    if (code == VSBatchMedicalIDCode)
+        writer.database().use("DELETE FROM medical_id").run();
+    else
+        VSWriteCharacteristic(writer, VSObjectType::dataTypeWithCode(code), std::nullopt);
+}
+
 /// Unsets what the batch set and no other one has; hands the rest on.
 int64_t giveUpCharacteristics(VSStoreWriter& writer, int64_t batch) {
     struct Row {
-        const VSObjectType* type;
+        int code;
         int64_t value;
     };
     std::vector<Row> given;
@@ -47,25 +62,37 @@ int64_t giveUpCharacteristics(VSStoreWriter& writer, int64_t batch) {
         auto rows = writer.database().use(
             "SELECT type, value FROM batch_characteristics WHERE batch = ? AND given = 1");
         rows.bind(1, batch);
-        while (rows.step())
-            given.push_back(
-                {VSObjectType::dataTypeWithCode(static_cast<int>(rows.integer(0))), rows.integer(1)});
+        while (rows.step()) given.push_back({static_cast<int>(rows.integer(0)), rows.integer(1)});
     }
     writer.database().use("DELETE FROM batch_characteristics WHERE batch = ?").bind(1, batch).run();
-    int64_t unset = 0;
-    for (const auto& [type, value] : given) {
+    int64_t count = 0;
+    for (const auto& [code, value] : given) {
         auto heir = writer.database().use(
             "UPDATE batch_characteristics SET given = 1 WHERE type = ?1 AND batch = (SELECT min(batch) FROM "
             "batch_characteristics WHERE type = ?1 AND value = ?2) RETURNING batch");
-        if (heir.bind(1, VSTypeCodeValue(type->code())).bind(2, value).step()) continue;
-        if (VSReadCharacteristic(writer.database(), type) != value) continue;
-        VSWriteCharacteristic(writer, type, std::nullopt);
-        ++unset;
+        if (heir.bind(1, code).bind(2, value).step()) continue;
+        if (currentValue(writer.database(), code) != value) continue;
+        unset(writer, code);
+        ++count;
     }
-    return unset;
+    return count;
 }
 
 }  // namespace
+
+int64_t VSBatchMedicalIDValue(const VSMedicalIDData& data) {
+    uint64_t hash = 0xCBF29CE484222325;
+    const auto add = [&hash](const auto& bytes) {
+        for (const auto byte : bytes) hash = (hash ^ static_cast<uint8_t>(byte)) * 0x100000001B3;
+    };
+    add(VSValue(VSMedicalIDContent(data)).serialized());
+    if (data.pictureData) add(*data.pictureData);
+    return static_cast<int64_t>(hash);
+}
+
+void VSForgetBatchMedicalID(VSDatabase& database) {
+    database.use("DELETE FROM batch_characteristics WHERE type = ?").bind(1, VSBatchMedicalIDCode).run();
+}
 
 void VSWriteBatch(VSDatabase& database, const VSNewBatch& batch) {
     auto insert = database.use(

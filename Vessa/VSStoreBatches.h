@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "Vessa/VSBatch.h"
+#include "Vessa/VSHealthStore.h"
 #include "Vessa/VSNumberRanges.h"
 #include "Vessa/VSStoreWriter.h"
 
@@ -16,6 +17,11 @@ struct VSBatchCharacteristic {
     int64_t value = 0;
     bool given = false;  // the import set it; else it had this value
 };
+
+/// Stands for the Medical ID in the place of a type's code. On disk; never change.
+inline constexpr int VSBatchMedicalIDCode = -1;
+/// The value that stands for a Medical ID's content (FNV-1a, 64 bits). On disk; never change.
+int64_t VSBatchMedicalIDValue(const VSMedicalIDData& data);
 
 struct VSNewBatch {
     std::string name;
@@ -30,6 +36,8 @@ struct VSNewBatch {
 };
 
 void VSWriteBatch(VSDatabase& database, const VSNewBatch& batch);
+/// What the person says of the Medical ID is no import's any more.
+void VSForgetBatchMedicalID(VSDatabase& database);
 /// Those that were not undone, oldest first.
 std::vector<VSBatch> VSReadBatches(VSDatabase& database);
 /// NotFound: there is no such batch. Inside a writing transaction.

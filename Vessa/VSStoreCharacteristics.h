@@ -2,7 +2,7 @@
 
 #include <optional>
 
-#include "Vessa/VSHealthStore.h"
+#include "Vessa/VSMedicalID.h"
 #include "Vessa/VSStoreWriter.h"
 
 // The characteristics and the Medical ID in their tables. They throw VSDatabaseFailure.
@@ -11,10 +11,6 @@
 std::optional<int64_t> VSReadCharacteristic(VSDatabase& database, const VSObjectType* type);
 /// None clears it.
 void VSWriteCharacteristic(VSStoreWriter& writer, const VSObjectType* type, std::optional<int64_t> value);
-
-/// A birth date as one number: year * 10000 + month * 100 + day.
-int64_t VSStoredBirthDate(const VSBirthDate& date);
-VSBirthDate VSBirthDateFromStored(int64_t value);
 
 std::optional<VSMedicalIDData> VSReadMedicalID(VSDatabase& database);
 void VSWriteMedicalID(VSDatabase& database, const VSMedicalIDData& data);

@@ -6,6 +6,7 @@
 #include <unordered_map>
 #include <unordered_set>
 
+#include "Vessa/VSLimits.h"
 #include "Vessa/VSNumberSet.h"
 #include "Vessa/VSRollupBuilder.h"
 #include "Vessa/VSStoreSchema.h"
@@ -138,8 +139,8 @@ class Check {
             const int64_t start = rows.integer(1), duration = rows.integer(2), id = rows.integer(4);
             const auto* known = VSObjectType::dataTypeWithCode(type);
             if (!known || !known->isSampleType() || id < 1 || id > last || duration < 0 ||
-                start < VSStoreSchema::earliestDate.microseconds() ||
-                start > VSStoreSchema::latestDate.microseconds() - duration || !std::isfinite(rows.real(6))) {
+                start < VSLimits::earliestDate.microseconds() ||
+                start > VSLimits::latestDate.microseconds() - duration || !std::isfinite(rows.real(6))) {
                 ++impossible;
                 continue;
             }

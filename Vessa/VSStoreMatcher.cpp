@@ -23,7 +23,7 @@ bool sameTotal(const std::optional<VSQuantity>& total, const VSUnit& unit, const
 
 /// Searches that met no more rows than these need no help.
 constexpr int fewRows = 64;
-constexpr size_t mostCrowded = 1'000'000;  // places kept, two a row
+constexpr size_t mostCrowded = 1'500'000;  // places kept, three a row
 constexpr int64_t kSecond = 1'000'000;
 
 int codeOf(const VSSample& sample) {
@@ -57,12 +57,13 @@ size_t originHash(const VSSourceRevision& revision) {
            hash(revision.version);
 }
 
-/// Whether a row was created when the sample says. Documents give whole seconds and cut off the rest.
+/// Whether a row was created when the sample says. Documents of others give whole seconds and cut off the
+/// rest.
 bool sameCreation(const VSSampleRow& row, VSDate sought) {
     const int64_t created = row.start + row.created, wanted = sought.microseconds();
-    if (created == wanted) return true;
-    const int64_t rest = (created % kSecond + kSecond) % kSecond;
-    return created - rest == wanted;
+    const int64_t second = VSFloorDivide(created, kSecond) * kSecond;
+    return created == wanted || second == wanted ||
+           (created == second && second == VSFloorDivide(wanted, kSecond) * kSecond);
 }
 
 }  // namespace
@@ -93,7 +94,9 @@ bool VSSameStoredValue(double a, double b) {
 }
 
 VSStoreMatcher::Likeness VSStoreMatcher::likenessOfValues(const VSSample& sample, double stored) {
-    if (VSSameStoredValue(stored, VSStoredValue(sample))) return Likeness::Same;
+    const double value = VSStoredValue(sample);
+    if (std::bit_cast<int64_t>(stored) == std::bit_cast<int64_t>(value)) return Likeness::Identical;
+    if (VSSameStoredValue(stored, value)) return Likeness::Same;
     const auto* quantitySample = dynamic_cast<const VSQuantitySample*>(&sample);
     if (!quantitySample) return Likeness::None;
     const VSQuantity& quantity = quantitySample->quantity();
@@ -113,26 +116,33 @@ void VSStoreMatcher::forEachRow(const VSSample& sample, Visit visit) {
 
 template <typename Search>
 int64_t VSStoreMatcher::closest(Search search) {
-    bool sawRounded = false;
-    const int64_t found = search([&](Likeness likeness) {
-        if (likeness == Likeness::Rounded) sawRounded = true;
-        return likeness == Likeness::Same;
-    });
-    if (found || !sawRounded) return found;
-    return search([](Likeness likeness) { return likeness == Likeness::Rounded; });
+    constexpr std::array levels{Likeness::Identical, Likeness::Same, Likeness::Rounded};
+    std::array<bool, 4> seen{};
+    for (const Likeness level : levels) {
+        if (level != levels.front() && !seen[static_cast<size_t>(level)]) continue;
+        const int64_t found = search([&](Likeness likeness) {
+            seen[static_cast<size_t>(likeness)] = true;
+            return likeness == level;
+        });
+        if (found) return found;
+    }
+    return 0;
 }
 
-int64_t VSStoreMatcher::find(const VSSample& sample, const Accept& accept) {
+int64_t VSStoreMatcher::newest(const VSSample& sample, const std::set<int64_t>& others) {
     const auto metadata = metadata_.find(sample.provenance().metadata);
     if (!metadata) return 0;
-    return closest([&](const auto& isWanted) {
-        int64_t found = 0;
-        forEachRow(sample, [&](const VSSampleRow& row) {
-            if (isWanted(likeness(sample, *metadata, row)) && accept(row.id)) found = row.id;
-            return !found;
-        });
-        return found;
+    int64_t found = 0;
+    Likeness best = Likeness::None;
+    forEachRow(sample, [&](const VSSampleRow& row) {
+        const Likeness ofRow = likeness(sample, *metadata, row);
+        if (ofRow != Likeness::None && ofRow >= best && !others.contains(row.id)) {
+            best = ofRow;
+            found = row.id;
+        }
+        return true;
     });
+    return found;
 }
 
 int64_t VSStoreMatcher::findAmongMany(const VSSample& sample, int purpose, const Accept& accept) {
@@ -172,14 +182,27 @@ int64_t VSStoreMatcher::findInCrowd(const VSSample& sample, int64_t metadata, VS
         fingerprints.push_back(near.fingerprint(second));
     }
     using Verdict = VSCrowdedStart::Verdict;
-    return closest([&](const auto& isWanted) {
-        return crowd.find(fingerprints, [&](int64_t id) {
+    bool sawRounded = false;
+    const auto search = [&](const std::vector<uint64_t>& places, Likeness level) {
+        return crowd.find(places, [&](int64_t id) {
             if (!accept(id)) return Verdict::NeverAgain;
             VSSampleRow stored;
-            const bool there = row({sample.sampleType(), sample.startDate().microseconds(), id}, stored);
-            return there && isWanted(likeness(sample, metadata, stored)) ? Verdict::Wanted : Verdict::NotThis;
+            if (!row({sample.sampleType(), sample.startDate().microseconds(), id}, stored))
+                return Verdict::NotThis;
+            const Likeness found = likeness(sample, metadata, stored);
+            sawRounded = sawRounded || found == Likeness::Rounded;
+            return found >= level ? Verdict::Wanted : Verdict::NotThis;
         });
-    });
+    };
+    // The rows that agree in every bit have a place of their own: else each search would pass by all that
+    // nearly do.
+    if (sample.creationDate()) {
+        const uint64_t exact = traits.exactFingerprint(
+            VSStoredValue(sample), sample.creationDate()->microseconds(), sample.timeZoneOffset());
+        if (const int64_t found = search({exact}, Likeness::Identical)) return found;
+    }
+    const int64_t found = search(fingerprints, Likeness::Same);
+    return found || !sawRounded ? found : search(fingerprints, Likeness::Rounded);
 }
 
 VSStoreMatcher::Likeness VSStoreMatcher::likeness(const VSSample& sample, int64_t metadata,
@@ -219,7 +242,10 @@ void VSStoreMatcher::addTo(VSCrowdedStart& crowd, const VSSampleRow& row) {
     const Traits traits{row.duration, row.metadata, valueBucket(row.value), originOf(row.provenance)};
     crowd.add(traits.fingerprint(VSFloorDivide(row.start + row.created, kSecond)), row.id);
     crowd.add(traits.fingerprint(std::nullopt), row.id);
-    crowdsSize_ += 2;
+    crowd.add(traits.exactFingerprint(row.value, row.start + row.created,
+                                      provenances_.provenance(row.provenance).timeZoneOffset),
+              row.id);
+    crowdsSize_ += 3;
 }
 
 size_t VSStoreMatcher::originOf(int64_t provenance) {
@@ -239,13 +265,25 @@ uint64_t VSStoreMatcher::Traits::fingerprint(std::optional<int64_t> second) cons
     return hash;
 }
 
+uint64_t VSStoreMatcher::Traits::exactFingerprint(double value, int64_t creation,
+                                                  std::optional<int> offset) const {
+    uint64_t hash = fingerprint(std::nullopt);
+    for (const uint64_t part : {std::bit_cast<uint64_t>(value), static_cast<uint64_t>(creation),
+                                offset ? static_cast<uint64_t>(*offset) : ~uint64_t{0}}) {
+        hash = (hash ^ part) * 0x9E3779B97F4A7C15;
+        hash ^= hash >> 32;
+    }
+    return hash;
+}
+
 VSStoreMatcher::Likeness VSStoreMatcher::likenessOfRow(const VSSample& sample, int64_t metadata,
                                                        const VSSampleRow& row) {
     if (row.duration != (sample.endDate() - sample.startDate()).count() || row.metadata != metadata)
         return Likeness::None;
     const Likeness ofValues = likenessOfValues(sample, row.value);
     if (ofValues == Likeness::None) return ofValues;
-    if (sample.creationDate() && !sameCreation(row, *sample.creationDate())) return Likeness::None;
+    const auto creation = sample.creationDate();
+    if (creation && !sameCreation(row, *creation)) return Likeness::None;
     const auto& entry = provenances_.provenance(row.provenance);
     const VSProvenance& sought = sample.provenance();
     if (entry.revision != sought.sourceRevision && *entry.revision != sample.sourceRevision())
@@ -253,7 +291,10 @@ VSStoreMatcher::Likeness VSStoreMatcher::likenessOfRow(const VSSample& sample, i
     const bool sameDevice =
         !entry.device == !sought.device &&
         (!entry.device || entry.device == sought.device || *entry.device == *sought.device);
-    return sameDevice ? ofValues : Likeness::None;
+    if (!sameDevice) return Likeness::None;
+    const bool sameMoment = !creation || creation->microseconds() == row.start + row.created;
+    const bool sameOffset = !sought.timeZoneOffset || entry.timeZoneOffset == sought.timeZoneOffset;
+    return sameMoment && sameOffset ? ofValues : std::min(ofValues, Likeness::Same);
 }
 
 bool VSStoreMatcher::sameWorkout(const VSWorkout& workout, int64_t id) {
@@ -300,22 +341,31 @@ bool VSStoreMatcher::row(const VSMemberKey& key, VSSampleRow& row) {
 VSStoreMatcher::Likeness VSStoreMatcher::likenessOfMembers(const VSCorrelation& correlation, int64_t id) {
     auto keys = members(id);
     if (keys.size() != correlation.objects().size()) return Likeness::None;
-    Likeness least = Likeness::Same;
+    Likeness least = Likeness::Identical;
     for (const VSSamplePtr& object : correlation.objects()) {
         const auto metadata = metadata_.find(object->provenance().metadata);
         if (!metadata) return Likeness::None;
-        Likeness ofMember = Likeness::None;
-        const auto found = std::find_if(keys.begin(), keys.end(), [&](const VSMemberKey& key) {
+        Likeness best = Likeness::None;
+        size_t closestMember = 0;
+        for (size_t i = 0; i < keys.size() && best != Likeness::Identical; ++i) {
             VSSampleRow stored;
-            if (key.type != object->sampleType() || key.start != object->startDate().microseconds() ||
-                !row(key, stored))
-                return false;
-            ofMember = likenessOfRow(*object, *metadata, stored);
-            return ofMember != Likeness::None;
-        });
-        if (found == keys.end()) return Likeness::None;
-        keys.erase(found);
-        least = std::min(least, ofMember);
+            if (keys[i].type != object->sampleType() || keys[i].start != object->startDate().microseconds() ||
+                !row(keys[i], stored))
+                continue;
+            const Likeness ofMember = likenessOfRow(*object, *metadata, stored);
+            if (ofMember > best) closestMember = i;
+            best = std::max(best, ofMember);
+        }
+        if (best == Likeness::None) return best;
+        keys.erase(keys.begin() + static_cast<std::ptrdiff_t>(closestMember));
+        least = std::min(least, best);
     }
     return least;
+}
+
+bool VSStoreMatcher::isSame(const VSSample& sample, const VSMemberKey& key) {
+    const auto metadata = metadata_.find(sample.provenance().metadata);
+    VSSampleRow stored;
+    return metadata && key.start == sample.startDate().microseconds() && row(key, stored) &&
+           likenessOfRow(sample, *metadata, stored) != Likeness::None;
 }

@@ -3,6 +3,7 @@
 #include <functional>
 #include <map>
 #include <optional>
+#include <set>
 #include <tuple>
 #include <unordered_map>
 #include <vector>
@@ -33,22 +34,26 @@ struct VSMemberKey {
 /// where the sample has one. The time-zone offset does not: a document writes all its dates with the offset
 /// of the day on which it was made, so that one made in summer says the same of a record as one made in
 /// winter. A quantity of at most six digits is also what an export left of a stored one that has more, in the
-/// unit of the document: a row that rounds to it is taken where no row has that very value.
+/// unit of the document: a row that rounds to it is taken where no row has that very value. A row that agrees
+/// in every bit, also of the offset and the creation, is taken before all others.
 class VSStoreMatcher {
  public:
     VSStoreMatcher(VSDatabase& database, VSStoreProvenances& provenances, VSStoreMetadata& metadata)
         : database_(database), provenances_(provenances), metadata_(metadata) {}
 
     using Accept = std::function<bool(int64_t id)>;
-    /// Calls accept(id) for each equal row, oldest first, until it returns true; returns that id, or 0.
-    int64_t find(const VSSample& sample, const Accept& accept);
-    /// The same, for many searches of one transaction: however many rows share a start, a search looks at few
+    /// The row that is most like the sample, the newest of several, but none of the others; 0: none.
+    int64_t newest(const VSSample& sample, const std::set<int64_t>& others);
+    /// Calls accept(id) for equal rows, the most alike and of these the oldest first, until it returns true;
+    /// returns that id, or 0. However many rows share a start, the searches of one transaction look at few
     /// of them. `purpose` tells searches of different acceptance apart. REQUIRES: what was not accepted once
     /// never is for the same purpose; every row added meanwhile is told with `added`.
     int64_t findAmongMany(const VSSample& sample, int purpose, const Accept& accept);
     void added(const VSSample& sample, int64_t id);
     std::vector<VSMemberKey> members(int64_t parent);
     bool row(const VSMemberKey& key, VSSampleRow& row);
+    /// Whether the row of that place is equal to the sample.
+    bool isSame(const VSSample& sample, const VSMemberKey& key);
 
  private:
     using CrowdKey = std::tuple<int, int64_t, int>;  // type, start, purpose
@@ -58,13 +63,15 @@ class VSStoreMatcher {
         size_t origin;
         /// The creation's second; none: any.
         uint64_t fingerprint(std::optional<int64_t> second) const;
+        /// Of a row that agrees in every bit.
+        uint64_t exactFingerprint(double value, int64_t creation, std::optional<int> offset) const;
     };
 
-    enum class Likeness { None, Rounded, Same };
+    enum class Likeness { None, Rounded, Same, Identical };
 
     template <typename Visit>
     void forEachRow(const VSSample& sample, Visit visit);
-    /// Calls search(isWanted) for the same values, and where there are none for what rounds to them.
+    /// Calls search(isWanted) for each likeness that there is, the greatest first, until one is found.
     template <typename Search>
     static int64_t closest(Search search);
     int64_t findInCrowd(const VSSample& sample, int64_t metadata, VSCrowdedStart& crowd,

@@ -22,10 +22,6 @@ inline constexpr VSDuration longSpan = std::chrono::hours(48);
 #define VS_LONG_SPAN_SQL "172800000000"
 static_assert(longSpan.count() == 172800000000);
 
-/// The dates that samples may have: the years 1 to 9999.
-inline constexpr VSDate earliestDate = VSDate::fromSeconds(-62'135'596'800);
-inline constexpr VSDate latestDate = VSDate::fromSeconds(253'402'300'799);
-
 /// Makes the folder and the empty database file (readable by the user only) where they are missing, then
 /// opens the file, makes the tables of a new one, migrates an older one. Throws VSDatabaseFailure: Refused
 /// for another program's or a newer database, Corrupt for a damaged file, NotAccessible where it cannot be

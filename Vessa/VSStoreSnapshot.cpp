@@ -1,5 +1,6 @@
 #include "Vessa/VSStoreSnapshot.h"
 
+#include <algorithm>
 #include <queue>
 
 #include "Vessa/VSHealthStoreConnection.h"
@@ -131,6 +132,34 @@ VSResult<std::map<const VSObjectType*, VSStoreSnapshot::Extent>> VSStoreSnapshot
             if (extent.count > 0) extents[type] = {extent.count, VSDate::fromMicroseconds(extent.lastEnd)};
         }
         return extents;
+    });
+}
+
+VSResult<VSStoreSnapshot::Relations> VSStoreSnapshot::relations() {
+    return read([](VSStoreReader& reader) {
+        Relations relations;
+        auto workouts = reader.database().use(
+            "SELECT id FROM samples WHERE type = ? AND EXISTS (SELECT 1 FROM members WHERE parent = id) "
+            "ORDER BY start + duration, id");
+        workouts.bind(1, VSTypeCodeValue(VSCode::Workout));
+        while (workouts.step())
+            relations.workouts.emplace(VSObjectID(workouts.integer(0)),
+                                       static_cast<int64_t>(relations.workouts.size()) + 1);
+        std::unordered_set<VSObjectID> members;
+        auto rows = reader.database().use("SELECT parent, member FROM members");
+        while (rows.step()) {
+            const VSObjectID member{rows.integer(1)};
+            const auto workout = relations.workouts.find(VSObjectID(rows.integer(0)));
+            if (workout != relations.workouts.end())
+                relations.samplesOfWorkouts.emplace_back(member, workout->second);
+            else if (!members.insert(member).second)
+                relations.namedMembers.insert(member);
+        }
+        std::sort(relations.samplesOfWorkouts.begin(), relations.samplesOfWorkouts.end());
+        for (const auto& [sample, workout] : relations.samplesOfWorkouts) {
+            if (members.contains(sample)) relations.namedMembers.insert(sample);
+        }
+        return relations;
     });
 }
 

@@ -4,6 +4,9 @@
 #include <map>
 #include <memory>
 #include <optional>
+#include <unordered_map>
+#include <unordered_set>
+#include <utility>
 #include <vector>
 
 #include "Vessa/VSHealthStore.h"
@@ -31,6 +34,19 @@ class VSStoreSnapshot {
     };
     /// Of each type that has samples.
     VSResult<std::map<const VSObjectType*, Extent>> extents();
+
+    /// Which samples belong together beyond what they say themselves.
+    struct Relations {
+        /// The workouts that have samples, by their object, numbered from 1 in the order of their end.
+        std::unordered_map<VSObjectID, int64_t> workouts;
+        /// A sample and the number of a workout that it belongs to, ascending.
+        std::vector<std::pair<VSObjectID, int64_t>> samplesOfWorkouts;
+        /// The members of correlations that need a name to be told from equal ones: they are members more
+        /// than once, or belong to a workout too.
+        std::unordered_set<VSObjectID> namedMembers;
+    };
+    /// Memory holds all of them: some 16 bytes for each sample of a workout, 40 for each other member.
+    VSResult<Relations> relations();
 
     enum class Order { EndDate, Insertion };
     /// Gets so many samples at a time; false ends the reading.

@@ -1,70 +1,14 @@
 #include "Vessa/VSStoreWriter.h"
 
 #include <algorithm>
-#include <cmath>
 
+#include "Vessa/VSLimits.h"
 #include "Vessa/VSStoreSchema.h"
 
 namespace {
 
-/// Sums are exact as long as no value is so great; no measure of a person comes near it.
-constexpr double absurdValue = 0x1p47;
-
 int codeOf(const VSObjectType* type) {
     return VSTypeCodeValue(type->code());
-}
-
-std::optional<VSError> objectionToTotals(const VSWorkout& workout) {
-    static const VSUnit metre = VSUnit::fromString("m");
-    const auto bad = [](const std::optional<VSQuantity>& total, const VSUnit& unit) {
-        return total && (!total->isCompatibleWith(unit) || !std::isfinite(total->doubleValueForUnit(unit)));
-    };
-    if (bad(workout.totalEnergyBurned(), VSUnit::kilocalorieUnit()))
-        return VSError{VSErrorCode::Invalid, "a workout's energy is no amount of energy"};
-    if (bad(workout.totalDistance(), metre))
-        return VSError{VSErrorCode::Invalid, "a workout's distance is no length"};
-    if (workout.duration() < VSDuration(0))
-        return VSError{VSErrorCode::Invalid, "a workout's duration is negative"};
-    return std::nullopt;
-}
-
-/// What the values and the kind of object say against it.
-std::optional<VSError> objectionToContent(const VSSample& sample) {
-    const VSObjectType& type = *sample.sampleType();
-    const auto invalid = [&](const std::string& why) {
-        return VSError{VSErrorCode::Invalid, type.identifier() + ": " + why};
-    };
-    if (type.isQuantityType()) {
-        const auto* object = dynamic_cast<const VSQuantitySample*>(&sample);
-        if (!object) return invalid("needs a quantity sample");
-        if (!object->quantity().isCompatibleWith(type.canonicalUnit()))
-            return invalid("the unit " + object->quantity().unit().unitString() + " does not convert to " +
-                           type.canonicalUnit().unitString());
-        const double value = VSStoredValue(sample);
-        if (!std::isfinite(value)) return invalid("the value is not a finite number");
-        if (std::fabs(value) >= absurdValue) return invalid("the value is absurdly large");
-        return std::nullopt;
-    }
-    if (type.isCategoryType()) {
-        const auto* object = dynamic_cast<const VSCategorySample*>(&sample);
-        if (!object) return invalid("needs a category sample");
-        if (!type.enumeratedValues().empty() && !type.identifierForValue(object->value()))
-            return invalid("has no value " + std::to_string(object->value()));
-        return std::nullopt;
-    }
-    if (type.kind() == VSTypeKind::Workout) {
-        const auto* object = dynamic_cast<const VSWorkout*>(&sample);
-        return object ? objectionToTotals(*object) : invalid("needs a workout");
-    }
-    const auto* object = dynamic_cast<const VSCorrelation*>(&sample);
-    if (!object) return invalid("needs a correlation");
-    if (object->objects().empty()) return invalid("has no members");
-    for (const VSSamplePtr& member : object->objects()) {
-        if (!member->sampleType()->isQuantityType() && !member->sampleType()->isCategoryType())
-            return invalid("a member is neither a quantity nor a category sample");
-        if (auto objection = VSStoreWriter::objection(*member)) return objection;
-    }
-    return std::nullopt;
 }
 
 }  // namespace
@@ -117,22 +61,6 @@ void VSStoreWriter::finish() {
     updateMergedRollups();
     dropUnusedProvenances();
     database_.use("UPDATE state SET last = ?").bind(1, last_).run();
-}
-
-std::optional<VSError> VSStoreWriter::objection(const VSSample& sample) {
-    const VSObjectType* type = sample.sampleType();
-    if (!type || !type->isSampleType())
-        return VSError{VSErrorCode::Invalid, "an object has no type of which samples are kept"};
-    const auto invalid = [&](const char* why) {
-        return VSError{VSErrorCode::Invalid, type->identifier() + ": " + why};
-    };
-    if (sample.startDate() > sample.endDate()) return invalid("ends before it starts");
-    if (sample.startDate() < VSStoreSchema::earliestDate || sample.endDate() > VSStoreSchema::latestDate)
-        return invalid("lies outside of the years 1 to 9999");
-    const auto created = sample.creationDate();
-    if (created && (*created < VSStoreSchema::earliestDate || *created > VSStoreSchema::latestDate))
-        return invalid("its creation date lies outside of the years 1 to 9999");
-    return objectionToContent(sample);
 }
 
 int64_t VSStoreWriter::insertAlone(const VSSample& sample, VSDate now) {
@@ -226,20 +154,23 @@ int64_t VSStoreWriter::find(const VSSample& sample, const std::set<int64_t>& oth
         VSSampleRow row;
         return matcher_.row({sample.sampleType(), sample.startDate().microseconds(), id}, row) ? id : 0;
     }
-    int64_t newest = 0;
-    matcher_.find(sample, [&](int64_t found) {
-        if (!others.contains(found)) newest = found;
-        return false;
-    });
-    return newest;
+    return matcher_.newest(sample, others);
 }
 
-void VSStoreWriter::addToWorkout(int64_t workout, const VSMemberKey& sample) {
-    auto known = database_.use("SELECT 1 FROM members WHERE parent = ? AND member = ?");
-    if (known.bind(1, workout).bind(2, sample.id).step()) return;
+bool VSStoreWriter::addToWorkout(int64_t workout, const VSMemberKey& sample) {
+    auto parents = database_.use(
+        "SELECT parent IN (SELECT workout FROM workouts), parent FROM members WHERE member = ?");
+    parents.bind(1, sample.id);
+    size_t workouts = 0;
+    while (parents.step()) {
+        if (parents.integer(1) == workout) return true;
+        workouts += parents.integer(0) ? 1 : 0;
+    }
+    if (workouts >= VSLimits::mostWorkouts) return false;
     auto next = database_.use("SELECT coalesce(max(position), -1) + 1 FROM members WHERE parent = ?");
     next.bind(1, workout).step();
     insertMember(workout, static_cast<int>(next.integer(0)), sample);
+    return true;
 }
 
 void VSStoreWriter::touch(const VSObjectType* type) {

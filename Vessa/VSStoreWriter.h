@@ -29,11 +29,9 @@ class VSStoreWriter {
     void finish();
     void abandon();
 
-    /// Why a sample cannot be saved; none: it can.
-    static std::optional<VSError> objection(const VSSample& sample);
-    /// Saves a sample without objection; a correlation with those members that are not in the store yet. An
+    /// Saves a sample; a correlation with those members that are not in the store yet. An
     /// object given twice within a transaction, alone and as a member, is saved once. Returns its number.
-    /// REQUIRES: the sample lives until the transaction ends.
+    /// REQUIRES: the sample lives until the transaction ends; nothing is said against it (VSLimits.h).
     int64_t insert(const VSSample& sample, VSDate now);
     /// A sample of any kind without its members.
     int64_t insertAlone(const VSSample& sample, VSDate now);
@@ -49,8 +47,8 @@ class VSStoreWriter {
     /// the correlations that went with their last members.
     int64_t removeNumbers(const VSObjectType* type, const VSNumberRanges& numbers,
                           const std::function<bool(const VSSampleRow&)>& accept = nullptr);
-    /// Relates a saved sample to a saved workout, once.
-    void addToWorkout(int64_t workout, const VSMemberKey& sample);
+    /// Relates a saved sample to a saved workout, once. False: it belongs to too many.
+    bool addToWorkout(int64_t workout, const VSMemberKey& sample);
     /// Notes a change of something that queries of the type watch.
     void touch(const VSObjectType* type);
 

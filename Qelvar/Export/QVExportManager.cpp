@@ -111,6 +111,9 @@ VSResult<std::filesystem::path> QVExportManager::exportAll() {
     sem_ = std::make_unique<std::counting_semaphore<>>(0);
     pages_ = std::make_unique<std::counting_semaphore<>>(kPagesWaiting);
     openDocuments();
+    auto relations = snapshot_->relations();
+    if (!relations) return relations.error();
+    writer_->setRelations(std::move(*relations));
     writePerson();
     writeAllTypes();
     completeAndCloseStreamingXML();
@@ -175,9 +178,9 @@ void QVExportManager::writePerson() {
     const int bloodType = readPerson(snapshot_->characteristic(VSCode::BloodType), "blood type");
     const int skinType =
         readPerson(snapshot_->characteristic(VSCode::FitzpatrickSkinType), "fitzpatrick skin type");
-    writer_->writeXMLPersonWithDateOfBirth(now, birthDate, sex, bloodType, skinType);
-    // Here, before the first type: the header stands before the first section.
     const auto medicalID = readPerson(snapshot_->medicalID(), "medical ID");
+    writer_->writeXMLPersonWithDateOfBirth(now, birthDate, sex, bloodType, skinType, medicalID);
+    // Here, before the first type: the header stands before the first section.
     const std::string name = medicalID ? medicalID->name.value_or("") : "";
     writerCDA_->writeCDAHeaderWithName(now, name, birthDate, sex);
 }

@@ -2,10 +2,8 @@
 
 #include <array>
 #include <string>
-#include <string_view>
 
 #include "Vessa/Base/VSDate.h"
-#include "Vessa/Base/VSValue.h"
 
 // The texts of an export. None of them depends on a locale: digits are always 0 to 9 and years those of the
 // Gregorian calendar, so that a time means the same wherever the document is read. Pure functions; any
@@ -15,14 +13,6 @@
 std::string QVExportNumberText(double number);
 /// All digits that it takes to read the same number back: "41.5", "100000", "1e+300".
 std::string QVExportDefaultNumberText(double number);
-
-/// Whether XML can hold the text: UTF-8 without control characters (but tabs and line ends) and
-/// noncharacters.
-bool QVExportIsXMLText(std::string_view text);
-/// The same with U+FFFD in the place of what XML cannot hold.
-std::string QVExportXMLText(std::string_view text);
-/// The value for a processing instruction: VSValue::serialized(), with escapes where XML cannot hold it.
-std::string QVExportExactValueText(const VSValue& value);
 
 /// Dates, all with one offset from Greenwich: that of the user's zone at the moment of the export, also for
 /// dates on the other side of a change of the clocks. Fractions of seconds are dropped. Used by one thread.

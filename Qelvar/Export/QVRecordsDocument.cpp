@@ -1,10 +1,12 @@
 #include "Qelvar/Export/QVRecordsDocument.h"
 
+#include <bit>
+#include <cstdint>
 #include <cstdio>
 
 #include "Qelvar/Export/QVRecordsDeclaration.h"
 #include "Qelvar/Import/QVImportText.h"
-#include "Qelvar/Import/QVRecordElement.h"
+#include "Qelvar/Import/QVXMLText.h"
 
 namespace {
 
@@ -22,6 +24,18 @@ const std::string& characteristicText(VSTypeCode code, int value) {
     return identifier ? *identifier : *type->identifierForValue(0);
 }
 
+double minutes(VSDuration duration) {
+    return VSSecondsFromDuration(duration) / 60;
+}
+
+/// Whether an import makes the very number of the text, which is in `unit`.
+bool isReadAs(const std::string& text, const VSUnit& unit, double exact, const VSUnit& canonical) {
+    const auto read = QVImportNumberFromText(text);
+    if (!read) return false;
+    const auto converted = unit.convert(*read, canonical);
+    return converted && std::bit_cast<int64_t>(*converted) == std::bit_cast<int64_t>(exact);
+}
+
 }  // namespace
 
 const std::string& QVDeviceTexts::textOf(const VSSample& sample) {
@@ -34,22 +48,25 @@ const std::string& QVDeviceTexts::textOf(const VSSample& sample) {
 }
 
 QVRecordsDocument::QVRecordsDocument(const QVExportFile& file, int secondsFromGMT, const QVExportUnits& units)
-    : secondsFromGMT_(secondsFromGMT), writer_(file), dates_(secondsFromGMT), units_(units) {}
+    : writer_(file), exact_(writer_, secondsFromGMT), dates_(secondsFromGMT), units_(units) {}
 
 void QVRecordsDocument::open(const std::string& locale) {
     writer_.startDocument("1.0", "UTF-8");
     writer_.documentType("HealthData", kQVRecordsDeclaration);
     writer_.startElement("HealthData");
     writer_.attribute("locale", locale);
+    exact_.writeVersion();
 }
 
 void QVRecordsDocument::writeXMLPersonWithDateOfBirth(VSDate now,
                                                       const std::optional<VSBirthDate>& dateOfBirth,
-                                                      int biologicalSex, int bloodType, int skinType) {
+                                                      int biologicalSex, int bloodType, int skinType,
+                                                      const std::optional<VSMedicalIDData>& medicalID) {
     writer_.startElement("ExportDate");
     writer_.attribute("value", dates_.recordsString(now));
     writer_.endElement();
 
+    if (medicalID) exact_.writeMedicalID(*medicalID);
     writer_.startElement("Me");
     writer_.attribute("VSCharacteristicTypeIdentifierDateOfBirth", birthDateText(dateOfBirth));
     writer_.attribute("VSCharacteristicTypeIdentifierBiologicalSex",
@@ -64,20 +81,27 @@ void QVRecordsDocument::writeXMLPersonWithDateOfBirth(VSDate now,
 QVRecordsDocument::Value QVRecordsDocument::valueOf(const VSSample& sample) const {
     if (const auto* quantity = dynamic_cast<const VSQuantitySample*>(&sample)) {
         const VSUnit& unit = units_.preferredUnitForObjectType(sample.sampleType());
-        return {unit.description(), QVExportNumberText(quantity->quantity().doubleValueForUnit(unit)), true};
+        const VSUnit& canonical = sample.sampleType()->canonicalUnit();
+        const double exact = quantity->quantity().value();
+        Value value{unit.description(), QVExportNumberText(quantity->quantity().doubleValueForUnit(unit)),
+                    true, std::nullopt};
+        if (!isReadAs(value.text, unit, exact, canonical)) value.exact = exact;
+        return value;
     }
     if (const auto* category = dynamic_cast<const VSCategorySample*>(&sample)) {
         if (const std::string* identifier = sample.sampleType()->identifierForValue(category->value()))
-            return {{}, *identifier, true};
+            return {{}, *identifier, true, std::nullopt};
     }
     return {};
 }
 
 void QVRecordsDocument::writeRecord(const VSSample& sample) {
+    exact_.writeRelations(sample);
     writeXMLRecordWithType(sample, valueOf(sample));
 }
 
 void QVRecordsDocument::writeXMLRecordWithType(const VSSample& sample, const Value& value) {
+    if (value.exact) exact_.writeValue("value", VSValue(*value.exact));
     startElement("Record", sample);
     writer_.attribute("type", sample.sampleType()->identifier());
     writeOrigin(sample);
@@ -89,8 +113,12 @@ void QVRecordsDocument::writeXMLRecordWithType(const VSSample& sample, const Val
 }
 
 void QVRecordsDocument::writeCorrelation(const VSCorrelation& correlation) {
+    exact_.writeRelations(correlation);
     writeXMLCorrelationStartWithType(correlation);
-    for (const VSSamplePtr& member : correlation.objects()) writeRecord(*member);
+    for (const VSSamplePtr& member : correlation.objects()) {
+        exact_.writeMember(*member);
+        writeXMLRecordWithType(*member, valueOf(*member));
+    }
     writeXMLCorrelationEnd();
 }
 
@@ -103,6 +131,7 @@ void QVRecordsDocument::writeXMLCorrelationStartWithType(const VSCorrelation& co
 }
 
 void QVRecordsDocument::writeWorkout(const VSWorkout& workout) {
+    exact_.writeRelations(workout);
     writeXMLWorkoutStartWithActivityType(workout);
     for (const VSWorkoutEvent& event : workout.workoutEvents()) writeXMLWorkoutEventWithEventType(event);
     writeXMLWorkoutEnd();
@@ -118,13 +147,13 @@ void QVRecordsDocument::writeXMLWorkoutStartWithActivityType(const VSWorkout& wo
     const VSUnit& energyUnit =
         units_.preferredUnitForObjectType(VSObjectType::dataTypeWithCode(VSCode::ActiveEnergyBurned));
 
-    if (!activity) writeExactValue("workoutActivityType", VSValue(workout.workoutActivityType()));
-    writeExactZero("totalDistance", workout.totalDistance());
-    writeExactZero("totalEnergyBurned", workout.totalEnergyBurned());
+    if (!activity) exact_.writeValue("workoutActivityType", VSValue(workout.workoutActivityType()));
+    writeExactDuration(workout.duration());
+    writeExactTotal("totalDistance", workout.totalDistance(), distanceUnit, VSCode::DistanceWalkingRunning);
+    writeExactTotal("totalEnergyBurned", workout.totalEnergyBurned(), energyUnit, VSCode::ActiveEnergyBurned);
     startElement("Workout", workout);
     if (activity) writer_.attribute("workoutActivityType", *activity);
-    writeAmount("duration", "durationUnit", VSSecondsFromDuration(workout.duration()) / 60,
-                VSUnit::minuteUnit().description());
+    writeAmount("duration", "durationUnit", minutes(workout.duration()), VSUnit::minuteUnit().description());
     writeAmount("totalDistance", "totalDistanceUnit", amount(workout.totalDistance(), distanceUnit),
                 distanceUnit.description());
     writeAmount("totalEnergyBurned", "totalEnergyBurnedUnit", amount(workout.totalEnergyBurned(), energyUnit),
@@ -135,7 +164,8 @@ void QVRecordsDocument::writeXMLWorkoutStartWithActivityType(const VSWorkout& wo
 }
 
 void QVRecordsDocument::writeXMLWorkoutEventWithEventType(const VSWorkoutEvent& event) {
-    if (event.type != 1 && event.type != 2) writeExactValue("type", VSValue(event.type));
+    if (event.type != 1 && event.type != 2) exact_.writeValue("type", VSValue(event.type));
+    if (event.date) exact_.writeEventDate(*event.date);
     writer_.startElement("WorkoutEvent");
     if (event.type == 1) writer_.attribute("type", "VSWorkoutEventTypePause");
     if (event.type == 2) writer_.attribute("type", "VSWorkoutEventTypeResume");
@@ -146,10 +176,7 @@ void QVRecordsDocument::writeXMLWorkoutEventWithEventType(const VSWorkoutEvent& 
 // --- What the elements share ----------------------------------------------------------------------------
 
 void QVRecordsDocument::startElement(const char* name, const VSSample& sample) {
-    writeExactText("sourceName", sample.sourceRevision().source.name);
-    writeExactText("sourceVersion", sample.sourceRevision().version);
-    writeExactText("device", devices_.textOf(sample));
-    writeExactOffset(sample);
+    exact_.writeProvenance(sample, devices_.textOf(sample));
     writer_.startElement(name);
 }
 
@@ -178,9 +205,9 @@ void QVRecordsDocument::writeAmount(const char* name, const char* unitName, doub
 void QVRecordsDocument::writeMetadata(const VSMetadata& metadata) {
     for (const auto& [key, value] : metadata) {
         const std::string text = value.description();
-        writeExactText("key", key);
-        if (!QVExportIsXMLText(text) || QVMetadataValueFromText(key, text) != value)
-            writeExactValue("value", value);
+        exact_.writeText("key", key);
+        if (!QVIsXMLText(text) || QVMetadataValueFromText(key, text) != value)
+            exact_.writeValue("value", value);
         writer_.startElement("MetadataEntry");
         writer_.attribute("key", key);
         writer_.attribute("value", text);
@@ -188,27 +215,18 @@ void QVRecordsDocument::writeMetadata(const VSMetadata& metadata) {
     }
 }
 
-/// What an attribute of the next element cannot say. Others pass over the instruction; the import reads it.
-void QVRecordsDocument::writeExactValue(const char* attribute, const VSValue& value) {
-    const std::string content = std::string(attribute) + " " + QVExportExactValueText(value);
-    writer_.processingInstruction(kQVExactValueTarget, std::span(&content, 1));
-}
-
 /// 0 is also what a workout without that total says.
-void QVRecordsDocument::writeExactZero(const char* attribute, const std::optional<VSQuantity>& total) {
-    if (total && total->value() == 0) writeExactValue(attribute, VSValue(0));
+void QVRecordsDocument::writeExactTotal(const char* name, const std::optional<VSQuantity>& total,
+                                        const VSUnit& unit, VSTypeCode type) {
+    if (!total) return;
+    const VSUnit& canonical = VSObjectType::dataTypeWithCode(type)->canonicalUnit();
+    const double exact = total->doubleValueForUnit(canonical);
+    const std::string text = QVExportDefaultNumberText(total->doubleValueForUnit(unit));
+    if (exact == 0 || !isReadAs(text, unit, exact, canonical)) exact_.writeValue(name, VSValue(exact));
 }
 
-void QVRecordsDocument::writeExactText(const char* attribute, const std::string& text) {
-    if (!QVExportIsXMLText(text)) writeExactValue(attribute, VSValue(text));
-}
-
-/// All dates have the offset of the export. What was noted at home needs no word; a journey does, for a night
-/// abroad stands at the hours lived there.
-void QVRecordsDocument::writeExactOffset(const VSSample& sample) {
-    const auto noted = sample.timeZoneOffset();
-    const VSDate start = sample.startDate();
-    if (!noted || *noted == secondsFromGMT_) return;
-    if (!home_.contains(*noted, start) || !home_.contains(secondsFromGMT_, start))
-        writeExactValue("startDate", VSValue(*noted));
+void QVRecordsDocument::writeExactDuration(VSDuration duration) {
+    const auto seconds = VSUnit::minuteUnit().convert(minutes(duration), VSUnit::secondUnit());
+    if (VSDurationFromSeconds(*seconds) != duration)
+        exact_.writeValue("duration", VSValue(int64_t{duration.count()}));
 }

@@ -4,10 +4,10 @@
 #include <optional>
 #include <string>
 
+#include "Qelvar/Export/QVExactWriter.h"
 #include "Qelvar/Export/QVExportText.h"
 #include "Qelvar/Export/QVExportUnits.h"
 #include "Qelvar/Export/QVXMLWriter.h"
-#include "Vessa/Base/VSHomeOffsets.h"
 #include "Vessa/VSHealthStore.h"
 #include "Vessa/VSObject.h"
 
@@ -32,8 +32,11 @@ class QVRecordsDocument {
 
     /// The declaration and the beginning of the root.
     void open(const std::string& locale);
+    /// REQUIRES: called before the first record, where samples belong together.
+    void setRelations(VSStoreSnapshot::Relations relations) { exact_.setRelations(std::move(relations)); }
     void writeXMLPersonWithDateOfBirth(VSDate now, const std::optional<VSBirthDate>& dateOfBirth,
-                                       int biologicalSex, int bloodType, int skinType);
+                                       int biologicalSex, int bloodType, int skinType,
+                                       const std::optional<VSMedicalIDData>& medicalID);
     // One record of each kind.
     void writeRecord(const VSSample& sample);
     void writeCorrelation(const VSCorrelation& correlation);
@@ -47,6 +50,7 @@ class QVRecordsDocument {
     struct Value {
         std::string unit, text;
         bool present = false;
+        std::optional<double> exact;  // in the canonical unit, where the text does not give it back
     };
     Value valueOf(const VSSample& sample) const;
     void writeXMLRecordWithType(const VSSample& sample, const Value& value);
@@ -61,14 +65,12 @@ class QVRecordsDocument {
     void writeDates(const VSSample& sample);
     void writeAmount(const char* name, const char* unitName, double amount, const std::string& unit);
     void writeMetadata(const VSMetadata& metadata);
-    void writeExactValue(const char* attribute, const VSValue& value);
-    void writeExactZero(const char* attribute, const std::optional<VSQuantity>& total);
-    void writeExactText(const char* attribute, const std::string& text);
-    void writeExactOffset(const VSSample& sample);
+    void writeExactTotal(const char* name, const std::optional<VSQuantity>& total, const VSUnit& unit,
+                         VSTypeCode type);
+    void writeExactDuration(VSDuration duration);
 
-    const int secondsFromGMT_;
-    VSHomeOffsets home_{VSCalendar::current()};
     QVXMLWriter writer_;
+    QVExactWriter exact_;
     QVExportDateFormatter dates_;
     const QVExportUnits& units_;
     QVDeviceTexts devices_;

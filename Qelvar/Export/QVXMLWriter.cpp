@@ -6,7 +6,7 @@
 #include <cerrno>
 #include <vector>
 
-#include "Qelvar/Export/QVExportText.h"
+#include "Qelvar/Import/QVXMLText.h"
 #include "Vessa/VSDatabase.h"
 
 namespace {
@@ -80,8 +80,8 @@ QVXMLWriter::QVXMLWriter(const QVExportFile& file) : file_(std::make_unique<File
 QVXMLWriter::~QVXMLWriter() = default;
 
 const xmlChar* QVXMLWriter::clean(const std::string& text) {
-    if (QVExportIsXMLText(text)) return xml(text.c_str());
-    cleaned_ = QVExportXMLText(text);
+    if (QVIsXMLText(text)) return xml(text.c_str());
+    cleaned_ = QVXMLText(text);
     return xml(cleaned_.c_str());
 }
 

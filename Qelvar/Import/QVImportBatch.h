@@ -17,12 +17,14 @@
 struct QVImportPerson {
     std::optional<VSBirthDate> birthDate;
     int biologicalSex = 0, bloodType = 0, skinType = 0;  // 0: not set
+    std::optional<VSMedicalIDData> medicalID;
 };
 
 /// A top-level record that was understood, and where it stands.
 struct QVImportItem {
     std::variant<VSQuantitySample, VSCategorySample, VSCorrelation, VSWorkout> sample;
     int64_t line = 0;
+    std::unique_ptr<const VSImportRelations> relations;  // null: none
 
     const VSSample& get() const {
         return std::visit([](const auto& kind) -> const VSSample& { return kind; }, sample);

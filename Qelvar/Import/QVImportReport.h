@@ -40,7 +40,8 @@ struct QVImportReport {
     std::vector<QVImportRefusal> refusals;            // the first ones in full, in the order of the documents
     std::map<std::string, int64_t> refusalsByReason;  // of records; they make total.refused
     std::map<std::string, int64_t> partRefusalsByReason;  // of smaller parts: a metadata entry, an event ...
-    int characteristicsSet = 0;        // characteristics of the person that were not set before
+    int characteristicsSet =
+        0;  // characteristics of the person, and the Medical ID, that were not set before
     std::vector<std::string> notes;    // what was passed over, such as another document in an archive
     std::optional<VSDate> exportDate;  // the latest one that the documents give
 

@@ -32,11 +32,13 @@ std::optional<int64_t> dayNumber(int year, int month, int day) {
     return std::chrono::sys_days(date).time_since_epoch().count();
 }
 
-/// The day number of "yyyy-MM-dd".
-std::optional<int64_t> dayFromText(const char* text) {
-    if (text[4] != '-' || text[7] != '-') return std::nullopt;
-    const int year = digits(text, 4), month = digits(text + 5, 2), day = digits(text + 8, 2);
-    if (year < 1 || month < 1 || day < 1) return std::nullopt;
+/// The day number of "yyyy-MM-dd", whose year may have five digits and be 0: what a zone makes of the first
+/// and the last day of the years 1 to 9999.
+std::optional<int64_t> dayFromText(const char* text, int yearDigits = 4) {
+    const char* const rest = text + yearDigits;
+    if (rest[0] != '-' || rest[3] != '-') return std::nullopt;
+    const int year = digits(text, yearDigits), month = digits(rest + 1, 2), day = digits(rest + 4, 2);
+    if (year < 0 || month < 1 || day < 1) return std::nullopt;
     return dayNumber(year, month, day);
 }
 
@@ -59,10 +61,13 @@ std::optional<int> offsetFromText(const char* text) {
 }
 
 std::optional<QVImportDate> plainDate(std::string_view text) {
-    if (text.size() != kDateLength || text[10] != ' ' || text[19] != ' ') return std::nullopt;
-    const std::optional<int64_t> day = dayFromText(text.data());
-    const int time = timeFromText(text.data() + 11);
-    const std::optional<int> offset = offsetFromText(text.data() + 20);
+    if (text.size() < kDateLength || text.size() > kDateLength + 1) return std::nullopt;
+    const int extra = text.size() > kDateLength ? 1 : 0;
+    const char* const rest = text.data() + extra;
+    if (rest[10] != ' ' || rest[19] != ' ') return std::nullopt;
+    const std::optional<int64_t> day = dayFromText(text.data(), 4 + extra);
+    const int time = timeFromText(rest + 11);
+    const std::optional<int> offset = offsetFromText(rest + 20);
     if (!day || time < 0 || !offset) return std::nullopt;
     return QVImportDate{VSDate::fromSeconds(*day * 86'400 + time - *offset), *offset};
 }
@@ -100,7 +105,8 @@ std::optional<QVImportDate> QVImportDateFromText(std::string_view text) {
 
 std::optional<VSBirthDate> QVImportBirthDateFromText(std::string_view text) {
     const auto ascii = text.size() <= 64 ? asciiText(text) : std::nullopt;
-    if (!ascii || ascii->size() != 10 || !dayFromText(ascii->data())) return std::nullopt;
+    if (!ascii || ascii->size() != 10 || !dayFromText(ascii->data()) || ascii->starts_with("0000"))
+        return std::nullopt;
     return VSBirthDate{digits(ascii->data(), 4), digits(ascii->data() + 5, 2), digits(ascii->data() + 8, 2)};
 }
 

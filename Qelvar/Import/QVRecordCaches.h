@@ -30,7 +30,10 @@ class QVInterned {
         auto found = values_.find(text);
         if (found == values_.end()) {
             // A document with ever new names must not fill the memory; forgetting costs only time.
-            if (values_.size() >= kGreatestSize) values_.clear();
+            if (values_.size() >= kGreatestSize || (bytes_ += text.size()) > kMostBytes) {
+                values_.clear();
+                bytes_ = text.size();
+            }
             found = values_.emplace(std::string(text), std::make_shared<const T>(make())).first;
         }
         last_ = &*found;
@@ -38,9 +41,10 @@ class QVInterned {
     }
 
  private:
-    static constexpr size_t kGreatestSize = 20'000;
+    static constexpr size_t kGreatestSize = 20'000, kMostBytes = 16'000'000;
     using Map = std::unordered_map<std::string, std::shared_ptr<const T>, QVTextHash, std::equal_to<>>;
     Map values_;
+    size_t bytes_ = 0;
     const typename Map::value_type* last_ = nullptr;
 };
 

@@ -1,6 +1,17 @@
 #include "Qelvar/Import/QVRecordElement.h"
 
+#include "Qelvar/Import/QVExactInstructions.h"
 #include "Qelvar/Import/QVImportText.h"
+
+const VSValue* QVElement::exactValue(QVAttributeName attribute) const {
+    if (!exact) return nullptr;
+    const auto found = exact->attributes.find(attribute);
+    return found == exact->attributes.end() ? nullptr : &found->second;
+}
+
+VSDuration QVElement::microsecondsOf(size_t date) const {
+    return VSDuration(exact ? exact->microsecondsOf(date) : 0);
+}
 
 std::string QVElement::excerpt() const {
     constexpr size_t kLength = 240;

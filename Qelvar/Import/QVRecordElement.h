@@ -2,10 +2,10 @@
 
 #include <array>
 #include <cstdint>
-#include <map>
 #include <string>
 #include <string_view>
 
+#include "Vessa/Base/VSDate.h"
 #include "Vessa/Base/VSValue.h"
 
 // The elements and attributes of a records document.
@@ -74,11 +74,7 @@ inline constexpr std::array<const char*, kQVAttributeCount> kQVAttributeNames{
     "VSCharacteristicTypeIdentifierBloodType",
     "VSCharacteristicTypeIdentifierFitzpatrickSkinType"};
 
-/// The processing instruction before an element that says an attribute of it exactly, where the attribute's
-/// text cannot: characters that XML does not have, metadata that are no texts, numbers without an identifier,
-/// a total of zero. Its content is the attribute's name, a blank and the value as VSValue::serialized()
-/// writes it.
-inline constexpr const char* kQVExactValueTarget = "qelvar-exact";
+struct QVExactFacts;
 
 /// The start tag of an element. The texts are valid only while it is being handled.
 struct QVElement {
@@ -87,19 +83,17 @@ struct QVElement {
     int64_t line = 0;
     uint32_t present = 0;  // a bit for each attribute that is there
     std::array<std::string_view, kQVAttributeCount> values;
-    const std::map<QVAttributeName, VSValue>* exactValues = nullptr;  // null: none
+    const QVExactFacts* exact = nullptr;  // what instructions say of it; null: nothing
 
     bool has(QVAttributeName attribute) const { return present >> static_cast<unsigned>(attribute) & 1U; }
     /// Empty when it is not there.
     std::string_view operator[](QVAttributeName attribute) const {
         return has(attribute) ? values[static_cast<size_t>(attribute)] : std::string_view();
     }
-    /// Null: what the text says.
-    const VSValue* exactValue(QVAttributeName attribute) const {
-        if (!exactValues) return nullptr;
-        const auto found = exactValues->find(attribute);
-        return found == exactValues->end() ? nullptr : &found->second;
-    }
+    /// What an instruction says of the attribute; null: nothing.
+    const VSValue* exactValue(QVAttributeName attribute) const;
+    /// The microseconds beyond the second that the date says.
+    VSDuration microsecondsOf(size_t date) const;
     /// The beginning of the element, for a message.
     std::string excerpt() const;
 };

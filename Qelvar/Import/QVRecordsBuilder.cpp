@@ -5,9 +5,15 @@
 #include <cstdint>
 #include <cstdlib>
 
+#include "Vessa/VSLimits.h"
+#include "Vessa/VSMedicalID.h"
+
 namespace {
 
-constexpr size_t kLongestAttribute = 64 * 1024;
+/// An exact value may be shorter than its text: a date is.
+constexpr size_t kLongestMetadataTexts = 4 * VSLimits::longestMetadata;
+constexpr size_t kGreatestBatch = 4 * 1024 * 1024;
+constexpr int kAllDigits = 14;  // that survive a conversion and back
 constexpr size_t kListedUnknownTypes = 200;
 constexpr const char* kOtherUnknownTypes = "(other unknown types)";
 
@@ -19,9 +25,14 @@ std::string attributeName(QVAttributeName attribute) {
     return kQVAttributeNames[static_cast<size_t>(attribute)];
 }
 
-constexpr int kGreatestOffset = 18 * 3600;  // seconds
+/// How long an attribute can be at most so that the store takes what it says.
+size_t longestText(QVAttributeName attribute) {
+    constexpr size_t deviceFields = 8, escaped = 2;
+    const bool isDevice = attribute == QVAttributeName::Device;
+    return isDevice ? deviceFields * (escaped * VSLimits::longestText + 32) : VSLimits::longestText;
+}
 
-/// The number of a thing that has no identifier.
+/// Of a thing that has no identifier: the number that stands for it.
 std::optional<int> exactNumber(const QVElement& element, QVAttributeName attribute) {
     const VSValue* exact = element.exactValue(attribute);
     const auto number = exact ? exact->integer() : std::nullopt;
@@ -37,17 +48,20 @@ void QVRecordsBuilder::Draft::reset() {
     quantity.reset();
     value = 0;
     metadata.clear();
+    metadataBytes = 0;
+    relations = {};
     refusal.reset();
 }
 
-QVRecordsBuilder::QVRecordsBuilder(const Limits& limits, QVImportQueue& queue)
-    : limits_(limits), queue_(queue), counts_(128) {
+QVRecordsBuilder::QVRecordsBuilder(size_t listedRefusals, QVImportQueue& queue)
+    : listedRefusals_(listedRefusals), queue_(queue), counts_(128) {
     batch_.items.reserve(QVImportBatch::kSize);
 }
 
 void QVRecordsBuilder::beginDocument(const std::string& name) {
     batch_.document = std::make_shared<const std::string>(name);
     report_.documents.push_back(name);
+    instructions_ = {};
 }
 
 void QVRecordsBuilder::endDocument() {
@@ -126,9 +140,10 @@ void QVRecordsBuilder::startWorkout(const QVElement& element) {
     if (!problem) problem = readDates(element, record_);
     if (!problem) problem = readOrigin(element, record_);
     if (!problem) {
-        auto activity = VSWorkoutActivityTypeForIdentifier(givenType_);
-        if (!activity) activity = exactNumber(element, QVAttributeName::WorkoutActivityType);
-        if (!activity && !element.has(QVAttributeName::WorkoutActivityType))
+        const bool isGiven = element.has(QVAttributeName::WorkoutActivityType);
+        const auto activity = isGiven ? VSWorkoutActivityTypeForIdentifier(givenType_)
+                                      : exactNumber(element, QVAttributeName::WorkoutActivityType);
+        if (!activity && !isGiven)
             problem = Problem{"missing attribute", attributeName(QVAttributeName::WorkoutActivityType)};
         else if (!activity)
             problem =
@@ -151,15 +166,16 @@ void QVRecordsBuilder::startWorkout(const QVElement& element) {
 void QVRecordsBuilder::addMetadata(const QVElement& element, Draft& draft) {
     if (draft.refusal) return;
     const std::string_view key = element[QVAttributeName::Key], value = element[QVAttributeName::Value];
-    if (key.empty()) return refuse(element, {"missing attribute", attributeName(QVAttributeName::Key)});
-    if (!element.has(QVAttributeName::Value))
-        return refuse(element, {"missing attribute", attributeName(QVAttributeName::Value)});
-    if (key.size() > kLongestAttribute || value.size() > kLongestAttribute) {
-        return refuse(element,
-                      {"attribute too long", std::to_string(std::max(key.size(), value.size())) + " bytes"});
+    for (const auto attribute : {QVAttributeName::Key, QVAttributeName::Value}) {
+        if (!element.has(attribute)) return refuse(element, {"missing attribute", attributeName(attribute)});
     }
+    const size_t bytes = key.size() + value.size();
+    if (draft.metadataBytes + bytes > kLongestMetadataTexts)
+        return refuse(element, {"attribute too long", std::to_string(bytes) + " bytes"});
+    draft.metadataBytes += bytes;
     const VSValue* exact = element.exactValue(QVAttributeName::Value);
-    VSValue meant = exact ? *exact : QVMetadataValueFromText(key, value);
+    VSValue meant =
+        exact && QVExactAgrees(exact->description(), value) ? *exact : QVMetadataValueFromText(key, value);
     if (!draft.metadata.emplace(std::string(key), std::move(meant)).second) {
         refuse(element, {"metadata key given twice", attributeText(QVAttributeName::Key, key)});
     }
@@ -169,8 +185,8 @@ void QVRecordsBuilder::addWorkoutEvent(const QVElement& element) {
     if (record_.refusal) return;
     VSWorkoutEvent event;
     const std::string_view type = element[QVAttributeName::Type];
-    if (const auto number = exactNumber(element, QVAttributeName::Type))
-        event.type = *number;
+    if (!element.has(QVAttributeName::Type))
+        event.type = exactNumber(element, QVAttributeName::Type).value_or(0);
     else if (type == "VSWorkoutEventTypePause")
         event.type = 1;
     else if (type == "VSWorkoutEventTypeResume")
@@ -181,7 +197,7 @@ void QVRecordsBuilder::addWorkoutEvent(const QVElement& element) {
         QVImportDate date;
         if (auto problem = readDate(element[QVAttributeName::Date], QVAttributeName::Date, date))
             return refuse(element, std::move(*problem));
-        event.date = date.date;
+        event.date = date.date + element.microsecondsOf(QVExactStart);
     }
     workout_.events.push_back(event);
 }
@@ -206,8 +222,20 @@ void QVRecordsBuilder::readPerson(const QVElement& element) {
     readValue(QVAttributeName::BiologicalSex, VSCode::BiologicalSex, person.biologicalSex);
     readValue(QVAttributeName::BloodType, VSCode::BloodType, person.bloodType);
     readValue(QVAttributeName::FitzpatrickSkinType, VSCode::FitzpatrickSkinType, person.skinType);
+    if (element.exact && !element.exact->medicalID.empty()) readMedicalID(element, person);
     batch_.person = person;
     flush();
+}
+
+void QVRecordsBuilder::readMedicalID(const QVElement& element, QVImportPerson& person) {
+    const auto content = VSValue::fromSerialized(element.exact->medicalID);
+    if (!content || !content->dictionary()) return;
+    VSMedicalIDData data = VSMedicalIDFromContent(*content->dictionary());
+    if (const VSValue* picture = (*content)[kQVExactPicture]; picture && picture->data())
+        data.pictureData = *picture->data();
+    if (auto objection = VSObjectionToMedicalID(data))
+        return refuse(element, {"not a Medical ID", objection->message});
+    person.medicalID = std::move(data);
 }
 
 void QVRecordsBuilder::readExportDate(const QVElement& element) {
@@ -224,10 +252,10 @@ void QVRecordsBuilder::endRecord() {
     if (!record_.refusal) {
         finishMetadata(record_);
         if (record_.quantity)
-            emit<VSQuantitySample>(record_.line, record_.type, *record_.quantity, record_.start, record_.end,
+            emit<VSQuantitySample>(record_.type, *record_.quantity, record_.start, record_.end,
                                    std::move(record_.provenance));
         else
-            emit<VSCategorySample>(record_.line, record_.type, record_.value, record_.start, record_.end,
+            emit<VSCategorySample>(record_.type, record_.value, record_.start, record_.end,
                                    std::move(record_.provenance));
     }
 }
@@ -247,6 +275,7 @@ void QVRecordsBuilder::endMember() {
         else
             members_.push_back(std::make_shared<const VSCategorySample>(
                 member_.type, member_.value, member_.start, member_.end, member_.provenance));
+        record_.relations.members.push_back(member_.relations.number);
     }
     member_.reset();
 }
@@ -263,7 +292,7 @@ void QVRecordsBuilder::endCorrelation() {
     count(record_, givenType_);
     if (!record_.refusal) {
         finishMetadata(record_);
-        emit<VSCorrelation>(record_.line, record_.type, record_.start, record_.end, std::move(members_),
+        emit<VSCorrelation>(record_.type, record_.start, record_.end, std::move(members_),
                             std::move(record_.provenance));
         members_.clear();
     }
@@ -273,19 +302,17 @@ void QVRecordsBuilder::endWorkout() {
     count(record_, givenType_);
     if (record_.refusal) return;
     finishMetadata(record_);
-    emit<VSWorkout>(record_.line, record_.value, record_.start, record_.end, workout_.duration,
-                    workout_.energy, workout_.distance, std::move(workout_.events),
-                    std::move(record_.provenance));
+    emit<VSWorkout>(record_.value, record_.start, record_.end, workout_.duration, workout_.energy,
+                    workout_.distance, std::move(workout_.events), std::move(record_.provenance));
 }
 
 // --- Attributes -----------------------------------------------------------------------------------------
 
 QVRecordsBuilder::Check QVRecordsBuilder::checkLengths(const QVElement& element) {
     for (size_t i = 0; i < kQVAttributeCount; ++i) {
-        if (element.present >> i & 1U && element.values[i].size() > kLongestAttribute) {
-            return Problem{"attribute too long",
-                           attributeText(static_cast<QVAttributeName>(i), element.values[i])};
-        }
+        const auto attribute = static_cast<QVAttributeName>(i);
+        if (element.present >> i & 1U && element.values[i].size() > longestText(attribute))
+            return Problem{"attribute too long", attributeText(attribute, element.values[i])};
     }
     return {};
 }
@@ -315,12 +342,16 @@ QVRecordsBuilder::Check QVRecordsBuilder::readDates(const QVElement& element, Dr
         return Problem{"ends before it starts", attributeText(QVAttributeName::StartDate, startText) + ", " +
                                                     attributeText(QVAttributeName::EndDate, endText)};
     }
-    draft.start = start.date;
-    draft.end = end.date;
-    // The offset in the dates is that of the day of the export.
+    draft.start = start.date + element.microsecondsOf(QVExactStart);
+    draft.end = end.date + element.microsecondsOf(QVExactEnd);
+    if (draft.end < draft.start) {
+        draft.start = start.date;
+        draft.end = end.date;
+    }
+    // Earlier exports said the offset of a journey so.
     const auto noted = exactNumber(element, QVAttributeName::StartDate);
-    const bool isOffset = noted && std::abs(*noted) <= kGreatestOffset;
-    draft.provenance.timeZoneOffset = isOffset ? *noted : start.offset;
+    const bool isOffset = noted && std::abs(*noted) <= VSLimits::greatestTimeZoneOffset;
+    draft.provenance.timeZoneOffset = isOffset ? *noted : instructions_.timeZoneOffset(start.offset);
     if (element.has(QVAttributeName::CreationDate)) {
         QVImportDate creation = start;
         if (creationText == endText)
@@ -329,36 +360,49 @@ QVRecordsBuilder::Check QVRecordsBuilder::readDates(const QVElement& element, Dr
             if (Check problem = readDate(creationText, QVAttributeName::CreationDate, creation))
                 return problem;
         }
-        draft.provenance.creationDate = creation.date;
+        draft.provenance.creationDate = creation.date + element.microsecondsOf(QVExactCreation);
     }
     return {};
 }
 
 QVRecordsBuilder::Check QVRecordsBuilder::readDate(std::string_view text, QVAttributeName attribute,
-                                                   QVImportDate& date) const {
+                                                   QVImportDate& date) {
     if (text.empty()) return Problem{"missing attribute", attributeName(attribute)};
     const auto parsed = QVImportDateFromText(text);
     if (!parsed) return Problem{"not a date", attributeText(attribute, text)};
-    if (parsed->date < limits_.earliest)
-        return Problem{"absurd date", attributeText(attribute, text) + " lies before 1900"};
-    if (parsed->date > limits_.latest)
-        return Problem{"absurd date", attributeText(attribute, text) + " lies in the future"};
+    if (!VSLimits::isDate(parsed->date))
+        return Problem{"absurd date",
+                       attributeText(attribute, text) + " lies outside of the years 1 to 9999"};
     date = *parsed;
     return {};
 }
 
 QVRecordsBuilder::Check QVRecordsBuilder::readOrigin(const QVElement& element, Draft& draft) {
-    const std::string_view source = element[QVAttributeName::SourceName],
+    if (!element.has(QVAttributeName::SourceName))
+        return Problem{"missing attribute", attributeName(QVAttributeName::SourceName)};
+    const std::string_view name = element[QVAttributeName::SourceName],
                            version = element[QVAttributeName::SourceVersion];
-    if (source.empty()) return Problem{"missing attribute", attributeName(QVAttributeName::SourceName)};
-    revisionKey_.assign(source).append(1, '\0').append(version);
+    const std::optional<std::string>& identifier = instructions_.sources().identifierOf(name);
+    revisionKey_.assign(std::to_string(name.size())).append(1, ' ').append(name).append(version);
+    if (identifier)
+        revisionKey_.append(1, '\0')
+            .append(std::to_string(version.size()))
+            .append(1, ' ')
+            .append(*identifier);
     draft.provenance.sourceRevision = revisions_.get(revisionKey_, [&] {
-        return VSSourceRevision{VSSource::forImportedName(std::string(source)), std::string(version)};
+        VSSource source = VSSource::forImportedName(std::string(name));
+        if (identifier) source.bundleIdentifier = *identifier;
+        return VSSourceRevision{std::move(source), std::string(version)};
     });
-    if (const std::string_view device = element[QVAttributeName::Device]; !device.empty()) {
+    const std::string_view device = element[QVAttributeName::Device];
+    const VSValue* exactDevice = element.exactValue(QVAttributeName::Device);
+    if (!device.empty() || (exactDevice && exactDevice->dictionary())) {
         draft.provenance.device =
             devices_.get(device, [&] { return VSDevice::fromDescription(std::string(device)); });
     }
+    batchBytes_ += name.size() + version.size() + device.size();
+    draft.relations.number = element.exact ? element.exact->number : 0;
+    if (&draft == &record_) draft.relations.workouts = instructions_.workouts();
     return {};
 }
 
@@ -381,12 +425,15 @@ QVRecordsBuilder::Check QVRecordsBuilder::readQuantity(const QVElement& element,
     if (!unit.unit)
         return Problem{"unknown or unfit unit",
                        attributeText(QVAttributeName::Unit, unitText) + " (" + unit.problem + ")"};
-    if (*number < 0 && draft.type->isCumulative())
-        return Problem{"negative amount", attributeText(QVAttributeName::Value, text)};
     const VSUnit& canonical = draft.type->canonicalUnit();
     const auto value = unit.isCanonical ? number : unit.unit->convert(*number, canonical);
     if (!value || !std::isfinite(*value))
         return Problem{"not a number", attributeText(QVAttributeName::Value, text)};
+    const VSValue* exact = element.exactValue(QVAttributeName::Value);
+    if (exact && exact->number() && QVExactAgrees(*exact->number(), canonical, *number, *unit.unit, 6)) {
+        draft.quantity.emplace(canonical, *exact->number());
+        return {};
+    }
     // In the document's own unit: whether the store has it already is seen in the digits that stand there.
     draft.quantity.emplace(unit.isCanonical ? canonical : *unit.unit, *number);
     return {};
@@ -401,8 +448,8 @@ QVRecordsBuilder::Check QVRecordsBuilder::readAmount(const QVElement& element, Q
     if (text.empty()) return {};
     const auto number = QVImportNumberFromText(text);
     if (!number) return Problem{"not a number", attributeText(amount, text)};
-    if (*number < 0) return Problem{"negative amount", attributeText(amount, text)};
-    if (*number == 0 && !element.exactValue(amount)) return {};
+    const VSValue* exact = element.exactValue(amount);
+    if (*number == 0 && !exact) return {};
     if (unitText.empty()) return Problem{"missing attribute", attributeName(unitName)};
     const VSObjectType* type = VSObjectType::dataTypeWithCode(code);
     const QVUnitIndex::Entry& unit = units_.find(type, unitText);
@@ -411,12 +458,15 @@ QVRecordsBuilder::Check QVRecordsBuilder::readAmount(const QVElement& element, Q
                        attributeText(unitName, unitText) + " (" + unit.problem + ")"};
     const auto value = unit.unit->convert(*number, type->canonicalUnit());
     if (!value || !std::isfinite(*value)) return Problem{"not a number", attributeText(amount, text)};
-    result.emplace(type->canonicalUnit(), *value);
+    const bool isExact =
+        exact && exact->number() &&
+        QVExactAgrees(*exact->number(), type->canonicalUnit(), *number, *unit.unit, kAllDigits);
+    result.emplace(type->canonicalUnit(), isExact ? *exact->number() : *value);
     return {};
 }
 
 QVRecordsBuilder::Check QVRecordsBuilder::readDuration(const QVElement& element, VSDuration& duration) {
-    constexpr double kLongestSeconds = 200.0 * 366 * 86'400;
+    const double longest = VSSecondsFromDuration(VSLimits::latestDate - VSLimits::earliestDate);
     const std::string_view text = element[QVAttributeName::Duration],
                            unitText = element[QVAttributeName::DurationUnit];
     if (text.empty()) return {};
@@ -428,9 +478,13 @@ QVRecordsBuilder::Check QVRecordsBuilder::readDuration(const QVElement& element,
     const auto seconds = unit.ok() ? unit->convert(*number, VSUnit::secondUnit()) : std::nullopt;
     if (!seconds)
         return Problem{"unknown or unfit unit", attributeText(QVAttributeName::DurationUnit, unitText)};
-    if (!(*seconds <= kLongestSeconds))
+    if (!(*seconds <= longest))
         return Problem{"absurd duration", attributeText(QVAttributeName::Duration, text)};
     duration = VSDurationFromSeconds(*seconds);
+    const VSValue* exact = element.exactValue(QVAttributeName::Duration);
+    if (exact && exact->integer() &&
+        std::abs(*exact->integer() - duration.count()) <= 1 + (duration.count() >> 40))
+        duration = VSDuration(*exact->integer());
     return {};
 }
 
@@ -454,7 +508,7 @@ void QVRecordsBuilder::refuse(const QVElement& element, Problem problem) {
 }
 
 void QVRecordsBuilder::list(QVImportRefusal refusal) {
-    if (report_.refusals.size() < limits_.listedRefusals) report_.refusals.push_back(std::move(refusal));
+    if (report_.refusals.size() < listedRefusals_) report_.refusals.push_back(std::move(refusal));
 }
 
 QVImportCount& QVRecordsBuilder::countOf(const VSObjectType* type, std::string_view typeAsGiven) {
@@ -485,13 +539,21 @@ void QVRecordsBuilder::finishMetadata(Draft& draft) {
 }
 
 template <typename Sample, typename... Arguments>
-void QVRecordsBuilder::emit(int64_t line, Arguments&&... arguments) {
-    batch_.items.push_back({Sample(std::forward<Arguments>(arguments)...), line});
-    if (batch_.items.size() >= QVImportBatch::kSize) flush();
+void QVRecordsBuilder::emit(Arguments&&... arguments) {
+    QVImportItem item{Sample(std::forward<Arguments>(arguments)...), record_.line, nullptr};
+    VSImportRelations& relations = record_.relations;
+    const bool namesMembers = std::any_of(relations.members.begin(), relations.members.end(),
+                                          [](int64_t number) { return number != 0; });
+    if (relations.number || !relations.workouts.empty() || namesMembers)
+        item.relations = std::make_unique<const VSImportRelations>(std::move(relations));
+    batch_.items.push_back(std::move(item));
+    batchBytes_ += record_.metadataBytes;
+    if (batch_.items.size() >= QVImportBatch::kSize || batchBytes_ > kGreatestBatch) flush();
 }
 
 void QVRecordsBuilder::flush() {
     if (batch_.items.empty() && !batch_.person) return;
+    batchBytes_ = 0;
     QVImportBatch next;
     next.document = batch_.document;
     next.items.reserve(QVImportBatch::kSize);

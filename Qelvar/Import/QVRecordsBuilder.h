@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "Qelvar/Import/QVExactInstructions.h"
 #include "Qelvar/Import/QVImportBatch.h"
 #include "Qelvar/Import/QVImportReport.h"
 #include "Qelvar/Import/QVImportText.h"
@@ -16,13 +17,8 @@
 /// lives through all documents of an import. Used by one thread.
 class QVRecordsBuilder {
  public:
-    /// Dates outside of [earliest, latest] are absurd.
-    struct Limits {
-        VSDate earliest, latest;
-        size_t listedRefusals = 0;
-    };
     /// REQUIRES: the queue outlives the builder.
-    QVRecordsBuilder(const Limits& limits, QVImportQueue& queue);
+    QVRecordsBuilder(size_t listedRefusals, QVImportQueue& queue);
 
     void beginDocument(const std::string& name);
     /// Hands over what is left of the document.
@@ -35,6 +31,9 @@ class QVRecordsBuilder {
     void end(QVElementName name, QVElementName parent);
     /// An element that has no place where it stands. It is passed over with all that it holds.
     void unexpectedElement(const QVElement& element);
+
+    /// Of the document; what they say of an element is with the element.
+    QVExactInstructions& instructions() { return instructions_; }
 
     /// Nobody takes the records any more.
     bool isStopped() const { return stopped_; }
@@ -57,6 +56,8 @@ class QVRecordsBuilder {
         std::optional<VSQuantity> quantity;
         int value = 0;  // of a category, or a workout's activity
         VSMetadata metadata;
+        size_t metadataBytes = 0;
+        VSImportRelations relations;
         std::optional<QVImportRefusal> refusal;
         void reset();
     };
@@ -72,6 +73,7 @@ class QVRecordsBuilder {
     void addMetadata(const QVElement& element, Draft& draft);
     void addWorkoutEvent(const QVElement& element);
     void readPerson(const QVElement& element);
+    void readMedicalID(const QVElement& element, QVImportPerson& person);
     void readExportDate(const QVElement& element);
     void endRecord();
     void endMember();
@@ -81,7 +83,7 @@ class QVRecordsBuilder {
     static Check checkLengths(const QVElement& element);
     Check readCommon(const QVElement& element, Draft& draft);
     Check readDates(const QVElement& element, Draft& draft);
-    Check readDate(std::string_view text, QVAttributeName attribute, QVImportDate& date) const;
+    static Check readDate(std::string_view text, QVAttributeName attribute, QVImportDate& date);
     Check readOrigin(const QVElement& element, Draft& draft);
     Check readValue(const QVElement& element, Draft& draft);
     Check readQuantity(const QVElement& element, Draft& draft);
@@ -97,10 +99,10 @@ class QVRecordsBuilder {
     QVImportCount& countOf(const VSObjectType* type, std::string_view typeAsGiven);
     void finishMetadata(Draft& draft);
     template <typename Sample, typename... Arguments>
-    void emit(int64_t line, Arguments&&... arguments);
+    void emit(Arguments&&... arguments);
     void flush();
 
-    const Limits limits_;
+    const size_t listedRefusals_;
     QVImportQueue& queue_;
     const QVTypeIndex types_;
     QVUnitIndex units_;
@@ -108,10 +110,12 @@ class QVRecordsBuilder {
     QVInterned<VSDevice> devices_;
     std::shared_ptr<const VSMetadata> lastMetadata_;
     std::string revisionKey_;
+    QVExactInstructions instructions_;
 
     QVImportBatch batch_;
-    Draft record_;  // the Record, Correlation or Workout that is open
-    Draft member_;  // the Record in it
+    size_t batchBytes_ = 0;  // of its texts, about
+    Draft record_;           // the Record, Correlation or Workout that is open
+    Draft member_;           // the Record in it
     std::vector<VSSamplePtr> members_;
     WorkoutDraft workout_;
     std::string givenType_;              // of record_, as the document writes it, when it was refused

@@ -7,7 +7,6 @@
 #include "Qelvar/Import/QVImportFile.h"
 #include "Qelvar/Import/QVRecordsBuilder.h"
 #include "Qelvar/Import/QVRecordsReader.h"
-#include "Vessa/Base/VSEnvironment.h"
 
 namespace {
 
@@ -17,12 +16,6 @@ constexpr VSDuration kSilentPatience = milliseconds(500);  // for another writer
 constexpr VSDuration kToldPatience = milliseconds(1000);   // before it is told again
 constexpr VSDuration kPopPatience = milliseconds(100);
 constexpr size_t kListedNotes = 100;
-constexpr auto kEarliestDate = VSDate(std::chrono::sys_days(std::chrono::year(1900) / 1 / 1));
-
-/// A clock that was started in the past with `--now` must not turn real records away.
-VSDate latestSensibleDate() {
-    return std::max(VSEnvironment::current()->now(), VSSystemEnvironment().now()) + std::chrono::hours(24);
-}
 
 bool isSet(const std::atomic<bool>* flag) {
     return flag && flag->load(std::memory_order_relaxed);
@@ -36,11 +29,7 @@ VSError cancelled() {
 class Reading {
  public:
     Reading(const std::vector<std::filesystem::path>& files, const QVImportOptions& options)
-        : files_(files),
-          builder_({kEarliestDate, options.latestDate ? *options.latestDate : latestSensibleDate(),
-                    options.listedRefusals},
-                   queue_),
-          thread_([this] { run(); }) {}
+        : files_(files), builder_(options.listedRefusals, queue_), thread_([this] { run(); }) {}
     /// Gives up what is not read yet.
     ~Reading() {
         givenUp_ = true;
@@ -127,15 +116,16 @@ class Storing {
     explicit Storing(size_t listedRefusals) : listedRefusals_(listedRefusals) {}
 
     VSStatus store(VSHealthStore::ImportTransaction& transaction, const QVImportBatch& batch) {
+        if (document_ && batch.document != document_) {
+            if (VSStatus status = transaction.endDocument(); !status) return status;
+        }
+        document_ = batch.document;
         if (batch.person) {
-            const QVImportPerson& person = *batch.person;
-            const auto set = transaction.setCharacteristicsIfUnset(person.birthDate, person.biologicalSex,
-                                                                   person.bloodType, person.skinType);
-            if (!set) return set.error();
-            characteristics_ += *set;
+            if (VSStatus status = storePerson(transaction, *batch.person); !status) return status;
         }
         for (const QVImportItem& item : batch.items) {
-            const auto outcome = transaction.add(item.get());
+            const auto outcome =
+                item.relations ? transaction.add(item.get(), *item.relations) : transaction.add(item.get());
             if (outcome) {
                 const auto code = static_cast<size_t>(VSTypeCodeValue(item.get().sampleType()->code()));
                 ++(*outcome == VSHealthStore::ImportTransaction::Outcome::Added ? added_ : had_)[code];
@@ -171,6 +161,18 @@ class Storing {
     }
 
  private:
+    VSStatus storePerson(VSHealthStore::ImportTransaction& transaction, const QVImportPerson& person) {
+        const auto set = transaction.setCharacteristicsIfUnset(person.birthDate, person.biologicalSex,
+                                                               person.bloodType, person.skinType);
+        if (!set) return set.error();
+        characteristics_ += *set;
+        if (!person.medicalID) return {};
+        const auto isSet = transaction.setMedicalIDIfUnset(*person.medicalID);
+        if (!isSet) return isSet.error();
+        characteristics_ += *isSet;
+        return {};
+    }
+
     void refuse(const std::string& document, const QVImportItem& item, const std::string& message) {
         static constexpr const char* kReason = "the store refuses it";
         const VSSample& sample = item.get();
@@ -200,6 +202,7 @@ class Storing {
     std::vector<int64_t> added_ = std::vector<int64_t>(kCodes), had_ = added_, refused_ = added_;
     std::map<std::string, int64_t> reasons_;
     std::vector<QVImportRefusal> refusals_;
+    std::shared_ptr<const std::string> document_;  // of the last batch
     int64_t records_ = 0;
     int characteristics_ = 0;
 };

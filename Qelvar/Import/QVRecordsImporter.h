@@ -4,7 +4,6 @@
 #include <filesystem>
 #include <functional>
 #include <memory>
-#include <optional>
 #include <vector>
 
 #include "Qelvar/Import/QVImportReport.h"
@@ -26,9 +25,6 @@ struct QVImportOptions {
     std::function<void(const QVImportProgress&)> progress;
     /// Set by anyone (also a signal handler) to give up; may be null. REQUIRES: it outlives the import.
     const std::atomic<bool>* cancel = nullptr;
-    /// Dates after this are refused as absurd; none: a day after now (the later of the program's clock and
-    /// the machine's).
-    std::optional<VSDate> latestDate;
     /// How many refusals the report lists in full.
     size_t listedRefusals = 20;
     /// Everything as in an import, and then nothing of it is kept.

@@ -5,18 +5,17 @@
 
 #include <algorithm>
 #include <array>
-#include <map>
 #include <memory>
 #include <utility>
 #include <vector>
 
+#include "Qelvar/Import/QVExactInstructions.h"
 #include "Qelvar/Import/QVImportText.h"
 
 namespace {
 
 constexpr size_t kDeepestNesting = 16;
 constexpr size_t kBufferSize = 64 * 1024;
-constexpr size_t kLongestExactValue = 512 * 1024;
 
 std::string_view text(const xmlChar* chars) {
     return chars ? std::string_view(reinterpret_cast<const char*>(chars)) : std::string_view();
@@ -83,7 +82,6 @@ class QVRecordsReader::Parser {
 
  private:
     using Context = std::unique_ptr<xmlParserCtxt, ContextCloser>;
-    using ExactValues = std::map<QVAttributeName, VSValue>;
 
     static Parser& self(void* context) { return *static_cast<Parser*>(context); }
 
@@ -98,7 +96,7 @@ class QVRecordsReader::Parser {
             self(context).endElement();
         };
         handler.processingInstruction = [](void* context, const xmlChar* target, const xmlChar* data) {
-            if (text(target) == kQVExactValueTarget) self(context).exactValue(text(data));
+            if (text(target) == kQVExactTarget) self(context).instruction(text(data));
         };
         handler.internalSubset = [](void* context, const xmlChar* name, const xmlChar* publicId,
                                     const xmlChar* systemId) {
@@ -211,8 +209,8 @@ class QVRecordsReader::Parser {
             return;
         }
         readAttributes(count, attributes);
-        const auto exact = std::exchange(exact_, {});
-        applyExactValues(exact);
+        const QVExactFacts exact = reader_.builder_.instructions().takeFacts();
+        applyExactTexts(exact);
         const QVElementName parent = open_.back();
         if (!isAllowed(element_.name, parent)) {
             ++passedOver_;
@@ -224,7 +222,7 @@ class QVRecordsReader::Parser {
 
     void endElement() {
         if (stopped_) return;
-        exact_.clear();
+        reader_.builder_.instructions().forgetFacts();
         if (passedOver_ > 0) {
             --passedOver_;
             return;
@@ -238,24 +236,17 @@ class QVRecordsReader::Parser {
         if (reader_.builder_.isStopped()) stopParser();
     }
 
-    /// Says an attribute of the element that follows. What is not of that form says nothing.
-    void exactValue(std::string_view content) {
-        const size_t blank = content.find(' ');
-        if (open_.empty() || passedOver_ > 0 || blank == std::string_view::npos ||
-            content.size() > kLongestExactValue)
-            return;
-        const auto name =
-            std::find(kQVAttributeNames.begin(), kQVAttributeNames.end(), content.substr(0, blank));
-        auto value = VSValue::fromSerialized(content.substr(blank + 1));
-        if (name == kQVAttributeNames.end() || !value) return;
-        exact_[static_cast<QVAttributeName>(name - kQVAttributeNames.begin())] = std::move(*value);
+    void instruction(std::string_view content) {
+        if (!open_.empty() && passedOver_ == 0) reader_.builder_.instructions().read(content);
     }
 
-    void applyExactValues(const ExactValues& exact) {
-        element_.exactValues = exact.empty() ? nullptr : &exact;
-        for (const auto& [attribute, value] : exact) {
-            if (element_.has(attribute) && value.string())
-                element_.values[static_cast<size_t>(attribute)] = *value.string();
+    void applyExactTexts(const QVExactFacts& exact) {
+        element_.exact = exact.isEmpty() ? nullptr : &exact;
+        for (const auto& [attribute, value] : exact.attributes) {
+            const auto index = static_cast<size_t>(attribute);
+            if (element_.has(attribute) && value.string() &&
+                QVExactAgrees(*value.string(), element_.values[index]))
+                element_.values[index] = *value.string();
         }
     }
 
@@ -298,7 +289,6 @@ class QVRecordsReader::Parser {
     std::array<uint8_t, 16> order_{};
     QVElement element_;
     std::vector<QVElementName> open_;  // from the root
-    ExactValues exact_;                // of the element that follows
     size_t passedOver_ = 0;            // elements open in one that has no place
     bool rootClosed_ = false;
     bool stopped_ = false;

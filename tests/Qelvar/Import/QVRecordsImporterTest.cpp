@@ -214,18 +214,4 @@ TEST_F(QVRecordsImporterTest, RefusalsBeyondTheListAreCounted) {
     EXPECT_EQ(report->byType.at("VSQuantityTypeIdentifierAura"), (QVImportCount{5000, 0, 0, 5000}));
 }
 
-TEST_F(QVRecordsImporterTest, RecordsOfTomorrowAreTakenAndThoseOfLaterAreNot) {
-    std::string soon = record(1), late = record(1);
-    for (std::string* text : {&soon, &late}) {
-        for (size_t at = 0; (at = text->find("2020-03-01", at)) != std::string::npos;)
-            text->replace(at, 10, text == &soon ? "2020-04-03" : "2020-04-05");
-    }
-    QVImportOptions options;
-    options.latestDate = test::date("2020-04-03T12:00");
-    const auto report = import({write("x.xml", kHead + soon + late + kTail)}, options);
-    ASSERT_TRUE(report.ok()) << report.error().message;
-    EXPECT_EQ(report->total.added, 1);
-    EXPECT_EQ(report->refusalsByReason.at("absurd date"), 1);
-}
-
 }  // namespace
