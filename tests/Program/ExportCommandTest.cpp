@@ -110,9 +110,10 @@ TEST_F(ExportCommand, NoCommandWritesIntoTheStore) {
           "export --replace --to /dev/stdout 1<>'" + database.string() + "'",
           "types 1<>'" + database.string() + "'", "types nonsense 2>>'" + database.string() + "'",
           "salvage --to '" + inner.string() + "'", "import --store '" + inner.string() + "' x.xml",
-          "import /dev/stdin <'" + database.string() + "'", "import '" + database.string() + "'",
+          "import /dev/stdin <'" + database.string() + "'",
           "--screenshots '" + inner.string() + "'"})
         EXPECT_EQ(program_.runInShell(command), 5) << command;
+    EXPECT_EQ(program_.run({"import", database}).status, 4) << "it is no document";
     EXPECT_EQ(test::contentOf(database), before);
     EXPECT_FALSE(fs::exists(inner));
     // Without standard output and error what is printed would get into the first files that are opened.
