@@ -165,7 +165,8 @@ TEST_F(ReorderWindowTest, AFingerDragsToTheEndWhichScrollsAndFlicksWithoutHoldin
 
     touch().press(0, {180, 300});
     for (int y = 300; y < 550; y += 10) touch().move(0, {180, y});
-    EXPECT_LT(offset(), end - 100);
+    // Moves of a finger are delivered with the next frame.
+    ASSERT_TRUE(test::waitUntil([this, end] { return offset() < end - 100; }));
     EXPECT_FALSE(dashboard().isDragging());
     touch().release(0, {180, 550});
     EXPECT_EQ(app_->tabBarController()->selectedStack()->count(), 1);
