@@ -329,7 +329,8 @@ void QVDashboardDataUnitGroupsController::persistDashboard() {
                 if (ids)
                     adoptDashboard(*ids);
                 else
-                    dashboardBase_ = dashboardStored_;  // the next change brings this one too
+                    dashboardBase_ = dashboardStored_;             // the next change brings this one too
+                if (dashboardWrites_ == 0) readWhatOthersWrote();  // after this change, and told meanwhile
             });
         });
     tellObservers();
@@ -360,15 +361,17 @@ void QVDashboardDataUnitGroupsController::adoptSelection(const IDs& ids) {
 }
 
 void QVDashboardDataUnitGroupsController::readWhatOthersWrote() {
+    const int64_t ticket = ++lastRead_;
     for (const char* key : {dashboardKey, selectionKey})
-        userDefaults_.valueForKey(key, [this, key, alive = std::weak_ptr<bool>(alive_)](const auto& answer) {
-            platform::mainQueue().async([this, key, alive, ids = storedIDs(answer, key)] {
-                if (alive.expired() || !ids) return;
-                // An answer on its way may be older than a change that is made here meanwhile.
-                if (key == dashboardKey && dashboardWrites_ == 0) adoptDashboard(*ids);
-                if (key == selectionKey && selectionWrites_ == 0) adoptSelection(*ids);
+        userDefaults_.valueForKey(
+            key, [this, key, ticket, alive = std::weak_ptr<bool>(alive_)](const auto& answer) {
+                platform::mainQueue().async([this, key, ticket, alive, ids = storedIDs(answer, key)] {
+                    if (alive.expired() || !ids || ticket != lastRead_) return;
+                    // An answer on its way may be older than a change that is made here meanwhile.
+                    if (key == dashboardKey && dashboardWrites_ == 0) adoptDashboard(*ids);
+                    if (key == selectionKey && selectionWrites_ == 0) adoptSelection(*ids);
+                });
             });
-        });
 }
 
 void QVDashboardDataUnitGroupsController::dropUnshownFromSelection() {
@@ -397,7 +400,8 @@ void QVDashboardDataUnitGroupsController::persistSelection() {
                 if (ids)
                     adoptSelection(*ids);
                 else
-                    selectionBase_ = selectionStored_;  // the next change brings this one too
+                    selectionBase_ = selectionStored_;             // the next change brings this one too
+                if (selectionWrites_ == 0) readWhatOthersWrote();  // after this change, and told meanwhile
             });
         });
 }

@@ -103,6 +103,7 @@ class QVDashboardDataUnitGroupsController {
     // is replaced as a whole). And how many are on their way.
     std::optional<IDs> dashboardStored_, selectionStored_, dashboardBase_, selectionBase_;
     int dashboardWrites_ = 0, selectionWrites_ = 0;
+    int64_t lastRead_ = 0;  // the answers of earlier ones may be older than what is known
     std::vector<std::function<void()>> afterLoading_;  // changes asked for before there was a list to change
     std::optional<IDs> autoAddedIDs_;                  // none: not read in this process
     platform::ObserverSet<QVDashboardDataUnitGroupsObserver> observers_;
